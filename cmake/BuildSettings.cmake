@@ -1,0 +1,45 @@
+# What every target of the project is compiled with.
+
+# A packager's compiler may know warnings that ours does not, so only the presets make them fatal.
+option(FILEINDEX_WERROR "Treat warnings as errors" OFF)
+option(FILEINDEX_COVERAGE "Instrument for gcov" OFF)
+set(FILEINDEX_SANITIZE "" CACHE STRING "Sanitizers to build with: \"address,undefined\" or \"thread\"")
+
+if(NOT CMAKE_BUILD_TYPE AND NOT CMAKE_CONFIGURATION_TYPES)
+    set(CMAKE_BUILD_TYPE RelWithDebInfo CACHE STRING "Kind of build" FORCE)
+endif()
+
+set(CMAKE_CXX_STANDARD 20)
+set(CMAKE_CXX_STANDARD_REQUIRED ON)
+set(CMAKE_CXX_EXTENSIONS OFF)
+set(CMAKE_C_STANDARD 99)
+set(CMAKE_EXPORT_COMPILE_COMMANDS ON)
+set(CMAKE_POSITION_INDEPENDENT_CODE ON)
+
+set(CMAKE_LIBRARY_OUTPUT_DIRECTORY "${PROJECT_BINARY_DIR}/lib")
+set(CMAKE_ARCHIVE_OUTPUT_DIRECTORY "${PROJECT_BINARY_DIR}/lib")
+set(CMAKE_RUNTIME_OUTPUT_DIRECTORY "${PROJECT_BINARY_DIR}/bin")
+
+# Libraries find each other beside themselves and programs find them in ../lib, so an install into any prefix
+# runs as it is. The system's own directories need no search path.
+if(NOT CMAKE_INSTALL_PREFIX STREQUAL "/usr" AND NOT DEFINED CMAKE_INSTALL_RPATH)
+    file(RELATIVE_PATH binToLib "${CMAKE_INSTALL_FULL_BINDIR}" "${CMAKE_INSTALL_FULL_LIBDIR}")
+    set(CMAKE_INSTALL_RPATH "$ORIGIN" "$ORIGIN/${binToLib}")
+endif()
+
+add_library(project_warnings INTERFACE)
+target_compile_options(project_warnings INTERFACE
+    -Wall -Wextra -Wpedantic -Wshadow
+    $<$<COMPILE_LANGUAGE:CXX>:-Wnon-virtual-dtor>
+    $<$<COMPILE_LANGUAGE:CXX>:-Woverloaded-virtual>
+    $<$<BOOL:${FILEINDEX_WERROR}>:-Werror>)
+
+if(FILEINDEX_SANITIZE)
+    add_compile_options(-fsanitize=${FILEINDEX_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)
+    add_link_options(-fsanitize=${FILEINDEX_SANITIZE})
+endif()
+
+if(FILEINDEX_COVERAGE)
+    add_compile_options(--coverage)
+    add_link_options(--coverage)
+endif()
