@@ -1,0 +1,51 @@
+/// \file
+/// The shape of the command table (commands.cpp), from which parsing and help are made.
+#ifndef FILEINDEXCTL_COMMAND_H
+#define FILEINDEXCTL_COMMAND_H
+
+#include "arguments.h"
+#include "exit_status.h"
+#include "output.h"
+
+#include <span>
+#include <string_view>
+
+namespace fileindexctl {
+
+enum class Arity { Flag, Optional, One, Many };
+
+/// A positional argument ("PATH") or an option ("--share").
+struct Parameter {
+    std::string_view name;
+    Arity arity;
+    std::string_view value;  ///< what an option takes, for the help; empty for flags and positional arguments
+    std::string_view help;
+    bool number = false;                          ///< takes a number of 0 or more
+    std::span<const std::string_view> choices{};  ///< the only values allowed; none given: any
+
+    constexpr bool IsOption() const { return name.starts_with("--"); }
+    constexpr bool IsRequired() const { return !IsOption() && (arity == Arity::One || arity == Arity::Many); }
+};
+
+struct Command {
+    std::string_view group;  ///< "share" for "share rename"; empty for a verb that stands alone
+    std::string_view name;
+    std::string_view help;
+    std::span<const Parameter> parameters;
+    ExitStatus (*run)(const Arguments &, Output &);
+};
+
+struct Group {
+    std::string_view name;
+    std::string_view help;
+};
+
+/// All commands, in the order in which help shows them.
+std::span<const Command> Commands();
+
+/// The names that commands are grouped under.
+std::span<const Group> Groups();
+
+}  // namespace fileindexctl
+
+#endif

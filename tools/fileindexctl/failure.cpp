@@ -1,0 +1,106 @@
+#include "failure.h"
+
+#include "records.h"
+
+#include <fileindex/error.h>
+
+#include <vork/error.h>
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <cerrno>
+
+namespace fileindexctl {
+
+namespace {
+
+using VORK::FILEINDEX::Config;
+using VORK::FILEINDEX::ErrorHandler;
+
+bool IsDenied(int error) {
+    return error == EACCES || error == EPERM || error == EROFS;
+}
+
+// A lock that cannot be opened has the same code as one that is busy. The flags are those of the library: a
+// sticky directory may deny O_CREAT where it would allow a plain open.
+bool MayNotOpenLock(const std::string &path) {
+    const int descriptor = open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0644);
+    if (descriptor < 0) {
+        return IsDenied(errno);
+    }
+    close(descriptor);
+    return false;
+}
+
+bool MayNot(const std::string &path, int mode) {
+    return faccessat(AT_FDCWD, path.c_str(), mode, AT_EACCESS) != 0 && IsDenied(errno);
+}
+
+bool MayNotWrite(const std::string &path) {
+    return MayNot(path, W_OK) ||
+           (access(path.c_str(), F_OK) != 0 && MayNot(path.substr(0, path.rfind('/')), W_OK));
+}
+
+Failure Denied(const std::string &path) {
+    return {ExitStatus::Permission, "no permission for " + path + "; run this as the administrator"};
+}
+
+Failure LockFailure(const std::string &path) {
+    if (MayNotOpenLock(path)) {
+        return Denied(path);
+    }
+    return {ExitStatus::Busy, path + " is locked by another program; try again"};
+}
+
+Failure LoadFailure(const std::string &path) {
+    if (MayNot(path, R_OK)) {
+        return Denied(path);
+    }
+    return {ExitStatus::Malformed, path + " cannot be read as JSON; nothing was changed"};
+}
+
+Failure SaveFailure(const std::string &path) {
+    if (MayNotWrite(path)) {
+        return Denied(path);
+    }
+    const std::string directory = path.substr(0, path.rfind('/'));
+    if (access(directory.c_str(), F_OK) != 0) {
+        return {ExitStatus::CannotSave, path + " cannot be saved: there is no directory " + directory};
+    }
+    return {ExitStatus::CannotSave, path + " cannot be saved; the old content stands"};
+}
+
+}  // namespace
+
+void ForgetErrors() {
+    ErrorHandler::SetError(VORK::FILEINDEX::FILEINDEX_ERR_NONE);
+    VLIBCErrSetEx(0, "", 0);
+    Records().Clear();
+}
+
+Failure FailureOf(const Config &config) {
+    using namespace VORK::FILEINDEX;
+    switch (ErrorHandler::GetError()) {
+        case FILEINDEX_ERR_LOCK:
+            return LockFailure(config.GetLockPath());
+        case FILEINDEX_ERR_LOAD_JSON:
+            return LoadFailure(config.GetPath());
+        case FILEINDEX_ERR_MALFORMED_CONFIG:
+            return {ExitStatus::Malformed, config.GetPath() + " is not a JSON object; nothing was changed"};
+        case FILEINDEX_ERR_SAVE_JSON:
+            return SaveFailure(config.GetPath());
+        case FILEINDEX_ERR_EXCEED_MAX_FOLDER:
+            return {ExitStatus::CannotSave, "there are 1000 folders already; no more can be added"};
+        case FILEINDEX_ERR_NO_SUCH_FOLDER:
+            return {ExitStatus::NoSuchFolder, "no such folder"};
+        case FILEINDEX_ERR_PATH:
+            return {ExitStatus::NoSuchFolder, "the path lies in no share that is present"};
+        case FILEINDEX_ERR_BAD_PARAM:
+            return {ExitStatus::Usage, "the library refused the request: " + Records().Last()};
+        default:
+            return {ExitStatus::Partly, "the library failed without a reason: " + Records().Last()};
+    }
+}
+
+}  // namespace fileindexctl

@@ -1,0 +1,34 @@
+/// \file
+/// What stops a command before it changed anything: an exit status and a sentence for the user.
+#ifndef FILEINDEXCTL_FAILURE_H
+#define FILEINDEXCTL_FAILURE_H
+
+#include "exit_status.h"
+
+#include <fileindex/config.h>
+
+#include <stdexcept>
+#include <string>
+
+namespace fileindexctl {
+
+class Failure : public std::runtime_error {
+public:
+    Failure(ExitStatus status, const std::string &message) : std::runtime_error(message), status_(status) {}
+
+    ExitStatus Status() const { return status_; }
+
+private:
+    ExitStatus status_;
+};
+
+/// Forgets earlier error codes and log records. Success resets none of them, so this comes before each call whose
+/// failure is to be explained.
+void ForgetErrors();
+
+/// The library's last error code in words and as an exit status, for an operation on the file of `config`.
+Failure FailureOf(const VORK::FILEINDEX::Config &config);
+
+}  // namespace fileindexctl
+
+#endif

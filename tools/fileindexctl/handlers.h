@@ -1,0 +1,30 @@
+/// \file
+/// One function for each row of the command table. Each does the whole of its command, reports through Output and
+/// throws Failure (failure.h) for what stops it before anything was changed.
+#ifndef FILEINDEXCTL_HANDLERS_H
+#define FILEINDEXCTL_HANDLERS_H
+
+#include "arguments.h"
+#include "exit_status.h"
+#include "output.h"
+
+namespace fileindexctl {
+
+// folders.cpp
+ExitStatus ListFolders(const Arguments &arguments, Output &output);
+ExitStatus ShowFolder(const Arguments &arguments, Output &output);
+
+// folder_changes.cpp
+ExitStatus AddFolder(const Arguments &arguments, Output &output);
+ExitStatus SetFolder(const Arguments &arguments, Output &output);
+
+// questions.cpp
+ExitStatus CheckPath(const Arguments &arguments, Output &output);
+
+// schedule.cpp
+ExitStatus PauseIndexing(const Arguments &arguments, Output &output);
+ExitStatus ResumeIndexing(const Arguments &arguments, Output &output);
+
+}  // namespace fileindexctl
+
+#endif

@@ -1,0 +1,105 @@
+#include "output.h"
+
+#include "text.h"
+
+#include <json/writer.h>
+
+#include <sys/ioctl.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <cstdlib>
+
+namespace fileindexctl {
+
+namespace {
+
+unsigned TerminalWidth() {
+    winsize size{};
+    if (isatty(STDOUT_FILENO) == 0) {
+        return 0;
+    }
+    return ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0 ? size.ws_col : 80;
+}
+
+bool MayColour() {
+    const char *noColour = std::getenv("NO_COLOR");
+    return isatty(STDOUT_FILENO) != 0 && (noColour == nullptr || *noColour == '\0');
+}
+
+void Print(std::FILE *stream, std::string_view text) {
+    std::fwrite(text.data(), 1, text.size(), stream);
+}
+
+void Complain(std::string_view kind, const std::string &text) {
+    std::fflush(stdout);  // so that a log that takes both streams keeps their order
+    Print(stderr, "fileindexctl: " + std::string(kind) + Printable(text) + "\n");
+}
+
+std::string Serialise(const Json::Value &document) {
+    Json::StreamWriterBuilder builder;
+    builder["indentation"] = "  ";
+    builder["emitUTF8"] = true;  // names are bytes and stay what they are
+    return Json::writeString(builder, document) + "\n";
+}
+
+}  // namespace
+
+Output::Output(bool json) : json_(json), colour_(MayColour()), width_(TerminalWidth()) {}
+
+void Output::Line(std::string_view text) {
+    if (json_) {
+        return;
+    }
+    Print(stdout, text);
+    Print(stdout, "\n");
+}
+
+void Output::Warn(const std::string &text) {
+    warnings_.push_back(text);
+    Complain("warning: ", text);
+}
+
+void Output::Note(const std::string &text) {
+    if (!json_) {
+        Complain("", text);
+    }
+}
+
+void Output::Error(ExitStatus status, const std::string &text) {
+    if (!data_.isObject()) {
+        data_ = Json::Value(Json::objectValue);
+    }
+    data_["error"]["status"] = static_cast<int>(status);
+    data_["error"]["message"] = text;
+    Complain("", text);
+}
+
+std::string Output::Paint(Colour colour, std::string_view text) const {
+    static constexpr const char *kCodes[] = {"", "\033[32m", "\033[31m", "\033[2m"};
+    if (!colour_ || colour == Colour::Plain) {
+        return std::string(text);
+    }
+    return kCodes[static_cast<int>(colour)] + std::string(text) + "\033[0m";
+}
+
+ExitStatus Output::Finish(ExitStatus status) {
+    if (json_) {
+        Json::Value document(Json::objectValue);
+        document["schema"] = 1;
+        document["ok"] = status == ExitStatus::Done || (status == ExitStatus::No && !data_["error"]);
+        document["data"] = data_;
+        document["warnings"] = Json::Value(Json::arrayValue);
+        for (const auto &warning : warnings_) {
+            document["warnings"].append(warning);
+        }
+        Print(stdout, Serialise(document));
+    }
+    if (std::fflush(stdout) != 0 || std::ferror(stdout) != 0) {
+        Complain("", "the output could not be written");
+        return status == ExitStatus::Done ? ExitStatus::CannotSave : status;
+    }
+    return status;
+}
+
+}  // namespace fileindexctl

@@ -1,0 +1,62 @@
+/// \file
+/// Where a command's results go: lines for people, or one JSON document for programs.
+///
+/// Data goes to stdout, everything else to stderr. The document is
+/// {"schema": 1, "ok": BOOL, "data": ..., "warnings": [TEXT, ...]}; after a failure "data" holds what was done and
+/// {"error": {"status": N, "message": TEXT}}. A question that is answered "no" is ok.
+#ifndef FILEINDEXCTL_OUTPUT_H
+#define FILEINDEXCTL_OUTPUT_H
+
+#include "exit_status.h"
+
+#include <json/value.h>
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace fileindexctl {
+
+enum class Colour { Plain, Good, Bad, Dim };
+
+class Output {
+public:
+    explicit Output(bool json);
+
+    bool IsJson() const { return json_; }
+
+    /// The width of the terminal on stdout, 0 when it is none: then nothing is shortened or coloured.
+    unsigned Width() const { return width_; }
+
+    /// One line of data for people; left out of JSON.
+    void Line(std::string_view text);
+
+    /// What programs get as "data"; not shown to people.
+    Json::Value &Data() { return data_; }
+
+    /// Something the user should know although the command goes on.
+    void Warn(const std::string &text);
+
+    /// A remark for people on stderr; left out of JSON.
+    void Note(const std::string &text);
+
+    /// Why the command failed.
+    void Error(ExitStatus status, const std::string &text);
+
+    /// The text in a colour, when stdout is a terminal and the user did not forbid it.
+    std::string Paint(Colour colour, std::string_view text) const;
+
+    /// Writes the document and makes sure that everything has left; the status to end with.
+    ExitStatus Finish(ExitStatus status);
+
+private:
+    bool json_;
+    bool colour_;
+    unsigned width_;
+    Json::Value data_;
+    std::vector<std::string> warnings_;
+};
+
+}  // namespace fileindexctl
+
+#endif

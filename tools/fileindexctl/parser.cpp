@@ -1,0 +1,122 @@
+#include "parser.h"
+
+#include "failure.h"
+
+#include <CLI/CLI.hpp>
+
+#include <map>
+#include <utility>
+
+namespace fileindexctl {
+
+namespace {
+
+constexpr const char *kAbout = "fileindexctl - which folders are indexed, and how far indexing is";
+constexpr const char *kFooter =
+    "Exit status: 0 done or yes, 1 no, 64 usage, 65 malformed configuration, 66 no such folder or share,\n"
+    "69 daemon or service unreachable, 70 partly done, 73 cannot save, 75 lock busy, 77 permission,\n"
+    "78 platform not configured.";
+
+// The lowest value a user can type that CLI11 would take for an option is left alone: numbers are checked as text.
+std::string CheckNumber(const std::string &text) {
+    const bool digits = !text.empty() && text.find_first_not_of("0123456789") == std::string::npos;
+    return digits && text.size() <= 18 ? std::string() : "a number of 0 or more is expected, not \"" + text + "\"";
+}
+
+class Parser {
+public:
+    Parser() : app_(kAbout, "fileindexctl") {
+        app_.footer(kFooter);
+        app_.require_subcommand(1);
+        app_.add_flag("--json", json_, "one JSON document on the standard output");
+        app_.set_version_flag("--version", FILEINDEXCTL_VERSION, "show the version");
+        for (const auto &group : Groups()) {
+            CLI::App *app = app_.add_subcommand(std::string(group.name), std::string(group.help));
+            app->require_subcommand(1)->fallthrough();
+            groups_.emplace(group.name, app);
+        }
+        for (const auto &command : Commands()) {
+            AddCommand(command);
+        }
+    }
+
+    Invocation Run(int argc, const char *const argv[]) {
+        Invocation invocation;
+        try {
+            app_.parse(argc, argv);
+        } catch (const CLI::CallForHelp &) {
+            invocation.help = app_.help();
+            return invocation;
+        } catch (const CLI::CallForVersion &) {
+            invocation.help = std::string(FILEINDEXCTL_VERSION) + "\n";
+            return invocation;
+        } catch (const CLI::ParseError &error) {
+            throw Failure(ExitStatus::Usage, std::string(error.what()) + "; see \"fileindexctl --help\"");
+        }
+        invocation.json = json_;
+        for (const auto &[command, app] : commands_) {
+            if (app->parsed()) {
+                invocation.command = command;
+                invocation.arguments = ArgumentsOf(*command, *app);
+            }
+        }
+        return invocation;
+    }
+
+private:
+    void AddCommand(const Command &command) {
+        CLI::App &parent = command.group.empty() ? app_ : *groups_.at(command.group);
+        CLI::App *app = parent.add_subcommand(std::string(command.name), std::string(command.help));
+        app->fallthrough();
+        for (const auto &parameter : command.parameters) {
+            AddParameter(*app, parameter);
+        }
+        commands_.emplace_back(&command, app);
+    }
+
+    static void AddParameter(CLI::App &app, const Parameter &parameter) {
+        const std::string name(parameter.name);
+        const std::string help(parameter.help);
+        if (parameter.arity == Arity::Flag) {
+            app.add_flag_callback(
+                name, [] {}, help);
+            return;
+        }
+        CLI::Option *option = app.add_option(name, CLI::callback_t([](const auto &) { return true; }), help);
+        option->type_name(std::string(parameter.value))->required(parameter.IsRequired());
+        option->expected(1, parameter.arity == Arity::Many ? CLI::detail::expected_max_vector_size : 1);
+        if (parameter.number) {
+            option->check(CheckNumber);
+        }
+        if (!parameter.choices.empty()) {
+            option->check(
+                CLI::IsMember(std::vector<std::string>(parameter.choices.begin(), parameter.choices.end())));
+        }
+    }
+
+    static Arguments ArgumentsOf(const Command &command, const CLI::App &app) {
+        Arguments arguments;
+        for (const auto &parameter : command.parameters) {
+            const CLI::Option *option = app.get_option(std::string(parameter.name));
+            if (option->count() == 0) {
+                continue;
+            }
+            const bool flag = parameter.arity == Arity::Flag;
+            arguments.Set(parameter.name, flag ? std::vector<std::string>() : option->results());
+        }
+        return arguments;
+    }
+
+    CLI::App app_;
+    bool json_ = false;
+    std::map<std::string_view, CLI::App *> groups_;
+    std::vector<std::pair<const Command *, CLI::App *>> commands_;
+};
+
+}  // namespace
+
+Invocation Parse(int argc, const char *const argv[]) {
+    return Parser().Run(argc, argv);
+}
+
+}  // namespace fileindexctl

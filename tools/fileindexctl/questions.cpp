@@ -1,0 +1,53 @@
+#include "failure.h"
+#include "handlers.h"
+#include "paths.h"
+#include "text.h"
+
+#include <fileindex/folders.h>
+#include <fileindex/index_mgr.h>
+
+namespace fileindexctl {
+
+namespace {
+
+using VORK::FILEINDEX::IndexMgr;
+
+Json::Value Array(const std::vector<std::string> &items) {
+    Json::Value array(Json::arrayValue);
+    for (const auto &item : items) {
+        array.append(item);
+    }
+    return array;
+}
+
+ExitStatus Answer(bool yes) {
+    return yes ? ExitStatus::Done : ExitStatus::No;
+}
+
+// Every answer says which kind of path the question was taken to be about.
+Place Asked(const Arguments &arguments, const Folders &folders, Output &output) {
+    const Place place = Locate(arguments.One("PATH"), folders);
+    output.Data()["path"] = place.path;
+    output.Data()["taken_as"] = place.TakenAs();
+    return place;
+}
+
+void Say(const Place &place, const std::string &answer, Output &output) {
+    output.Line(Printable((place.path.empty() ? "/" : place.path) + ": " + answer + " (" + place.TakenAs() + ")"));
+}
+
+}  // namespace
+
+ExitStatus CheckPath(const Arguments &arguments, Output &output) {
+    const Folders folders = ReadFolders();
+    const Place place = Asked(arguments, folders, output);
+    const bool indexed = place.isFull ? IndexMgr::IsFullPathIndexed(place.path, folders)
+                                      : IndexMgr::IsPathIndexed(place.path, folders);
+    const auto covering = Covering(place, folders);
+    output.Data()["indexed"] = indexed;
+    output.Data()["covered_by"] = Array(covering);
+    Say(place, indexed ? "indexed, covered by " + Enumerate(covering) : "not indexed", output);
+    return Answer(indexed);
+}
+
+}  // namespace fileindexctl

@@ -1,0 +1,86 @@
+#include "records.h"
+
+#include <algorithm>
+#include <array>
+#include <cstdarg>
+#include <cstdio>
+
+// <syslog.h> is left out: a fortified build would make its `syslog` an inline function that clashes with the
+// definition below.
+extern "C" void vsyslog(int priority, const char *format, va_list arguments);
+
+namespace fileindexctl {
+
+namespace {
+
+// A call of `syslog` must not throw, and this one comes from foreign code.
+void Keep(const char *format, va_list arguments) noexcept {
+    std::array<char, 4096> text{};
+    try {
+        std::vsnprintf(text.data(), text.size(), format, arguments);
+        Records().Add(text.data());
+    } catch (...) {  // NOLINT(bugprone-empty-catch): the record still reaches the system log
+    }
+}
+
+}  // namespace
+
+void RecordLog::Add(std::string record) {
+    const auto blank = record.find(' ');
+    if (blank == std::string::npos) {
+        records_.push_back({std::string(), std::move(record)});
+        return;
+    }
+    records_.push_back({record.substr(0, blank), record.substr(blank + 1)});
+}
+
+void RecordLog::Clear() {
+    records_.clear();
+}
+
+const std::string *RecordLog::Find(const Mark &mark) const {
+    const std::string place = std::string(mark.module) + ":" + std::to_string(mark.line);
+    const auto found = std::find_if(records_.rbegin(), records_.rend(), [&](const Record &record) {
+        return record.place == place && std::string_view(record.message).ends_with(mark.ending);
+    });
+    return found == records_.rend() ? nullptr : &found->message;
+}
+
+std::string RecordLog::Last() const {
+    return records_.empty() ? std::string("see the system log") : records_.back().message;
+}
+
+RecordLog &Records() {
+    static RecordLog log;
+    return log;
+}
+
+}  // namespace fileindexctl
+
+extern "C" {
+
+__attribute__((visibility("default"), format(printf, 2, 3))) void syslog(int priority, const char *format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    va_list copy;
+    va_copy(copy, arguments);
+    fileindexctl::Keep(format, copy);
+    va_end(copy);
+    vsyslog(priority, format, arguments);
+    va_end(arguments);
+}
+
+// What a fortified library calls in its place.
+__attribute__((visibility("default"), format(printf, 3, 4))) void __syslog_chk(int priority, int /*flag*/,
+                                                                               const char *format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    va_list copy;
+    va_copy(copy, arguments);
+    fileindexctl::Keep(format, copy);
+    va_end(copy);
+    vsyslog(priority, format, arguments);
+    va_end(arguments);
+}
+
+}  // extern "C"

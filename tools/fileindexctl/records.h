@@ -1,0 +1,47 @@
+/// \file
+/// The library's log records of this process.
+///
+/// A failed operation of the library answers no more than false, but every failing step writes one record, and a
+/// record's module and line are its identity for good. This executable therefore defines `syslog` itself: the
+/// records pass through here and go on to the system log unchanged.
+#ifndef FILEINDEXCTL_RECORDS_H
+#define FILEINDEXCTL_RECORDS_H
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace fileindexctl {
+
+/// Which record: "index_mgr.cpp", 598. Where several shares can be meant, `ending` is the end of the text.
+struct Mark {
+    std::string_view module;
+    int line;
+    std::string ending{};
+};
+
+class RecordLog {
+public:
+    void Add(std::string record);
+    void Clear();
+
+    /// The message of the last record that fits, without module and line; null when there is none.
+    const std::string *Find(const Mark &mark) const;
+
+    /// The message of the last record of all.
+    std::string Last() const;
+
+private:
+    struct Record {
+        std::string place;  // "index_mgr.cpp:598"
+        std::string message;
+    };
+    std::vector<Record> records_;
+};
+
+/// The log of this process. There is one `syslog`, so there is one of these.
+RecordLog &Records();
+
+}  // namespace fileindexctl
+
+#endif

@@ -1,0 +1,186 @@
+#include "schedule.h"
+
+#include "failure.h"
+#include "handlers.h"
+#include "steps.h"
+
+#include <fileindex/daemon.h>
+#include <fileindex/status.h>
+#include <fileindex/status_mgr.h>
+
+#include <array>
+#include <cstdio>
+#include <ctime>
+#include <limits>
+
+namespace fileindexctl {
+
+namespace {
+
+using VORK::FILEINDEX::Status;
+using VORK::FILEINDEX::StatusMgr;
+
+constexpr long long kNotPaused = -1;
+constexpr long long kWithoutEnd = 0;
+constexpr long long kSecondsPerHour = 3600;
+
+// The library and the daemon reckon pauses in 32 bits: a later end would wrap and end the pause at once.
+constexpr long long kLatest = std::numeric_limits<int>::max();
+
+const std::vector<PlannedStep> &Plan(int line) {
+    static const std::vector<PlannedStep> pause = {
+        {"saved", "status.conf could not be saved", {}},
+        {"daemon told", "fileindexd cannot be reached", {{"status_mgr.cpp", 198}}},
+    };
+    static const std::vector<PlannedStep> resume = {
+        pause[0],
+        {"daemon told", "fileindexd cannot be reached", {{"status_mgr.cpp", 221}}},
+    };
+    return line == 198 ? pause : resume;
+}
+
+std::string LocalTime(long long seconds) {
+    const auto time = static_cast<std::time_t>(seconds);
+    std::tm local{};
+    std::array<char, 64> text{};
+    if (localtime_r(&time, &local) == nullptr ||
+        std::strftime(text.data(), text.size(), "%Y-%m-%d %H:%M %Z", &local) == 0) {
+        return std::to_string(seconds);
+    }
+    return text.data();
+}
+
+bool IsNumber(const std::string &text) {
+    return !text.empty() && text.find_first_not_of("0123456789") == std::string::npos;
+}
+
+int ParseHours(std::string text) {
+    const std::string given = text;
+    if (text.ends_with('h')) {
+        text.pop_back();
+    }
+    if (!IsNumber(text)) {
+        throw Failure(ExitStatus::Usage,
+                      "\"" + given + "\" is no number of hours: 8h, 8, or 0 for a pause without an end");
+    }
+    const long long hours = text.size() > 9 ? kLatest : std::stoll(text);
+    if (std::time(nullptr) + hours * kSecondsPerHour > kLatest) {
+        throw Failure(ExitStatus::Usage, "a pause cannot end after " + LocalTime(kLatest) +
+                                             "; \"fileindexctl pause 0\" is one without an end");
+    }
+    return static_cast<int>(hours);
+}
+
+// The next time that local clocks show HH:MM.
+long long ParseUntil(const std::string &text) {
+    const bool shaped =
+        text.size() == 5 && text[2] == ':' && IsNumber(text.substr(0, 2)) && IsNumber(text.substr(3));
+    const int hour = shaped ? std::stoi(text.substr(0, 2)) : 24;
+    const int minute = shaped ? std::stoi(text.substr(3)) : 60;
+    if (hour > 23 || minute > 59) {
+        throw Failure(ExitStatus::Usage, "\"" + text + "\" is no time of day: HH:MM, from 00:00 to 23:59");
+    }
+    const std::time_t now = std::time(nullptr);
+    for (int day = 0; day < 2; ++day) {
+        std::tm local{};
+        localtime_r(&now, &local);
+        local.tm_mday += day;
+        local.tm_hour = hour;
+        local.tm_min = minute;
+        local.tm_sec = 0;
+        local.tm_isdst = -1;
+        const std::time_t then = std::mktime(&local);
+        if (then > now) {
+            return then;
+        }
+    }
+    throw Failure(ExitStatus::Usage, "the clock does not show " + text + " within a day");
+}
+
+class StatusLock {
+public:
+    explicit StatusLock(Status &status) : status_(status), locked_(status.Lock(true)) {}
+    ~StatusLock() { status_.Unlock(); }
+
+    StatusLock(const StatusLock &) = delete;
+    StatusLock &operator=(const StatusLock &) = delete;
+
+    bool IsHeld() const { return locked_; }
+
+private:
+    Status &status_;
+    bool locked_;
+};
+
+// StatusMgr::Pause counts in whole hours from now; for a time of day its steps are taken one by one.
+StepReport PauseUntil(long long resumeTime) {
+    Status status;
+    const StatusLock lock(status);
+    if (!lock.IsHeld() || !status.Load() || !status.Pause(resumeTime) || !status.Save()) {
+        throw FailureOf(status);
+    }
+    StepReport report;
+    report.Add("saved", StepResult::Done);
+    Json::Value data(Json::objectValue);
+    data["resume_time"] = static_cast<Json::Int64>(resumeTime);
+    const bool told = VORK::FILEINDEX::SendCammandToDaemon("pause", data);
+    report.Add("daemon told", told ? StepResult::Done : StepResult::Failed,
+               told ? "" : "fileindexd cannot be reached");
+    return report;
+}
+
+StepReport Trace(const std::vector<PlannedStep> &plan, bool succeeded) {
+    if (!succeeded && !HasFatalRecord(plan)) {
+        throw FailureOf(Status());
+    }
+    return StepReport::Trace(plan, succeeded);
+}
+
+ExitStatus Report(const StepReport &report, Output &output) {
+    report.Show(output);
+    long long resumeTime = kNotPaused;
+    if (StatusMgr::GetPauseInfo(resumeTime)) {
+        output.Data()["resume_time"] = static_cast<Json::Int64>(resumeTime);
+        output.Line(PauseText(resumeTime));
+    }
+    if (report.Status() != ExitStatus::Done) {
+        output.Error(report.Status(),
+                     "this is saved, but fileindexd does not know; once it runs, repeat the command");
+    }
+    return report.Status();
+}
+
+}  // namespace
+
+std::string PauseText(long long resumeTime) {
+    if (resumeTime == kWithoutEnd) {
+        return "indexing is paused without an end";
+    }
+    if (resumeTime == kNotPaused) {
+        return "indexing is not paused";
+    }
+    return "indexing is paused until " + LocalTime(resumeTime);
+}
+
+ExitStatus PauseIndexing(const Arguments &arguments, Output &output) {
+    if (arguments.Has("HOURS") && arguments.Has("--until")) {
+        throw Failure(ExitStatus::Usage, "give a number of hours or --until, not both");
+    }
+    if (arguments.Has("--until")) {
+        const long long resumeTime = ParseUntil(arguments.One("--until"));
+        ForgetErrors();
+        return Report(PauseUntil(resumeTime), output);
+    }
+    const int hours = arguments.Has("HOURS") ? ParseHours(arguments.One("HOURS")) : 0;
+    ForgetErrors();
+    const bool succeeded = StatusMgr::Pause(hours);
+    return Report(Trace(Plan(198), succeeded), output);
+}
+
+ExitStatus ResumeIndexing(const Arguments & /*arguments*/, Output &output) {
+    ForgetErrors();
+    const bool succeeded = StatusMgr::Resume();
+    return Report(Trace(Plan(221), succeeded), output);
+}
+
+}  // namespace fileindexctl

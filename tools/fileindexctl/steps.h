@@ -1,0 +1,75 @@
+/// \file
+/// The step-by-step report of a change.
+///
+/// The library saves first and tells the other parties afterwards, and rolls nothing back. So a failed change is
+/// one of two things, and the exit status says which: what failed after something was changed is "partly done"
+/// (70), with every step listed; when the first step to fail is also the first of all, nothing has been changed,
+/// and the status is that of the cause: a file (65, 73, 75, 77), or the daemon or a service (69).
+#ifndef FILEINDEXCTL_STEPS_H
+#define FILEINDEXCTL_STEPS_H
+
+#include "exit_status.h"
+#include "output.h"
+#include "records.h"
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace fileindexctl {
+
+enum class StepResult {
+    Done,
+    Already,  ///< was so before
+    Failed,   ///< the change stopped here
+    WentOn,   ///< failed, which the library does not count
+    NotReached,
+    Skipped,
+};
+
+/// A step as the library will take it, with the records that tell of its failure.
+struct PlannedStep {
+    std::string name;
+    std::string trouble;            ///< what a failure means, in words
+    std::vector<Mark> fatal;        ///< records after which the library stops
+    std::vector<Mark> tolerated{};  ///< records after which it goes on
+};
+
+class StepReport {
+public:
+    /// What became of the planned steps in a call that answered `succeeded`. The step that failed is the first
+    /// with a fatal record; if none has one, the first step.
+    static StepReport Trace(const std::vector<PlannedStep> &plan, bool succeeded);
+
+    void Add(const std::string &name, StepResult result, const std::string &detail = std::string());
+
+    /// Changes the result of a step that Trace saw done; another stays.
+    void Correct(const std::string &name, StepResult result, const std::string &detail = std::string());
+
+    bool Has(StepResult result) const;
+
+    /// Done, Partly or Unreachable.
+    ExitStatus Status() const;
+
+    /// Lines for people, "steps" for programs, a warning for each failure that the library does not count.
+    void Show(Output &output) const;
+
+private:
+    struct Step {
+        std::string name;
+        StepResult result;
+        std::string detail;
+    };
+    std::vector<Step> steps_;
+};
+
+/// Turns "events queued" into a failure when the library dropped an event: a queue that stays locked, or takes
+/// only part of a line, counts as success there and leaves only a record.
+void MarkDroppedEvents(StepReport &report);
+
+/// Is there a record that stopped one of the steps?
+bool HasFatalRecord(const std::vector<PlannedStep> &plan);
+
+}  // namespace fileindexctl
+
+#endif
