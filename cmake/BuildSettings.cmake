@@ -27,9 +27,10 @@ if(NOT CMAKE_INSTALL_PREFIX STREQUAL "/usr" AND NOT DEFINED CMAKE_INSTALL_RPATH)
     set(CMAKE_INSTALL_RPATH "$ORIGIN" "$ORIGIN/${binToLib}")
 endif()
 
+# Not -Wpedantic: it objects to the "%m" of syslog formats. The public headers are checked with it by a test.
 add_library(project_warnings INTERFACE)
 target_compile_options(project_warnings INTERFACE
-    -Wall -Wextra -Wpedantic -Wshadow
+    -Wall -Wextra -Wshadow
     $<$<COMPILE_LANGUAGE:CXX>:-Wnon-virtual-dtor>
     $<$<COMPILE_LANGUAGE:CXX>:-Woverloaded-virtual>
     $<$<BOOL:${FILEINDEX_WERROR}>:-Werror>)
