@@ -1,0 +1,71 @@
+/// \file
+/// One indexed folder: where it is, what it is called, which kinds of file are indexed in it.
+///
+/// This is the setting, not the state: the daemon follows later. The store of all folders is in folders.h.
+#ifndef FILEINDEX_FOLDER_H
+#define FILEINDEX_FOLDER_H
+
+#include <fileindex/export.h>
+
+#include <json/value.h>
+
+#include <string>
+
+namespace VORK {
+namespace FILEINDEX {
+
+/// A plain value, copied freely.
+class Folder {
+    std::string full_path_;  // empty when `path` could not be resolved
+
+public:
+    std::string path;       ///< share path, "/photo/2015"; the folder's identity
+    std::string name;       ///< display name
+    bool document = false;  ///< index documents
+    bool audio = false;     ///< index audio files
+    bool video = false;     ///< index video files
+    bool photo = false;     ///< index photos
+
+    /// Sets `path` from the argument (never from the record), then each field that `record` holds with the
+    /// right type; the others stay as they are. False only when the path cannot be resolved
+    /// (FILEINDEX_ERR_PATH); the fields are set all the same.
+    FILEINDEX_API bool Load(const std::string &sharePath, const Json::Value &record);
+
+    /// Load into a folder whose fields have first been reset to empty and false.
+    FILEINDEX_API bool Reload(const std::string &sharePath, const Json::Value &record);
+
+    /// Moves the folder to another share path and resolves it; the result is that of the resolution.
+    FILEINDEX_API bool SetPath(const std::string &sharePath);
+
+    /// The full path: "/vol1/photo/2015" for "/photo/2015" when the share photo is at /vol1/photo.
+    ///
+    /// One that could not be resolved is tried again at each call; if that fails too, one record is written
+    /// and the result is empty.
+    FILEINDEX_API std::string GetFullPath() const;
+
+    /// The record as stored in folder.conf: exactly "path", "name", "document", "audio", "video", "photo".
+    FILEINDEX_API Json::Value asJson() const;
+
+    /// The record with one more member, "additional", as GetAdditional fills it from the keys `additional`.
+    /// Never fails: bad keys are logged and leave FILEINDEX_ERR_BAD_PARAM.
+    FILEINDEX_API Json::Value asJson(const Json::Value &additional) const;
+
+    /// Stores asJson() in `obj` under the name `path`, replacing what was there. False, with nothing changed
+    /// or logged, when `obj` is not an object.
+    FILEINDEX_API bool AddToJson(Json::Value &obj) const;
+
+    /// One computed fact: "status" (string: "finished", "paused", "processing", "err_no_space") or "is_valid"
+    /// (bool: may the path be indexed at present). Any other key: one record, FILEINDEX_ERR_BAD_PARAM, false,
+    /// `out` untouched. "status" reads the share's whole queue.
+    FILEINDEX_API bool GetAdditional(Json::Value &out, const std::string &key) const;
+
+    /// The facts named by the array `keys`, as members of the object `out`. An unknown key is logged and
+    /// stays null; `keys` that is not an array, or an element that is not a string, ends with false and
+    /// FILEINDEX_ERR_BAD_PARAM (facts found before it stay in `out`).
+    FILEINDEX_API bool GetAdditional(Json::Value &out, const Json::Value &keys) const;
+};
+
+}  // namespace FILEINDEX
+}  // namespace VORK
+
+#endif
