@@ -1,0 +1,29 @@
+/**
+ * \file
+ * Running programs and waiting for them: by argument vector, never through a shell. The child gets default
+ * signal dispositions (the library ignores SIGPIPE in its host) and no descriptor but the standard three.
+ */
+#ifndef VORK_PROCESS_H
+#define VORK_PROCESS_H
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+/**
+ * Runs `szProgram` with up to four arguments (unused ones null; the first null ends the list) and waits for it.
+ * Its exit status (0 is success), negative when it could not be run or was ended by a signal.
+ */
+int VLIBCExec(const char *szProgram, const char *arg1, const char *arg2, const char *arg3, const char *arg4);
+
+/**
+ * Runs the program at `szPath` with the null-terminated vector `argv` (argv[0] included) and waits for it.
+ * Result as VLIBCExec. `a` 1 sends the program's output to /dev/null, `b` is reserved and 0.
+ */
+int VLIBCExecv(const char *szPath, const char *const argv[], int a, int b);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif

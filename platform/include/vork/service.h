@@ -1,0 +1,31 @@
+/**
+ * \file
+ * System services, by the library's names for them: "fileindexd" and "samba" (the file-sharing service). A
+ * platform maps the names to its own.
+ *
+ * The library holds a lock for which others wait no more than 30 ms: every call is bounded to seconds, whatever
+ * the service does. Negative on failure, with the platform error set; an unknown service is
+ * VORK_ERR_NO_SUCH_SERVICE.
+ */
+#ifndef VORK_SERVICE_H
+#define VORK_SERVICE_H
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+/** Starts the service and enables it at boot (`flag` 1). One that runs already is no failure. */
+int VLIBServiceStart(const char *szName, int flag);
+
+/** Asks the service to stop, without waiting for it, and disables it at boot (`flag` 1). One that does not run
+ * is no failure. */
+int VLIBServiceStop(const char *szName, int flag);
+
+/** Makes the service read its settings anew. For "samba" this keeps clients connected where it can. */
+int VLIBServiceRestart(const char *szName);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif
