@@ -1,0 +1,80 @@
+/// \file
+/// Every fixed path, key, limit and code that other parties know as well.
+#ifndef FILEINDEX_SRC_NAMES_H
+#define FILEINDEX_SRC_NAMES_H
+
+#include <cstddef>
+
+namespace VORK::FILEINDEX::internal {
+
+// Modules as the log records name them, also where a module is a folder of files.
+inline constexpr char kConfigModule[] = "config.cpp";
+inline constexpr char kFolderModule[] = "folder.cpp";
+inline constexpr char kFoldersModule[] = "folders.cpp";
+inline constexpr char kStatusModule[] = "status.cpp";
+inline constexpr char kStatusMgrModule[] = "status_mgr.cpp";
+inline constexpr char kIndexMgrModule[] = "index_mgr.cpp";
+inline constexpr char kUtilsModule[] = "utils.cpp";
+
+// Configuration files.
+inline constexpr char kFolderConf[] = "/usr/vork/etc/fileindex/folder.conf";
+inline constexpr char kFolderLock[] = "/tmp/fileidx_cfg_folder.lock";
+inline constexpr char kStatusConf[] = "/usr/vork/etc/fileindex/status.conf";
+inline constexpr char kStatusLock[] = "/tmp/fileidx_cfg_status.lock";
+inline constexpr std::size_t kMaxFolders = 1000;
+
+// Members of a folder record and of a change report.
+inline constexpr char kPathKey[] = "path";
+inline constexpr char kNameKey[] = "name";
+inline constexpr const char *kMediaKeys[] = {"document", "audio", "video", "photo"};
+
+// Members of status.conf.
+inline constexpr char kResumeTimeKey[] = "resume_time";
+inline constexpr char kNoSpaceKey[] = "no_space";
+inline constexpr char kNeedReindexKey[] = "need_reindex";
+
+// Index data inside a share's directory.
+inline constexpr char kMetadataDir[] = "@eaDir";
+inline constexpr char kQueueFile[] = "VORK@file_index_queue";
+inline constexpr char kDatabaseDir[] = "VORK@.fileindexdb";
+inline constexpr char kQueueTmpSuffix[] = ".tmp";
+
+// Queue records.
+inline constexpr char kEventKey[] = "event";
+inline constexpr char kOldPathKey[] = "path_old";
+inline constexpr char kDataKey[] = "data";
+inline constexpr unsigned kRenameEvent = 256;
+inline constexpr int kReindexEvent = 0x10000;
+inline constexpr int kSettingEvent = 0x20000;
+
+// The daemon, its socket and its commands.
+inline constexpr char kDaemonSocket[] = "/var/run/fileindexd.sock";
+inline constexpr char kDaemonService[] = "fileindexd";
+inline constexpr char kFileSharingService[] = "samba";
+inline constexpr char kUpsertCommand[] = "upsert_folder_setting";
+inline constexpr char kDeleteCommand[] = "delete_folder_setting";
+inline constexpr char kPauseCommand[] = "pause";
+inline constexpr char kResumeCommand[] = "resume";
+inline constexpr char kReviveShareCommand[] = "revive_share_worker";
+inline constexpr char kDeleteShareCommand[] = "delete_share_worker";
+inline constexpr char kFolderPathKey[] = "folder_path";
+inline constexpr char kShareNameKey[] = "share_name";
+
+// The notification daemon's registration.
+inline constexpr char kMonitorName[] = "fileindex";
+inline constexpr unsigned kMonitorMask = 0xFFCE;  // every change and move; not access, close without write, open
+
+// Buffers of the platform's share library.
+inline constexpr int kShareNameSize = 492;
+inline constexpr int kPathSize = 4096;
+
+// Platform errors.
+inline constexpr int kPlatformBadParameter = 0x0D00;
+inline constexpr int kPlatformNoSpace = 0x2900;
+inline constexpr int kPlatformQuota = 0x2400;
+
+inline constexpr int kDebugLevel = 7;
+
+}  // namespace VORK::FILEINDEX::internal
+
+#endif

@@ -1,0 +1,79 @@
+#include "names.h"
+#include "scoped.h"
+
+#include <fileindex/error.h>
+#include <fileindex/paths.h>
+
+#include <sys/stat.h>
+#include <syslog.h>
+
+namespace VORK {
+namespace FILEINDEX {
+
+using internal::kUtilsModule;
+
+bool GetFullPath(std::string &out, const std::string &sharePath) {
+    std::string shareName;
+    if (!GetShareNameByPath(shareName, sharePath)) {
+        syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", kUtilsModule, 389, sharePath.c_str());
+        return false;
+    }
+    const internal::Share share = internal::FindShare(shareName);
+    if (!share) {
+        ErrorHandler::SetError(FILEINDEX_ERR_PATH);
+        return false;
+    }
+    const std::string directory = share->szPath;
+    const std::string volume = directory.substr(0, directory.rfind('/'));  // all of it when there is no "/"
+    out = volume + sharePath;
+    return true;
+}
+
+bool GetShareNameByPath(std::string &outShareName, const std::string &sharePath) {
+    if (sharePath.empty()) {
+        return false;
+    }
+    const std::size_t end = sharePath.find('/', 1);
+    outShareName = sharePath.substr(1, end == std::string::npos ? end : end - 1);
+    return true;
+}
+
+bool GetShareNamePathByFullPath(std::string &outShareName, std::string &outSharePath,
+                                const std::string &fullPath) {
+    char name[internal::kShareNameSize] = {};
+    char path[internal::kPathSize] = {};
+    if (VORKShareNamePathGet(fullPath.c_str(), name, sizeof(name), path, sizeof(path)) < 0) {
+        syslog(LOG_ERR, "%s:%d VORKShareNamePathGet failed, path=%s", kUtilsModule, 418, fullPath.c_str());
+        ErrorHandler::SetError(FILEINDEX_ERR_PATH);
+        return false;
+    }
+    outShareName = name;
+    outSharePath = path;
+    return true;
+}
+
+std::string ReplaceShareName(const std::string &sharePath, const std::string &newShareName) {
+    if (sharePath.empty()) {
+        return std::string();
+    }
+    const std::size_t rest = sharePath.find('/', 1);
+    const std::string root = "/" + newShareName;
+    return rest == std::string::npos ? root : root + sharePath.substr(rest);
+}
+
+bool StringStartWith(const std::string &str, const std::string &prefix) {
+    return str.compare(0, prefix.size(), prefix) == 0;
+}
+
+bool IsDirExist(const std::string &path) {
+    struct stat status = {};
+    return lstat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
+}
+
+bool IsFileExist(const std::string &path) {
+    struct stat status = {};
+    return lstat(path.c_str(), &status) == 0 && S_ISREG(status.st_mode);
+}
+
+}  // namespace FILEINDEX
+}  // namespace VORK
