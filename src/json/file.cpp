@@ -1,0 +1,193 @@
+#include "json/file.h"
+
+#include "json/text.h"
+#include "scoped.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <chrono>
+#include <cstddef>
+#include <cstdio>
+#include <thread>
+
+namespace VORK::FILEINDEX::internal {
+
+namespace {
+
+// Non-blocking so that a FIFO planted at the path holds nobody up; it is refused once it is open.
+constexpr int kOpenFlags = O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
+
+bool IsRegular(int fd, struct stat &status) {
+    return fstat(fd, &status) == 0 && S_ISREG(status.st_mode);
+}
+
+/// Keeps readers and the writer of one file apart for the moment of the read or write; closing the file ends it.
+///
+/// Only a courtesy between well-behaved processes: a stranger who sits on the lock delays a call by 50 ms and
+/// stops nobody.
+void AwaitDataLock(int fd, int operation) {
+    constexpr auto kPatience = std::chrono::milliseconds(50);
+    constexpr auto kPause = std::chrono::microseconds(200);
+    const auto deadline = std::chrono::steady_clock::now() + kPatience;
+    while (flock(fd, operation | LOCK_NB) != 0) {
+        const bool busy = errno == EWOULDBLOCK || errno == EINTR;
+        if (!busy || std::chrono::steady_clock::now() >= deadline) {
+            return;
+        }
+        std::this_thread::sleep_for(kPause);
+    }
+}
+
+bool ReadAll(int fd, off_t sizeHint, std::string &out) {
+    std::size_t used = 0;
+    out.resize(static_cast<std::size_t>(sizeHint) + 1);  // one more, so that the end shows without a second round
+    for (;;) {
+        const ssize_t count = pread(fd, out.data() + used, out.size() - used, static_cast<off_t>(used));
+        if (count < 0 && errno == EINTR) {
+            continue;
+        }
+        if (count < 0) {
+            return false;
+        }
+        if (count == 0) {
+            out.resize(used);
+            return true;
+        }
+        used += static_cast<std::size_t>(count);
+        if (used == out.size()) {
+            out.resize(used * 2);
+        }
+    }
+}
+
+/// Claims the blocks for `size` bytes without changing the file's size, so that a full disk shows before the
+/// first old byte is touched. File systems that cannot do this find out in the write, which is undone.
+bool Reserve(int fd, std::size_t size) {
+    while (fallocate(fd, FALLOC_FL_KEEP_SIZE, 0, static_cast<off_t>(size)) != 0) {
+        if (errno == EOPNOTSUPP || errno == ENOSYS) {
+            return true;
+        }
+        if (errno != EINTR) {
+            return false;
+        }
+    }
+    return true;
+}
+
+bool Truncate(int fd, std::size_t size) {
+    return ftruncate(fd, static_cast<off_t>(size)) == 0;
+}
+
+/// Puts the old bytes back as far as the system lets us: there is no second way to do it.
+void Restore(int fd, const std::string &old) {
+    std::size_t done = 0;
+    while (done < old.size()) {
+        const ssize_t count = pwrite(fd, old.data() + done, old.size() - done, static_cast<off_t>(done));
+        if (count <= 0 && !(count < 0 && errno == EINTR)) {
+            break;
+        }
+        done += count > 0 ? static_cast<std::size_t>(count) : 0;
+    }
+    (void)Truncate(fd, old.size());
+}
+
+bool WriteOnce(int fd, const std::string &text) {
+    const ssize_t count = write(fd, text.data(), text.size());
+    return count >= 0 && static_cast<std::size_t>(count) == text.size();
+}
+
+/// Replaces the content of an open file. The text is padded with blanks, which JSON ignores, to the old length,
+/// and the length set last: a writer that dies in between leaves a whole document at every instant.
+bool Replace(UniqueFd fd, std::string text) {
+    struct stat status = {};
+    if (!IsRegular(fd.Get(), status)) {
+        return false;
+    }
+    AwaitDataLock(fd.Get(), LOCK_EX);
+    std::string old;
+    if (!ReadAll(fd.Get(), status.st_size, old)) {
+        return false;
+    }
+    const std::size_t size = text.size();
+    if (size > old.size() && !Reserve(fd.Get(), size)) {
+        (void)Truncate(fd.Get(), old.size());  // gives back what was claimed before the disk was full
+        return false;
+    }
+    text.resize(std::max(size, old.size()), ' ');
+    if (!WriteOnce(fd.Get(), text) || (text.size() > size && !Truncate(fd.Get(), size))) {
+        Restore(fd.Get(), old);
+        return false;
+    }
+    return fd.Close();
+}
+
+std::string DirectoryOf(const std::string &path) {
+    const std::size_t slash = path.rfind('/');
+    return slash == std::string::npos ? "." : path.substr(0, slash + 1);
+}
+
+/// Gives a nameless file its name. The first way needs a privilege, the second /proc.
+bool Publish(int fd, const std::string &path) {
+    if (linkat(fd, "", AT_FDCWD, path.c_str(), AT_EMPTY_PATH) == 0) {
+        return true;
+    }
+    const std::string self = "/proc/self/fd/" + std::to_string(fd);
+    return linkat(AT_FDCWD, self.c_str(), AT_FDCWD, path.c_str(), AT_SYMLINK_FOLLOW) == 0;
+}
+
+bool CreateByName(const std::string &path, const std::string &text) {
+    UniqueFd fd(open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | kOpenFlags, 0644));
+    if (!fd) {
+        return false;
+    }
+    AwaitDataLock(fd.Get(), LOCK_EX);
+    if (WriteOnce(fd.Get(), text) && fd.Close()) {
+        return true;
+    }
+    (void)unlink(path.c_str());  // an empty file would be a broken configuration, a missing one is none yet
+    return false;
+}
+
+/// Creates the file with its content in one step: it is written without a name and gets the name last, so nobody
+/// ever finds it empty or half written, and a writer that dies leaves nothing behind.
+bool Create(const std::string &path, const std::string &text) {
+    UniqueFd fd(open(DirectoryOf(path).c_str(), O_TMPFILE | O_RDWR | O_CLOEXEC, 0644));
+    if (!fd) {
+        const bool unsupported = errno == EOPNOTSUPP || errno == EISDIR || errno == EINVAL;
+        return unsupported && CreateByName(path, text);
+    }
+    return WriteOnce(fd.Get(), text) && Publish(fd.Get(), path) && fd.Close();
+}
+
+}  // namespace
+
+bool FromFile(const std::string &path, Json::Value &out) {
+    UniqueFd fd(open(path.c_str(), O_RDONLY | kOpenFlags));
+    struct stat status = {};
+    if (!fd || !IsRegular(fd.Get(), status)) {
+        return false;
+    }
+    AwaitDataLock(fd.Get(), LOCK_SH);
+    std::string text;
+    if (!ReadAll(fd.Get(), status.st_size, text)) {
+        return false;
+    }
+    fd.Close();  // lets a writer in while this process parses
+    return JsonReader().Parse(text, out);
+}
+
+bool ToFile(const std::string &path, const Json::Value &value) {
+    std::string text = ToString(value) + '\n';
+    UniqueFd fd(open(path.c_str(), O_RDWR | kOpenFlags));
+    if (fd) {
+        return Replace(std::move(fd), std::move(text));
+    }
+    return errno == ENOENT && Create(path, text);
+}
+
+}  // namespace VORK::FILEINDEX::internal

@@ -1,0 +1,34 @@
+/// \file
+/// JSON text in the library's one dialect: strict JSON, at most 256 levels deep, of repeated members the last.
+#ifndef FILEINDEX_SRC_JSON_TEXT_H
+#define FILEINDEX_SRC_JSON_TEXT_H
+
+#include <json/reader.h>
+#include <json/value.h>
+
+#include <memory>
+#include <string>
+#include <string_view>
+
+namespace VORK::FILEINDEX::internal {
+
+/// A parser that can be kept for many texts: building one costs more than parsing a short line.
+class JsonReader {
+public:
+    JsonReader();
+
+    /// False when the whole text is not one JSON value; blanks may surround it, nothing else. `out` is then
+    /// whatever was read so far. Never throws.
+    bool Parse(std::string_view text, Json::Value &out) const;
+
+private:
+    std::unique_ptr<Json::CharReader> reader_;
+};
+
+/// One line without a newline: members in sorted order, comments left out, every byte of a string that needs no
+/// escape unchanged, UTF-8 or not.
+std::string ToString(const Json::Value &value);
+
+}  // namespace VORK::FILEINDEX::internal
+
+#endif
