@@ -1,0 +1,51 @@
+/// \file
+/// Which folder covers which path: the one rule of comparison, and the choice among several folders.
+#ifndef FILEINDEX_SRC_COVERAGE_H
+#define FILEINDEX_SRC_COVERAGE_H
+
+#include <fileindex/folder.h>
+
+#include <json/value.h>
+
+#include <string>
+#include <string_view>
+
+namespace VORK::FILEINDEX::internal {
+
+/// Does `path` + "/" start with `folder` + "/"? So "/photo/2019" holds itself and "/photo/2019/x", not
+/// "/photo/20190". Bytes are compared, nothing is normalised.
+inline bool IsAtOrUnder(std::string_view path, std::string_view folder) {
+    return path.starts_with(folder) && (path.size() == folder.size() || path[folder.size()] == '/');
+}
+
+/// Does the folder cover the full path? One that could not be resolved covers none; compared by the rule above
+/// its empty path would cover all.
+inline bool Covers(const Folder &folder, std::string_view fullPath) {
+    const std::string place = folder.GetFullPath();
+    return !place.empty() && IsAtOrUnder(fullPath, place);
+}
+
+/// Finds the folder that governs a full path. The last one considered wins, even over a nearer one before it:
+/// the daemon chooses in the same way, and both must agree.
+class Governing {
+public:
+    explicit Governing(std::string_view fullPath) : full_path_(fullPath) {}
+
+    /// Keeps a pointer: `folder` has to outlive this object.
+    void Consider(const Folder &folder) {
+        if (Covers(folder, full_path_)) {
+            folder_ = &folder;
+        }
+    }
+
+    /// The folder's record, or an object without members.
+    Json::Value asJson() const { return folder_ != nullptr ? folder_->asJson() : Json::Value(Json::objectValue); }
+
+private:
+    std::string_view full_path_;
+    const Folder *folder_ = nullptr;
+};
+
+}  // namespace VORK::FILEINDEX::internal
+
+#endif
