@@ -1,0 +1,131 @@
+#include "json/text.h"
+#include "names.h"
+#include "no_throw.h"
+#include "scoped.h"
+
+#include <fileindex/daemon.h>
+#include <fileindex/error.h>
+#include <fileindex/status.h>
+#include <fileindex/status_mgr.h>
+
+#include <json/value.h>
+
+#include <syslog.h>
+
+#include <cstdint>
+#include <ctime>
+
+namespace VORK {
+namespace FILEINDEX {
+
+using namespace internal;
+
+namespace {
+
+/// A command that announces a saved change, and the line of the record when it cannot be sent.
+struct Announcement {
+    const char *command;
+    Json::Value data;
+    int failureLine;
+
+    /// A failure leaves the change saved: the daemon reads the file when it starts.
+    bool Send() const {
+        if (SendCammandToDaemon(command, data)) {
+            return true;
+        }
+        syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", kStatusMgrModule, failureLine);
+        return false;
+    }
+};
+
+/// Lock, load, change, save, announce while the lock is held, unlock. Content of an unexpected type makes the
+/// JSON library throw in `change`: then nothing is saved or sent.
+template <typename Operation>
+bool Change(Operation change, const Announcement *announcement = nullptr) {
+    return NoThrow([&] {
+        Status status;
+        const ConfigUnlocker unlocker(status);
+        if (!status.Lock(true) || !status.Load() || !change(status) || !status.Save()) {
+            return false;
+        }
+        return announcement == nullptr || announcement->Send();
+    });
+}
+
+/// Without a lock: a save never shows a reader anything but a whole file.
+template <typename Operation>
+bool Ask(Operation ask) {
+    return NoThrow([&] {
+        Status status;
+        return status.Load() && ask(status);
+    });
+}
+
+/// In 32 bits, as the daemon reckons it: an end past January 2038 wraps to the past, and the daemon resumes at
+/// once instead of never.
+long long ResumeTimeIn(int hours) {
+    if (hours == 0) {
+        return 0;
+    }
+    const auto now = static_cast<std::uint32_t>(time(nullptr));
+    return static_cast<std::int32_t>(now + 3600U * static_cast<std::uint32_t>(hours));
+}
+
+Json::Value Object(const char *key, const Json::Value &value) {
+    Json::Value object(Json::objectValue);
+    object[key] = value;
+    return object;
+}
+
+}  // namespace
+
+bool StatusMgr::Pause(const int &hours) {
+    if (hours < 0) {
+        ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);
+        return false;
+    }
+    const long long resumeTime = ResumeTimeIn(hours);
+    const Announcement pause = {kPauseCommand, Object(kResumeTimeKey, static_cast<Json::Int64>(resumeTime)), 198};
+    return Change([&](Status &status) { return status.Pause(resumeTime); }, &pause);
+}
+
+bool StatusMgr::Resume() {
+    const Announcement resume = {kResumeCommand, Json::Value(Json::objectValue), 221};
+    return Change([](Status &status) { return status.Resume(); }, &resume);
+}
+
+bool StatusMgr::GetPauseInfo(long long &resumeTime) {
+    return Ask([&](Status &status) { return status.GetPauseInfo(resumeTime); });
+}
+
+bool StatusMgr::ShareSetNoSpace(const std::string &share, bool noSpace) {
+    return Change([&](Status &status) { return status.ShareSetNoSpace(share, noSpace); });
+}
+
+bool StatusMgr::ShareIsNoSpace(const std::string &share) {
+    return Ask([&](Status &status) { return status.ShareIsNoSpace(share); });
+}
+
+bool StatusMgr::ShareRevive(const std::string &share) {
+    const Announcement revive = {kReviveShareCommand, Object(kShareNameKey, share), 321};
+    return Change([&](Status &status) { return status.ShareSetNoSpace(share, false); }, &revive);
+}
+
+bool StatusMgr::ShareSetNeedReindex(const std::string &share, bool needReindex) {
+    return Change([&](Status &status) { return status.ShareSetNeedReindex(share, needReindex); });
+}
+
+bool StatusMgr::ShareIsNeedReindex(const std::string &share) {
+    return Ask([&](Status &status) { return status.ShareIsNeedReindex(share); });
+}
+
+bool StatusMgr::SetUpdated(const std::string &key) {
+    return Change([&](Status &status) { return status.SetUpdated(key); });
+}
+
+bool StatusMgr::IsUpdated(const std::string &key) {
+    return Ask([&](Status &status) { return status.IsUpdated(key); });
+}
+
+}  // namespace FILEINDEX
+}  // namespace VORK
