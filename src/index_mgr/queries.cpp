@@ -1,0 +1,112 @@
+#include "coverage.h"
+#include "names.h"
+#include "no_throw.h"
+#include "scoped.h"
+
+#include <fileindex/fileidx.h>
+#include <fileindex/folders.h>
+#include <fileindex/index_mgr.h>
+#include <fileindex/paths.h>
+
+#include <syslog.h>
+
+#include <algorithm>
+
+namespace VORK {
+namespace FILEINDEX {
+
+using namespace internal;
+
+bool IndexMgr::IsPathIndexed(const std::string &path, const std::vector<Folder> &folders) {
+    return std::any_of(folders.begin(), folders.end(),
+                       [&](const Folder &folder) { return IsAtOrUnder(path, folder.path); });
+}
+
+bool IndexMgr::IsPathContainIndexed(const std::string &path, const std::vector<Folder> &folders) {
+    return std::any_of(folders.begin(), folders.end(),
+                       [&](const Folder &folder) { return IsAtOrUnder(folder.path, path); });
+}
+
+bool IndexMgr::IsFullPathIndexed(const std::string &path, const std::vector<Folder> &folders) {
+    return NoThrow([&] {
+        return std::any_of(folders.begin(), folders.end(),
+                           [&](const Folder &folder) { return Covers(folder, path); });
+    });
+}
+
+bool IndexMgr::IsPathIndexed(const std::string &path) {
+    std::vector<Folder> folders;
+    return List(folders) && IsPathIndexed(path, folders);
+}
+
+bool IndexMgr::IsPathContainIndexed(const std::string &path) {
+    std::vector<Folder> folders;
+    return List(folders) && IsPathContainIndexed(path, folders);
+}
+
+bool IndexMgr::IsFullPathIndexed(const std::string &path) {
+    std::vector<Folder> folders;
+    return List(folders) && IsFullPathIndexed(path, folders);
+}
+
+bool IndexMgr::IsShareIndexed(const std::string &share) {
+    return NoThrow([&] {
+        std::vector<Folder> folders;
+        if (!List(folders)) {
+            return false;
+        }
+        for (const Folder &folder : folders) {
+            std::string owner;
+            if (!GetShareNameByPath(owner, folder.path)) {
+                syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", kIndexMgrModule, __LINE__,
+                       folder.path.c_str());
+                continue;
+            }
+            if (owner == share) {
+                return true;
+            }
+        }
+        return false;
+    });
+}
+
+bool IndexMgr::List(std::vector<Folder> &folders) {
+    return NoThrow([&] {
+        Folders store;
+        return store.Load() && store.List(folders);
+    });
+}
+
+bool IndexMgr::List(Json::Value &out, unsigned long offset, unsigned long limit, const std::string &sort_by,
+                    const std::string &sort_direction, const Json::Value &additional) {
+    return NoThrow([&] {
+        Folders store;
+        return store.Load() && store.List(out, offset, limit, sort_by, sort_direction, additional);
+    });
+}
+
+bool IndexMgr::Get(Json::Value &result, const std::string &path) {
+    return NoThrow([&] {
+        Folders store;
+        const ConfigUnlocker unlocker(store);
+        return store.Lock(true) && store.Load() && store.Get(result, path);
+    });
+}
+
+}  // namespace FILEINDEX
+}  // namespace VORK
+
+using VORK::FILEINDEX::IndexMgr;
+using VORK::FILEINDEX::internal::NoThrow;
+
+int FILEIDXIsFullPathIndexed(const char *szPath) {
+    return NoThrow([&] { return szPath != nullptr && IndexMgr::IsFullPathIndexed(szPath) ? 1 : 0; });
+}
+
+int FILEIDXIsPathIndexed(const char *szPath) {
+    return NoThrow([&] { return szPath != nullptr && IndexMgr::IsPathIndexed(szPath) ? 1 : 0; });
+}
+
+int FILEIDXIsShareIndexed(const char *szShare) {
+    return NoThrow([&] { return szShare != nullptr && IndexMgr::IsShareIndexed(szShare) ? 1 : 0; });
+}

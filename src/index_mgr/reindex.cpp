@@ -1,0 +1,85 @@
+#include "json/text.h"
+#include "names.h"
+#include "no_throw.h"
+
+#include <fileindex/daemon.h>
+#include <fileindex/error.h>
+#include <fileindex/index_mgr.h>
+#include <fileindex/paths.h>
+#include <fileindex/status_mgr.h>
+
+#include <syslog.h>
+
+#include <set>
+
+namespace VORK {
+namespace FILEINDEX {
+
+using namespace internal;
+
+namespace {
+
+bool Malformed(const Json::Value &what, int line) {
+    syslog(LOG_ERR, "%s:%d Malformed jsArrPath: %s", kIndexMgrModule, line, ToString(what).c_str());
+    ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);
+    return false;
+}
+
+/// Checks the whole request before anything is changed, and finds the shares that are out of space.
+bool Check(const Json::Value &paths, std::set<std::string> &outOfSpace) {
+    for (const Json::Value &element : paths) {
+        if (!element.isString()) {
+            return Malformed(element, 377);
+        }
+        const std::string path = element.asString();
+        std::string share;
+        if (!GetShareNameByPath(share, path)) {
+            syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", kIndexMgrModule, 384, path.c_str());
+            return false;
+        }
+        if (!IndexMgr::IsShareIndexed(share)) {
+            return false;
+        }
+        if (StatusMgr::ShareIsNoSpace(share)) {
+            outOfSpace.insert(share);
+        }
+    }
+    return true;
+}
+
+}  // namespace
+
+bool IndexMgr::Reindex(const Json::Value &jsArrPath) {
+    return NoThrow([&] {
+        if (!jsArrPath.isArray()) {
+            return Malformed(jsArrPath, 369);
+        }
+        std::set<std::string> outOfSpace;
+        if (!Check(jsArrPath, outOfSpace)) {
+            return false;
+        }
+        for (const std::string &share : outOfSpace) {
+            if (!StatusMgr::ShareRevive(share)) {
+                // The events below are worth queuing even so: the daemon finds them when the share is revived.
+                syslog(LOG_ERR, "%s:%d ShareRevice failed, share=%s", kIndexMgrModule, 400, share.c_str());
+            }
+        }
+        for (const Json::Value &element : jsArrPath) {
+            const std::string path = element.asString();
+            std::string fullPath;
+            if (!GetFullPath(fullPath, path)) {
+                syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", kIndexMgrModule, 407, path.c_str());
+                ErrorHandler::SetError(FILEINDEX_ERR_PATH);
+                return false;
+            }
+            if (!AddCustomEvent(kReindexEvent, fullPath, Json::Value())) {
+                syslog(LOG_ERR, "%s:%d AddCustomEvent failed, path=%s", kIndexMgrModule, 413, path.c_str());
+                return false;
+            }
+        }
+        return true;
+    });
+}
+
+}  // namespace FILEINDEX
+}  // namespace VORK

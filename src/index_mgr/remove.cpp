@@ -1,0 +1,133 @@
+#include "index_mgr/changes.h"
+#include "index_mgr/stop_indexing.h"
+#include "json/text.h"
+#include "names.h"
+#include "no_throw.h"
+#include "scoped.h"
+
+#include <fileindex/daemon.h>
+#include <fileindex/error.h>
+#include <fileindex/folders.h>
+#include <fileindex/index_mgr.h>
+#include <fileindex/paths.h>
+
+#include <syslog.h>
+
+#include <vector>
+
+namespace VORK {
+namespace FILEINDEX {
+
+using namespace internal;
+
+namespace {
+
+constexpr StopIndexingLines kStopLines = {89, 94, 96};
+
+bool BadParam(const Json::Value &what) {
+    syslog(LOG_ERR, "%s:%d Bad param: %s", kIndexMgrModule, 61, ToString(what).c_str());
+    ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);
+    return false;
+}
+
+/// In memory: a batch that fails in the middle leaves folder.conf as it was.
+bool DeleteAll(Folders &store, const Json::Value &paths, Changes &changes) {
+    for (const Json::Value &element : paths) {
+        if (!element.isString()) {
+            return BadParam(element);
+        }
+        const std::string path = element.asString();
+        Json::Value report;
+        if (!store.Delete(report, path)) {
+            syslog(LOG_ERR, "%s:%d Delete failed, path=%s", kIndexMgrModule, 73, path.c_str());
+            return false;
+        }
+        changes.reports[path] = report;
+        std::string share;
+        if (!GetShareNameByPath(share, path)) {
+            syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", kIndexMgrModule, 79, path.c_str());
+            return false;
+        }
+        changes.shares.insert(share);
+    }
+    return true;
+}
+
+bool SendCommands(const Json::Value &paths) {
+    Json::Value command(Json::objectValue);
+    for (const Json::Value &path : paths) {
+        command[kFolderPathKey] = path.asString();
+        if (!SendCammandToDaemon(kDeleteCommand, command)) {
+            syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", kIndexMgrModule, 104);
+            return false;
+        }
+    }
+    return true;
+}
+
+bool QueueEvents(const Json::Value &reports) {
+    for (auto report = reports.begin(); report != reports.end(); ++report) {
+        if (!IndexMgr::Update(report.name(), *report)) {
+            syslog(LOG_ERR, "%s:%d Update failed", kIndexMgrModule, 111);
+            return false;
+        }
+    }
+    return true;
+}
+
+bool FollowShare(Folders &saved, const std::string &share) {
+    if (IndexMgr::IsShareIndexed(share)) {
+        if (IndexMgr::UpsertVorkNotifydCfg(share)) {
+            return true;
+        }
+        syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", kIndexMgrModule, 121, share.c_str());
+        return false;
+    }
+    // "No" can also mean that folder.conf could not be read again. Cleaning then would delete the index of a share
+    // that is in use; what was just saved decides.
+    std::vector<Folder> left;
+    saved.List(left, share);
+    if (!left.empty()) {
+        syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", kIndexMgrModule, 121, share.c_str());
+        return false;
+    }
+    if (!IndexMgr::CleanShareIndexData(share)) {
+        syslog(LOG_ERR, "%s:%d CleanShareIndexData failed, share=%s", kIndexMgrModule, 126, share.c_str());
+        return false;
+    }
+    if (!IndexMgr::DeleteVorkNotifydCfg(share)) {
+        syslog(LOG_ERR, "%s:%d DeleteVorkNtifydCfg failed, share=%s", kIndexMgrModule, 130, share.c_str());
+        return false;
+    }
+    return true;
+}
+
+}  // namespace
+
+bool IndexMgr::Delete(const Json::Value &paths) {
+    return NoThrow([&] {
+        if (!paths.isArray()) {
+            return BadParam(paths);
+        }
+        Folders store;
+        const ConfigUnlocker unlocker(store);
+        Changes changes;
+        if (!store.Lock(true) || !store.Load() || !DeleteAll(store, paths, changes) || !store.Save()) {
+            return false;
+        }
+        if (IsEmpty(store)) {
+            StopIndexing(kStopLines);  // nobody is left to hear of commands and events
+        } else if (!SendCommands(paths) || !QueueEvents(changes.reports)) {
+            return false;
+        }
+        for (const std::string &share : changes.shares) {
+            if (!FollowShare(store, share)) {
+                return false;
+            }
+        }
+        return true;
+    });
+}
+
+}  // namespace FILEINDEX
+}  // namespace VORK

@@ -1,0 +1,140 @@
+#include "index_mgr/changes.h"
+#include "json/text.h"
+#include "names.h"
+#include "no_throw.h"
+#include "scoped.h"
+#include "utils/services.h"
+
+#include <fileindex/daemon.h>
+#include <fileindex/error.h>
+#include <fileindex/folders.h>
+#include <fileindex/index_mgr.h>
+#include <fileindex/json_access.h>
+#include <fileindex/paths.h>
+
+#include <syslog.h>
+
+namespace VORK {
+namespace FILEINDEX {
+
+using namespace internal;
+
+namespace {
+
+/// The element's "path"; empty, which no folder has, when the element is no object or the member no string.
+std::string PathOf(const Json::Value &element) {
+    std::string path;
+    RetrieveStringFromJsonObj(path, kPathKey, element);
+    return path;
+}
+
+/// In memory: a batch that fails in the middle leaves folder.conf as it was.
+bool UpsertAll(Folders &store, const Json::Value &folders, Changes &changes) {
+    for (const Json::Value &element : folders) {
+        const std::string path = PathOf(element);
+        Json::Value report;
+        if (!store.Upsert(report, element)) {
+            syslog(LOG_ERR, "%s:%d Upsert failed, folder=%s", kIndexMgrModule, 582, ToString(element).c_str());
+            return false;
+        }
+        changes.reports[path] = report;
+        std::string share;
+        if (!GetShareNameByPath(share, path)) {
+            syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", kIndexMgrModule, 588, path.c_str());
+            return false;
+        }
+        changes.shares.insert(share);
+    }
+    return true;
+}
+
+bool RegisterMonitors(const std::set<std::string> &shares) {
+    for (const std::string &share : shares) {
+        if (!IndexMgr::UpsertVorkNotifydCfg(share)) {
+            syslog(LOG_ERR, "%s:%d UpsertVorkNtifydCfg failed, share=%s", kIndexMgrModule, 598, share.c_str());
+            return false;
+        }
+    }
+    return true;
+}
+
+bool SendCommands(const Json::Value &folders) {
+    Json::Value command(Json::objectValue);
+    for (const Json::Value &element : folders) {
+        command[kFolderPathKey] = PathOf(element);
+        if (!SendCammandToDaemon(kUpsertCommand, command)) {
+            syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", kIndexMgrModule, 621);
+            return false;
+        }
+    }
+    return true;
+}
+
+bool QueueEvents(const Json::Value &reports) {
+    for (auto report = reports.begin(); report != reports.end(); ++report) {
+        const std::string path = report.name();
+        std::string fullPath;
+        if (!GetFullPath(fullPath, path)) {
+            syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", kIndexMgrModule, 629, path.c_str());
+            ErrorHandler::SetError(FILEINDEX_ERR_PATH);
+            return false;
+        }
+        if (!AddCustomEvent(kSettingEvent, fullPath, *report)) {
+            syslog(LOG_ERR, "%s:%d AddCustomEvent failed", kIndexMgrModule, 634);
+            return false;
+        }
+    }
+    return true;
+}
+
+}  // namespace
+
+bool IndexMgr::Upsert(const Json::Value &folders) {
+    return NoThrow([&] {
+        if (!folders.isArray()) {
+            syslog(LOG_ERR, "%s:%d Bad param: %s", kIndexMgrModule, 569, ToString(folders).c_str());
+            ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);
+            return false;
+        }
+        Folders store;
+        const ConfigUnlocker unlocker(store);
+        Changes changes;
+        if (!store.Lock(true) || !store.Load() || !UpsertAll(store, folders, changes) || !store.Save()) {
+            return false;
+        }
+        // Saved before anyone is told, and never taken back: the daemons read the file when they hear of it, and
+        // the same call repeated completes what a failure from here on leaves undone.
+        if (!RegisterMonitors(changes.shares) || !StartDaemon({kIndexMgrModule, 605})) {
+            return false;
+        }
+        EnsureSearch(true, {kIndexMgrModule, 611}, {kIndexMgrModule, 613});
+        return SendCommands(folders) && QueueEvents(changes.reports);
+    });
+}
+
+bool IndexMgr::Set(const Json::Value &folders) {
+    return Upsert(folders);
+}
+
+bool IndexMgr::Add(const Json::Value &folders) {
+    return Upsert(folders);
+}
+
+bool IndexMgr::Update(const std::string &path, const Json::Value &data) {
+    return NoThrow([&] {
+        std::string fullPath;
+        if (!GetFullPath(fullPath, path)) {
+            syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", kIndexMgrModule, 430, path.c_str());
+            ErrorHandler::SetError(FILEINDEX_ERR_PATH);
+            return false;
+        }
+        if (!AddCustomEvent(kSettingEvent, fullPath, data)) {
+            syslog(LOG_ERR, "%s:%d AddCustomEvent failed", kIndexMgrModule, 436);
+            return false;
+        }
+        return true;
+    });
+}
+
+}  // namespace FILEINDEX
+}  // namespace VORK

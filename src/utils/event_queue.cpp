@@ -1,0 +1,163 @@
+#include "json/text.h"
+#include "names.h"
+#include "no_throw.h"
+#include "scoped.h"
+#include "utils/queue_file.h"
+
+#include <fileindex/daemon.h>
+#include <fileindex/error.h>
+#include <fileindex/fileidx.h>
+#include <fileindex/paths.h>
+#include <fileindex/status_mgr.h>
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdlib>
+
+namespace VORK {
+namespace FILEINDEX {
+
+using namespace internal;
+
+namespace {
+
+constexpr int kLockAttempts = 3;
+constexpr int kMaxReopens = 16;
+
+bool WantDebugRecords() {
+    return LOG_LEVEL == kDebugLevel;
+}
+
+/// Is a reindex of exactly this path waiting in the file?
+bool IsReindexQueued(const std::string &fullPath, const std::string &queueFile) {
+    if (!IsFileExist(queueFile)) {
+        return false;
+    }
+    bool queued = false;
+    const bool opened = ScanQueue(queueFile, [&](std::string_view, const QueueEvent *event) {
+        queued =
+            event != nullptr && event->type == static_cast<unsigned>(kReindexEvent) && event->path == fullPath;
+        return !queued;
+    });
+    if (!opened) {
+        syslog(LOG_ERR, "%s:%d Failed to open queue=%s, reason=%m", kUtilsModule, 95, queueFile.c_str());
+    }
+    return queued;
+}
+
+UniqueFd OpenForAppend(const std::string &queuePath) {
+    constexpr int kFlags = O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK;
+    UniqueFd fd(open(queuePath.c_str(), kFlags, 0644));
+    struct stat status = {};
+    if (!fd || fstat(fd.Get(), &status) != 0 || !S_ISREG(status.st_mode)) {
+        return {};
+    }
+    return fd;
+}
+
+/// The daemon takes a queue by renaming it; a line written to the file it has taken might never be read.
+bool StillNames(const std::string &queuePath, int fd) {
+    struct stat named = {};
+    struct stat opened = {};
+    return lstat(queuePath.c_str(), &named) == 0 && fstat(fd, &opened) == 0 && named.st_dev == opened.st_dev &&
+           named.st_ino == opened.st_ino;
+}
+
+void WriteLine(int fd, const std::string &line) {
+    const ssize_t written = write(fd, line.data(), line.size());
+    if (written < static_cast<ssize_t>(line.size()) && WantDebugRecords()) {
+        syslog(LOG_ERR, "%s:%d write fail, (%ld, %ld)", kUtilsModule, 502, static_cast<long>(written),
+               static_cast<long>(line.size()));
+    }
+}
+
+/// Appends the line under the queue's own lock. True also when the line was written short, and when the lock
+/// stayed busy and the line was dropped: a caller must not be held up, and the daemon rescans what it misses.
+/// False when the queue cannot be used at all.
+bool Append(const std::string &queuePath, const std::string &line) {
+    int reopens = 0;
+    int lockError = 0;
+    for (int attempt = 0; attempt < kLockAttempts;) {
+        UniqueFd fd = OpenForAppend(queuePath);
+        if (!fd) {
+            return false;
+        }
+        if (flock(fd.Get(), LOCK_EX | LOCK_NB) != 0) {
+            lockError = errno;
+            if (lockError != EINTR && lockError != EAGAIN) {
+                if (WantDebugRecords()) {
+                    syslog(LOG_ERR, "%s:%d flock fail, path=%s, reason=%m", kUtilsModule, 507, queuePath.c_str());
+                }
+                return false;
+            }
+            fd.Close();
+            usleep(static_cast<useconds_t>(rand() % 10) * 1000);
+            ++attempt;
+            continue;
+        }
+        if (!StillNames(queuePath, fd.Get())) {
+            if (++reopens > kMaxReopens) {
+                return false;
+            }
+            continue;
+        }
+        WriteLine(fd.Get(), line);
+        flock(fd.Get(), LOCK_UN);
+        return true;
+    }
+    if (WantDebugRecords()) {
+        errno = lockError;
+        syslog(LOG_ERR, "%s:%d try lock too many times, path=%s, reason=%m", kUtilsModule, 516, queuePath.c_str());
+    }
+    return true;
+}
+
+/// Sets `share` as soon as it is known; false when the event cannot be queued.
+bool QueueEventOf(std::string &share, int type, const std::string &fullPath, const Json::Value &data) {
+    char shareName[kShareNameSize] = {};
+    char sharePath[kPathSize] = {};
+    if (VORKShareNamePathGet(fullPath.c_str(), shareName, sizeof(shareName), sharePath, sizeof(sharePath)) < 0) {
+        syslog(LOG_ERR, "%s:%d VORKShareNamePathGet failed, path=%s", kUtilsModule, 472, fullPath.c_str());
+        return false;
+    }
+    share = shareName;
+    char buffer[kPathSize] = {};
+    if (FILEIDXQueuePathGet(shareName, buffer, sizeof(buffer)) < 0) {
+        syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kUtilsModule, 478, shareName);
+        return false;
+    }
+    const std::string queuePath = buffer;
+    // Whatever the new event is: a reindex that is still to come makes it redundant.
+    if (IsReindexQueued(fullPath, queuePath) || IsReindexQueued(fullPath, queuePath + kQueueTmpSuffix)) {
+        return true;
+    }
+    Json::Value record(Json::objectValue);
+    record[kEventKey] = type;
+    record[kPathKey] = fullPath;
+    record[kDataKey] = data;
+    return Append(queuePath, ToString(record) + "\n");
+}
+
+}  // namespace
+
+bool AddCustomEvent(const int &type, const std::string &fullPath, const Json::Value &data) {
+    return NoThrow([&] {
+        std::string share;
+        if (QueueEventOf(share, type, fullPath, data)) {
+            return true;
+        }
+        // Outside every share the name is empty; the mark is then the only trace of the lost event.
+        if (!StatusMgr::ShareSetNeedReindex(share, true)) {
+            syslog(LOG_ERR, "%s:%d ShareSetNeedReindex failed, share=%s", kUtilsModule, 522, share.c_str());
+        }
+        return false;
+    });
+}
+
+}  // namespace FILEINDEX
+}  // namespace VORK

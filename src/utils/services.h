@@ -1,0 +1,26 @@
+/// \file
+/// The services that follow the folder list: the daemon, and the file-sharing service's search setting.
+#ifndef FILEINDEX_SRC_UTILS_SERVICES_H
+#define FILEINDEX_SRC_UTILS_SERVICES_H
+
+namespace VORK::FILEINDEX::internal {
+
+/// Where a failure is reported from: each operation keeps records of its own for the same step.
+struct RecordAt {
+    const char *module;
+    int line;
+};
+
+bool StartDaemon(const RecordAt &failure);
+bool StopDaemon(const RecordAt &failure);
+
+/// Stores the setting; nothing takes effect before the service is restarted.
+bool SetSearch(bool on, const RecordAt &failure);
+
+/// Brings the setting to `on` and restarts the service, unless it is so already. A setting that cannot be
+/// stored restarts nothing. Failures are recorded and otherwise ignored: the index is right without it.
+void EnsureSearch(bool on, const RecordAt &setFailure, const RecordAt &restartFailure);
+
+}  // namespace VORK::FILEINDEX::internal
+
+#endif
