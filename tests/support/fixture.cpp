@@ -1,0 +1,181 @@
+#include "fixture.h"
+
+#include <json/reader.h>
+#include <json/writer.h>
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/syscall.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <iostream>
+#include <memory>
+#include <sstream>
+
+namespace fs = std::filesystem;
+
+namespace fileindex_test {
+namespace {
+
+void Empty(const fs::path &directory) {
+    fs::create_directories(directory);
+    for (const auto &entry : fs::directory_iterator(directory)) {
+        fs::remove_all(entry.path());
+    }
+}
+
+/// The library's places are fixed: only where they are the test's own may it empty them.
+bool InPrivateNamespace() {
+    return ReadFile("/proc/self/mountinfo").find("fileindex-private") != std::string::npos;
+}
+
+}  // namespace
+
+Json::Value Parse(const std::string &text) {
+    Json::CharReaderBuilder builder;
+    Json::CharReaderBuilder::strictMode(&builder.settings_);
+    builder["strictRoot"] = false;
+    const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
+    Json::Value value;
+    std::string errors;
+    if (!reader->parse(text.data(), text.data() + text.size(), &value, &errors)) {
+        std::cerr << "not JSON: " << text << "\n" << errors;
+        std::abort();
+    }
+    return value;
+}
+
+std::string Print(const Json::Value &value) {
+    Json::StreamWriterBuilder builder;
+    builder["indentation"] = "";
+    builder["emitUTF8"] = true;
+    return Json::writeString(builder, value);
+}
+
+std::string Canonical(const std::string &text) {
+    return text == "(missing)" ? text : Print(Parse(text));
+}
+
+std::string ReadFile(const std::string &path) {
+    std::ifstream file(path, std::ios::binary);
+    if (!file) {
+        return "(missing)";
+    }
+    std::ostringstream text;
+    text << file.rdbuf();
+    return text.str();
+}
+
+void WriteFile(const std::string &path, const std::string &text) {
+    std::ofstream file(path, std::ios::binary | std::ios::trunc);
+    file << text;
+    ASSERT_TRUE(file.flush()) << path;
+}
+
+std::string FolderRecord(const std::string &path, const std::string &name, const std::string &flags) {
+    const auto flag = [&flags](char letter) { return flags.find(letter) == std::string::npos ? "false" : "true"; };
+    std::ostringstream text;
+    text << '"' << path << R"(":{"audio":)" << flag('a') << R"(,"document":)" << flag('d') << R"(,"name":")"
+         << name << R"(","path":")" << path << R"(","photo":)" << flag('p') << R"(,"video":)" << flag('v') << '}';
+    return text.str();
+}
+
+void FileIndexTest::SetUp() {
+    ASSERT_TRUE(InPrivateNamespace()) << "to be run by scripts/in-private-namespace";
+    Empty(kConfigDir);
+    fs::remove(kFolderLock);
+    fs::remove(kStatusLock);
+    Platform::Current() = Platform();
+    Script::Current().Reset();
+    Forget();
+    LOG_LEVEL = 3;
+    descriptors_ = OpenDescriptors();
+}
+
+void FileIndexTest::TearDown() {
+    for (const std::string &directory : directories_) {
+        fs::remove_all(directory);
+    }
+    EXPECT_THAT(Script::Current().Finish(), IsEmpty()) << "failures that were scripted and never took place";
+    daemon_.Stop();
+    EXPECT_EQ(descriptors_, OpenDescriptors());
+    EXPECT_EQ(0, Platform::Current().shareRecords);
+    EXPECT_EQ(0, Platform::Current().monitorQueues);
+    const std::set<std::string> modules = {"config.cpp", "folder.cpp",     "folders.cpp",  "status.cpp",
+                                           "utils.cpp",  "status_mgr.cpp", "index_mgr.cpp"};
+    for (const LogRecord &record : SyslogCapture::Records()) {
+        EXPECT_EQ(LOG_ERR, record.priority) << record.format;
+        EXPECT_TRUE(modules.contains(record.file)) << record.format << " from " << record.file;
+        EXPECT_GT(record.line, 0) << record.format;
+    }
+}
+
+void FileIndexTest::GivenShare(const std::string &name, const std::string &path) {
+    const std::string directory = path.empty() ? "/vol1/" + name : path;
+    fs::create_directories(directory);
+    directories_.push_back(directory);
+    Platform::Current().shares[name].path = directory;
+}
+
+void FileIndexTest::GivenFolders(const std::vector<std::string> &records) {
+    std::string text;
+    for (const std::string &record : records) {
+        text += (text.empty() ? "{" : ",") + record;
+    }
+    GivenFolderConf(text + "}");
+}
+
+void FileIndexTest::GivenQueue(const std::string &share, const std::string &text, const std::string &suffix) {
+    fs::create_directories(fs::path(QueuePath(share)).parent_path());
+    WriteFile(QueuePath(share) + suffix, text);
+}
+
+std::string FileIndexTest::QueuePath(const std::string &share) {
+    return Platform::Current().shares.at(share).path + "/@eaDir/VORK@file_index_queue";
+}
+
+std::vector<std::string> FileIndexTest::Queue(const std::string &share) {
+    std::ifstream file(QueuePath(share));
+    std::vector<std::string> lines;
+    for (std::string line; std::getline(file, line);) {
+        lines.push_back(line);
+    }
+    return lines;
+}
+
+std::vector<std::string> FileIndexTest::Records() {
+    const std::set<std::string> unnumbered = {"config.cpp", "folder.cpp", "folders.cpp"};
+    std::vector<std::string> records;
+    for (const LogRecord &record : SyslogCapture::Records()) {
+        const std::string line = unnumbered.contains(record.file) ? "" : ":" + std::to_string(record.line);
+        records.push_back(record.file + line + " " + record.message);
+    }
+    return records;
+}
+
+_tag_fileindex_err_ FileIndexTest::TakeError() {
+    const _tag_fileindex_err_ code = ErrorHandler::GetError();
+    ErrorHandler::SetError(FILEINDEX_ERR_NONE);
+    return code;
+}
+
+void FileIndexTest::Forget() {
+    Script::Current().ClearJournal();
+    SyslogCapture::Clear();
+    TakeError();
+}
+
+bool FileIndexTest::IsLocked(const std::string &lockFile) {
+    const long fd = ::syscall(SYS_openat, AT_FDCWD, lockFile.c_str(), O_RDWR | O_CLOEXEC);
+    const bool locked = fd >= 0 && ::syscall(SYS_flock, fd, LOCK_EX | LOCK_NB) != 0;
+    if (fd >= 0) {
+        ::syscall(SYS_close, fd);
+    }
+    return locked;
+}
+
+}  // namespace fileindex_test

@@ -1,0 +1,85 @@
+/// \file
+/// The fixture of all unit tests: an empty machine, and verbs to furnish it and to look at what became of it.
+#pragma once
+
+#include "fake_daemon.h"
+#include "platform.h"
+#include "processes.h"
+#include "script.h"
+#include "syslog_capture.h"
+
+#include <fileindex/fileindex.h>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <json/value.h>
+
+#include <set>
+#include <string>
+#include <vector>
+
+namespace fileindex_test {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+using namespace VORK::FILEINDEX;  // NOLINT(google-build-using-namespace): the subject of every test
+
+constexpr char kConfigDir[] = "/usr/vork/etc/fileindex";
+constexpr char kFolderConf[] = "/usr/vork/etc/fileindex/folder.conf";
+constexpr char kStatusConf[] = "/usr/vork/etc/fileindex/status.conf";
+constexpr char kFolderLock[] = "/tmp/fileidx_cfg_folder.lock";
+constexpr char kStatusLock[] = "/tmp/fileidx_cfg_status.lock";
+
+Json::Value Parse(const std::string &text);  ///< strict; a text that is no JSON ends the test program
+std::string Print(const Json::Value &value);
+std::string Canonical(const std::string &text);  ///< Print(Parse(text)): one spelling for each document
+
+std::string ReadFile(const std::string &path);  ///< "(missing)" when there is no file
+void WriteFile(const std::string &path, const std::string &text);
+
+/// {path: {record}} with the flags named by letters of "davp", for putting documents together.
+std::string FolderRecord(const std::string &path, const std::string &name, const std::string &flags);
+
+class FileIndexTest : public testing::Test {
+protected:
+    void SetUp() override;
+
+    /// Every test ends with all descriptors, share records and monitor queues given back, with well-formed
+    /// records in the log, and with every scripted failure used.
+    void TearDown() override;
+
+    /// A share with a real directory; /vol1/NAME unless said otherwise.
+    void GivenShare(const std::string &name, const std::string &path = "");
+    /// The members of an object, as FolderRecord makes them.
+    static void GivenFolders(const std::vector<std::string> &records);
+    static void GivenFolderConf(const std::string &text) { WriteFile(kFolderConf, text); }
+    static void GivenStatusConf(const std::string &text) { WriteFile(kStatusConf, text); }
+    static void GivenQueue(const std::string &share, const std::string &text, const std::string &suffix = "");
+    static void Fail(Fault fault) { Script::Current().Fail(std::move(fault)); }
+
+    static std::string QueuePath(const std::string &share);
+    /// The lines of the share's queue file.
+    static std::vector<std::string> Queue(const std::string &share);
+    std::vector<std::string> SentCommands() { return daemon_.Commands(); }
+    static std::vector<std::string> Journal() { return Script::Current().Journal(); }
+
+    /// "file:line message" for each record; without the line for the modules that give none for good.
+    static std::vector<std::string> Records();
+    /// The error code, and back to none.
+    static _tag_fileindex_err_ TakeError();
+    /// Forgets what was recorded, logged and left as error code so far.
+    static void Forget();
+
+    static std::string FolderConf() { return Canonical(ReadFile(kFolderConf)); }
+    static std::string StatusConf() { return Canonical(ReadFile(kStatusConf)); }
+
+    static bool IsLocked(const std::string &lockFile);
+
+    FakeDaemon daemon_;
+
+private:
+    std::set<std::string> descriptors_;
+    std::vector<std::string> directories_;
+};
+
+}  // namespace fileindex_test

@@ -1,0 +1,313 @@
+#include "platform.h"
+
+#include "script.h"
+
+#include <vork/error.h>
+#include <vork/filesystem.h>
+#include <vork/metadata.h>
+#include <vork/process.h>
+#include <vork/quota.h>
+#include <vork/search.h>
+#include <vork/service.h>
+#include <vork/share.h>
+#include <vork/text.h>
+#include <vorknotifyd/monitor_queue.h>
+
+#include <json/writer.h>
+
+#include <strings.h>
+#include <sys/stat.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <filesystem>
+#include <stdexcept>
+#include <string>
+
+namespace fileindex_test {
+
+Platform &Platform::Current() {
+    static Platform platform;
+    return platform;
+}
+
+namespace {
+
+Platform &World() {
+    return Platform::Current();
+}
+
+/// The scripted result of a call if it is to fail, with the platform's error set as a real one would.
+std::optional<long> Failure(const char *call, const std::string &about = {}) {
+    const auto fault = Script::Current().Take(call, about);
+    if (!fault) {
+        return std::nullopt;
+    }
+    if (fault->result <= 0) {
+        VLIBCErrSetEx(fault->error, "platform.c", 77);
+    }
+    return fault->result;
+}
+
+/// A call that changes something: one line of the journal, unless it is to fail.
+int Effect(const char *call, const std::string &about, const std::string &line) {
+    if (const auto result = Failure(call, about)) {
+        return static_cast<int>(*result);
+    }
+    Script::Current().Record(line);
+    return 0;
+}
+
+bool StartsWithAny(const std::string &path, const std::set<std::string> &beginnings) {
+    for (const std::string &beginning : beginnings) {
+        if (path.starts_with(beginning)) {
+            return true;
+        }
+    }
+    return false;
+}
+
+std::string OneLine(const Json::Value &value) {
+    Json::StreamWriterBuilder builder;
+    builder["indentation"] = "";
+    return Json::writeString(builder, value);
+}
+
+struct ShareRecord : _tag_VORKSHARE {
+    std::string name, path;
+};
+
+int ShareFlag(const _tag_VORKSHARE *share, const char *call, bool FakeShare::*flag, int *out) {
+    if (const auto result = Failure(call, share->szName)) {
+        return static_cast<int>(*result);
+    }
+    *out = World().shares.at(share->szName).*flag ? 1 : 0;
+    return 0;
+}
+
+}  // namespace
+}  // namespace fileindex_test
+
+using namespace fileindex_test;
+
+extern "C" {
+
+int VORKShareGet(const char *szName, _tag_VORKSHARE **ppShare) {
+    if (const auto result = Failure("VORKShareGet", szName)) {
+        if (*result == 0) {
+            *ppShare = nullptr;
+        }
+        return static_cast<int>(*result);
+    }
+    const auto found = World().shares.find(szName);
+    if (found == World().shares.end()) {
+        VLIBCErrSetEx(VORK_ERR_NO_SUCH_SHARE, "platform.c", 77);
+        return -1;
+    }
+    auto *record = new ShareRecord();
+    record->name = found->first;
+    record->path = found->second.path;
+    record->szName = record->name.c_str();
+    record->szPath = record->path.c_str();
+    ++World().shareRecords;
+    *ppShare = record;
+    return 0;
+}
+
+void VORKShareFree(_tag_VORKSHARE *pShare) {
+    if (pShare != nullptr) {
+        --World().shareRecords;
+        delete static_cast<ShareRecord *>(pShare);
+    }
+}
+
+int VORKShareNamePathGet(const char *szFullPath, char *szName, int cbName, char *szPath, int cbPath) {
+    if (const auto result = Failure("VORKShareNamePathGet", szFullPath)) {
+        return static_cast<int>(*result);
+    }
+    for (const auto &[name, share] : World().shares) {
+        if ((std::string(szFullPath) + "/").starts_with(share.path + "/")) {
+            std::snprintf(szName, static_cast<size_t>(cbName), "%s", name.c_str());
+            std::snprintf(szPath, static_cast<size_t>(cbPath), "%s", share.path.c_str());
+            return 0;
+        }
+    }
+    VLIBCErrSetEx(VORK_ERR_NO_SUCH_SHARE, "platform.c", 77);
+    return -1;
+}
+
+int VORKShareIsShareRecycle(const char *szFullPath) {
+    Script::Current().Take("VORKShareIsShareRecycle", szFullPath);
+    return StartsWithAny(szFullPath, World().recycleBins) ? 2 : 0;
+}
+
+int VLIBShareIsEncryptedGet(const _tag_VORKSHARE *pShare, int *pEncrypted) {
+    return ShareFlag(pShare, "VLIBShareIsEncryptedGet", &FakeShare::encrypted, pEncrypted);
+}
+
+int VLIBShareIsEncryptionGet(const _tag_VORKSHARE *pShare, int *pEncryption) {
+    return ShareFlag(pShare, "VLIBShareIsEncryptionGet", &FakeShare::encryptionKind, pEncryption);
+}
+
+int VLIBShareIsReadOnlyGet(const _tag_VORKSHARE *pShare, int *pReadOnly) {
+    return ShareFlag(pShare, "VLIBShareIsReadOnlyGet", &FakeShare::readOnly, pReadOnly);
+}
+
+int VORKGetFSType(const char *szPath, int flags) {
+    if (flags != 0) {
+        throw std::logic_error("VORKGetFSType: flags");
+    }
+    for (const auto &[beginning, type] : World().fsTypes) {
+        if (std::string(szPath).starts_with(beginning)) {
+            return type;
+        }
+    }
+    return kPlainFs;
+}
+
+int VORKFSIsRemoteFS(int type) {
+    return type == kRemoteFs ? 1 : 0;
+}
+
+int VORKFSIsImageFS(int type) {
+    return type == kImageFs ? 1 : 0;
+}
+
+int VORKFSDirIsMntPoint(const char *szPath) {
+    if (const auto result = Failure("VORKFSDirIsMntPoint", szPath)) {
+        return static_cast<int>(*result);
+    }
+    return World().mountPoints.contains(szPath) ? 1 : 0;
+}
+
+int VLIBFhsPathInSnapshot(const char *szPath, int *pInSnapshot) {
+    if (const auto result = Failure("VLIBFhsPathInSnapshot", szPath)) {
+        *pInSnapshot = 1;  // what a failed call leaves behind is not to be believed
+        return static_cast<int>(*result);
+    }
+    *pInSnapshot = StartsWithAny(szPath, World().snapshots) ? 1 : 0;
+    return 0;
+}
+
+int VORKEAIsHiddenDir(const char *szName) {
+    if (const auto result = Failure("VORKEAIsHiddenDir", szName)) {
+        return static_cast<int>(*result);
+    }
+    return std::string(szName) == "@eaDir" ? 1 : 0;
+}
+
+int VORKEAMKDir(int flags, const char *szPath) {
+    if (const auto result = Failure("VORKEAMKDir", szPath)) {
+        return static_cast<int>(*result);
+    }
+    return flags == 0 && (::mkdir(szPath, 0755) == 0 || errno == EEXIST) ? 0 : -1;
+}
+
+int VORKQuotaIsEnough(unsigned int uid, const char *szPath, unsigned long long cbRequired) {
+    const std::string question =
+        std::to_string(uid) + " " + std::string(szPath) + " " + std::to_string(cbRequired);
+    return static_cast<int>(Failure("VORKQuotaIsEnough", question).value_or(1));
+}
+
+int VLIBServiceStart(const char *szName, int flag) {
+    return Effect("VLIBServiceStart", szName, "start " + std::string(szName) + " " + std::to_string(flag));
+}
+
+int VLIBServiceStop(const char *szName, int flag) {
+    return Effect("VLIBServiceStop", szName, "stop " + std::string(szName) + " " + std::to_string(flag));
+}
+
+int VLIBServiceRestart(const char *szName) {
+    return Effect("VLIBServiceRestart", szName, "restart " + std::string(szName));
+}
+
+int VORKSMBIsEnableSpotlight(void) {
+    Script::Current().Take("VORKSMBIsEnableSpotlight");
+    return World().searchOn ? 5 : 0;
+}
+
+int VORKSMBSetSpotlight(int enable) {
+    const int result = Effect("VORKSMBSetSpotlight", {}, "search " + std::to_string(enable));
+    if (result >= 0) {
+        World().searchOn = enable != 0;
+    }
+    return result;
+}
+
+int VLIBCErrGet(void) {
+    return World().errorCode;
+}
+
+void VLIBCErrSetEx(int code, const char *szFile, int line) {
+    World().errorCode = code;
+    World().errorFile = szFile;
+    World().errorLine = line;
+}
+
+const char *VLIBCErrorGetFile(void) {
+    return World().errorFile.c_str();
+}
+
+int VLIBCErrorGetLine(void) {
+    return World().errorLine;
+}
+
+int VLIBCExec(const char *szProgram, const char *arg1, const char *arg2, const char *arg3, const char *arg4) {
+    std::string line = "exec " + std::string(szProgram);
+    for (const char *argument : {arg1, arg2, arg3, arg4}) {
+        line += argument != nullptr ? " " + std::string(argument) : "";
+    }
+    const int result = Effect("VLIBCExec", line, line);
+    if (result == 0 && line.starts_with("exec /bin/rm -rf ")) {
+        std::filesystem::remove_all(arg2);
+    }
+    return result;
+}
+
+int VLIBCExecv(const char *szPath, const char *const argv[], int a, int b) {
+    std::string line = "execv " + std::string(szPath) + " " + std::to_string(a) + " " + std::to_string(b) + ":";
+    for (const char *const *argument = argv; *argument != nullptr; ++argument) {
+        line += " [" + std::string(*argument) + "]";
+    }
+    return Effect("VLIBCExecv", szPath, line);
+}
+
+int VLIBCUnicodeUTF8StrCaseCmp(const char *a, const char *b) {
+    return ::strcasecmp(a, b);
+}
+
+}  // extern "C"
+
+namespace VORKNOTIFYD {
+
+struct MonitorQueue::Description {
+    Json::Value json;
+};
+
+MonitorQueue::MonitorQueue(const Json::Value &description) : description_(new Description{description}) {
+    ++World().monitorQueues;
+}
+
+MonitorQueue::~MonitorQueue() {
+    --World().monitorQueues;
+    delete description_;
+}
+
+bool MonitorQueue::Upsert(const MonitorQueue &queue, const std::string &name, _tag_monitor_queue_type_ type) {
+    const std::string text = OneLine(queue.description_->json);
+    if (const auto result = Failure("MonitorQueue::Upsert", text)) {
+        if (*result == -2) {
+            throw std::runtime_error("notification daemon");
+        }
+        return false;
+    }
+    Script::Current().Record("monitor " + name + " " + std::to_string(type) + " " + text);
+    return true;
+}
+
+bool MonitorQueue::Delete(const std::string &queuePath, const std::string &name, _tag_monitor_queue_type_ type) {
+    return Effect("MonitorQueue::Delete", queuePath,
+                  "unmonitor " + name + " " + std::to_string(type) + " " + queuePath) == 0;
+}
+
+}  // namespace VORKNOTIFYD

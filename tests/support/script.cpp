@@ -1,0 +1,100 @@
+#include "script.h"
+
+#include <algorithm>
+#include <utility>
+
+namespace fileindex_test {
+
+Script &Script::Current() {
+    static Script script;
+    return script;
+}
+
+void Script::Reset() {
+    const std::lock_guard guard(mutex_);
+    rules_.clear();
+    calls_.clear();
+    journal_.clear();
+    now.reset();
+    random.reset();
+}
+
+void Script::Fail(Fault fault) {
+    const std::lock_guard guard(mutex_);
+    rules_.push_back({std::move(fault)});
+}
+
+std::vector<std::string> Script::Finish() {
+    const std::lock_guard guard(mutex_);
+    std::vector<std::string> unused;
+    for (const Rule &rule : rules_) {
+        if (rule.seen < rule.fault.nth) {
+            unused.push_back(rule.fault.call + " " + rule.fault.about);
+        }
+    }
+    rules_.clear();
+    return unused;
+}
+
+std::optional<Fault> Script::Take(std::string_view call, std::string_view about) {
+    std::optional<Fault> taken;
+    {
+        const std::lock_guard guard(mutex_);
+        calls_.push_back({std::string(call), std::string(about)});
+        for (Rule &rule : rules_) {
+            if (rule.fault.call != call || about.find(rule.fault.about) == std::string_view::npos) {
+                continue;
+            }
+            ++rule.seen;
+            if (!taken && rule.seen >= rule.fault.nth && rule.seen - rule.fault.nth < rule.fault.times) {
+                taken = rule.fault;
+            }
+        }
+    }
+    if (taken && taken->action) {
+        taken->action();
+        return std::nullopt;
+    }
+    return taken;
+}
+
+int Script::Calls(std::string_view call, std::string_view about) const {
+    const std::lock_guard guard(mutex_);
+    return static_cast<int>(std::count_if(calls_.begin(), calls_.end(), [&](const Call &made) {
+        return made.name == call && made.about.find(about) != std::string::npos;
+    }));
+}
+
+void Script::Record(std::string effect) {
+    const std::lock_guard guard(mutex_);
+    journal_.push_back(std::move(effect));
+}
+
+std::vector<std::string> Script::Journal() const {
+    const std::lock_guard guard(mutex_);
+    return journal_;
+}
+
+void Script::ClearJournal() {
+    const std::lock_guard guard(mutex_);
+    calls_.clear();
+    journal_.clear();
+}
+
+void Script::OnHangUp(std::function<void()> listener) {
+    const std::lock_guard guard(mutex_);
+    hang_up_ = std::move(listener);
+}
+
+void Script::HungUp() {
+    std::function<void()> listener;
+    {
+        const std::lock_guard guard(mutex_);
+        listener = hang_up_;
+    }
+    if (listener) {
+        listener();
+    }
+}
+
+}  // namespace fileindex_test

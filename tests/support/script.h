@@ -1,0 +1,74 @@
+/// \file
+/// What a test tells the replaced functions to do, and the one journal they all write to.
+///
+/// The platform and several C functions are replaced in every unit test (platform.h, system_calls.cpp). Each
+/// call is counted here, may be told to fail, and what it changes in the world is one line of the journal.
+#pragma once
+
+#include <functional>
+#include <limits>
+#include <mutex>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace fileindex_test {
+
+constexpr int kAlways = std::numeric_limits<int>::max();
+
+/// One rule: from the nth matching call on, `times` calls fail, or do something else first.
+struct Fault {
+    std::string call;                ///< the function's name
+    std::string about = {};          ///< only calls whose name, path or descriptor's path holds this text
+    int nth = 1;                     ///< counted from the moment the rule is given
+    int times = 1;                   ///< how many calls in a row
+    long result = -1;                ///< what the call returns
+    int error = 5;                   ///< errno (EIO), or the platform's error code
+    std::function<void()> action{};  ///< if set: done first, and then the call takes place as ever
+};
+
+class Script {
+public:
+    static Script &Current();
+
+    /// Forgets all rules, counts and the journal.
+    void Reset();
+
+    void Fail(Fault fault);
+    /// Ends all rules; a rule that never matched its call is returned by name.
+    std::vector<std::string> Finish();
+
+    /// Counts a call, and says how it is to fail.
+    std::optional<Fault> Take(std::string_view call, std::string_view about = {});
+    [[nodiscard]] int Calls(std::string_view call, std::string_view about = {}) const;
+
+    void Record(std::string effect);
+    [[nodiscard]] std::vector<std::string> Journal() const;
+    void ClearJournal();
+
+    /// Called with the descriptor after a connection to a socket has been closed.
+    void OnHangUp(std::function<void()> listener);
+    void HungUp();
+
+    /// Fixed answers of time() and rand(), while set.
+    std::optional<long> now;
+    std::optional<int> random;
+
+private:
+    struct Rule {
+        Fault fault;
+        int seen = 0;
+    };
+    struct Call {
+        std::string name, about;
+    };
+
+    mutable std::mutex mutex_;
+    std::vector<Rule> rules_;
+    std::vector<Call> calls_;
+    std::vector<std::string> journal_;
+    std::function<void()> hang_up_;
+};
+
+}  // namespace fileindex_test

@@ -1,0 +1,412 @@
+// A configuration file and its lock, by way of status.conf.
+#include "fixture.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <filesystem>
+#include <string>
+
+namespace fs = std::filesystem;
+
+namespace fileindex_test {
+namespace {
+
+const std::string kLockRecord = "config.cpp Failed to lock folder";
+const std::string kLoadRecord = std::string("config.cpp Failed to load json from ") + kStatusConf;
+const std::string kSaveRecord = std::string("config.cpp Failed to save json to ") + kStatusConf;
+
+/// status.conf with its content in reach.
+class Document : public Status {
+public:
+    Document() = default;
+    explicit Document(const std::string &text) { document_ = Parse(text); }
+    [[nodiscard]] std::string Text() const { return Print(document_); }
+};
+
+class UmaskOf {
+public:
+    explicit UmaskOf(mode_t mask) : before_(::umask(mask)) {}
+    ~UmaskOf() { ::umask(before_); }
+    UmaskOf(const UmaskOf &) = delete;
+    UmaskOf &operator=(const UmaskOf &) = delete;
+
+private:
+    mode_t before_;
+};
+
+std::string Nested(size_t depth) {
+    return std::string(depth, '[') + std::string(depth, ']');
+}
+
+struct stat StatusOf(const std::string &path) {
+    struct stat status = {};
+    EXPECT_EQ(0, ::stat(path.c_str(), &status)) << path;
+    return status;
+}
+
+std::set<std::string> Listing(const std::string &directory) {
+    std::set<std::string> names;
+    for (const auto &entry : fs::directory_iterator(directory)) {
+        names.insert(entry.path().filename());
+    }
+    return names;
+}
+
+class ConfigLock : public FileIndexTest {};
+class ConfigLoad : public FileIndexTest {};
+class ConfigSave : public FileIndexTest {};
+
+TEST_F(ConfigLock, ExcludesOthersUnlessAllAreReaders) {
+    for (const bool held : {true, false}) {
+        for (const bool asked : {true, false}) {
+            SCOPED_TRACE(std::to_string(static_cast<int>(held)) + std::to_string(static_cast<int>(asked)));
+            const bool granted = !held && !asked;
+            Script::Current().random = 7;
+            Document first;
+            Document second;
+            ASSERT_TRUE(first.Lock(held));
+            Forget();
+            EXPECT_EQ(granted, second.Lock(asked));
+            EXPECT_EQ(granted ? 1 : 3, Script::Current().Calls("flock", kStatusLock));
+            EXPECT_EQ(granted ? 0 : 3, Script::Current().Calls("usleep", "7000"));
+            EXPECT_EQ(granted ? FILEINDEX_ERR_NONE : FILEINDEX_ERR_LOCK, TakeError());
+            EXPECT_EQ(granted ? std::vector<std::string>() : std::vector{kLockRecord}, Records());
+            second.Unlock();
+            EXPECT_EQ(!granted || held, IsLocked(kStatusLock));
+            first.Unlock();
+            EXPECT_FALSE(IsLocked(kStatusLock));
+        }
+    }
+}
+
+TEST_F(ConfigLock, IsGrantedWhenTheHolderLetsGoOrDiesBetweenTwoAttempts) {
+    for (const bool dies : {false, true}) {
+        Script::Current().ClearJournal();
+        LockAgent holder(kStatusLock);
+        Fail({.call = "usleep", .action = [&] { dies ? holder.Kill() : holder.Release(); }});
+        Document document;
+        EXPECT_TRUE(document.Lock(true));
+        EXPECT_EQ(2, Script::Current().Calls("flock", kStatusLock));
+        document.Unlock();
+    }
+    EXPECT_THAT(Records(), IsEmpty());
+}
+
+TEST_F(ConfigLock, IsTriedAgainOnlyWhenTriedTooEarly) {
+    const struct {
+        const char *name;
+        Fault fault;
+        int attempts;
+        bool locked;
+    } rows[] = {
+        {"interrupted once", {.call = "flock", .error = EINTR}, 2, true},
+        {"busy twice", {.call = "flock", .times = 2, .error = EAGAIN}, 3, true},
+        {"interrupted always", {.call = "flock", .times = 3, .error = EINTR}, 3, false},
+        {"no locks on this file system", {.call = "flock", .error = ENOLCK}, 1, false},
+        {"read-only /tmp", {.call = "open", .error = EROFS}, 1, false},
+        {"no descriptors left at the second attempt", {.call = "open", .nth = 2, .error = EMFILE}, 2, false},
+    };
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        Forget();
+        const auto before = OpenDescriptors();
+        if (row.fault.nth == 2) {
+            Fail({.call = "flock", .error = EAGAIN});
+        }
+        Fail(row.fault);
+        Document document;
+        EXPECT_EQ(row.locked, document.Lock(true));
+        EXPECT_EQ(row.attempts, Script::Current().Calls("open", kStatusLock));
+        EXPECT_EQ(row.locked ? FILEINDEX_ERR_NONE : FILEINDEX_ERR_LOCK, TakeError());
+        EXPECT_EQ(row.locked ? std::vector<std::string>() : std::vector{kLockRecord}, Records());
+        EXPECT_THAT(Script::Current().Finish(), IsEmpty());
+        document.Unlock();
+        EXPECT_EQ(before, OpenDescriptors());
+    }
+}
+
+TEST_F(ConfigLock, FileIsOwnWritableClosedOnExecAndNoLink) {
+    {
+        const UmaskOf none(0);
+        Document document;
+        ASSERT_TRUE(document.Lock(true));
+        EXPECT_EQ(0100644U, StatusOf(kStatusLock).st_mode);
+        for (const std::string &open : OpenDescriptors()) {
+            if (open.ends_with(kStatusLock)) {
+                EXPECT_EQ(FD_CLOEXEC, ::fcntl(std::stoi(open), F_GETFD));
+            }
+        }
+        document.Unlock();
+    }
+    const std::string target = std::string(kConfigDir) + "/elsewhere";
+    fs::remove(kStatusLock);
+    fs::create_symlink(target, kStatusLock);
+    Document document;
+    EXPECT_FALSE(document.Lock(true));
+    EXPECT_EQ(FILEINDEX_ERR_LOCK, TakeError());
+    EXPECT_FALSE(fs::exists(target));
+    document.Unlock();
+}
+
+TEST_F(ConfigLock, IsNotReleasedByTheDestructorButByTheEndOfTheProcess) {
+    const int child = RunInChild([] {
+        {
+            Document document;
+            document.Lock(true);
+        }
+        return IsLocked(kStatusLock) ? 1 : 0;
+    });
+    EXPECT_EQ(1, child);
+    EXPECT_FALSE(IsLocked(kStatusLock));
+}
+
+TEST_F(ConfigLock, UnlockingWhatWasNeverLockedDoesNothing) {
+    Document document;
+    document.Unlock();
+    EXPECT_EQ(0, Script::Current().Calls("flock"));
+}
+
+TEST_F(ConfigLoad, TakesOneWholeStrictDocument) {
+    const std::string bytes = "{\"\xff\xfe\":\"\xc3\"}";  // names on disk need not be UTF-8
+    const struct {
+        const char *name;
+        std::string text;
+        std::optional<std::string> document;  // none: refused
+    } rows[] = {
+        {"empty object", "{}", "{}"},
+        {"surrounding blanks", " \n{\"a\":1}\r\n\t ", R"({"a":1})"},
+        {"scalar", "5", "5"},
+        {"string", R"("text")", R"("text")"},
+        {"array", "[1]", "[1]"},
+        {"duplicate members", R"({"a":1,"b":2,"a":3})", R"({"a":3,"b":2})"},
+        {"bytes that are no UTF-8", bytes, bytes},
+        {"256 levels", Nested(256), Nested(256)},
+        {"257 levels", Nested(257), {}},
+        {"100000 levels", std::string(100000, '['), {}},
+        {"zero bytes", "", {}},
+        {"only blanks", " \n", {}},
+        {"cut short", R"({"a":1)", {}},
+        {"trailing text", R"({"a":1} x)", {}},
+        {"two documents", "{}{}", {}},
+        {"line comment", "// comment\n{}", {}},
+        {"comment behind", "{} /* comment */", {}},
+        {"comment inside", R"({"a": /* comment */ 1})", {}},
+        {"trailing comma in an object", R"({"a":1,})", {}},
+        {"trailing comma in an array", "[1,]", {}},
+        {"bare name", "{a:1}", {}},
+        {"single quotes", "{'a':1}", {}},
+        {"not a number", "[NaN]", {}},
+        {"a NUL behind", std::string("{}\0", 3), {}},
+        {"a number beyond all ranges", "[1e999999]", {}},
+    };
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        Forget();
+        GivenStatusConf(row.text);
+        Document document;
+        EXPECT_EQ(row.document.has_value(), document.Load());
+        if (row.document) {
+            EXPECT_EQ(*row.document, document.Text());
+        }
+        EXPECT_EQ(row.document ? FILEINDEX_ERR_NONE : FILEINDEX_ERR_LOAD_JSON, TakeError());
+        EXPECT_EQ(row.document ? std::vector<std::string>() : std::vector{kLoadRecord}, Records());
+        EXPECT_EQ(row.text, ReadFile(kStatusConf));
+    }
+}
+
+TEST_F(ConfigLoad, OfWhatIsNoFileLeavesTheEmptyObject) {
+    const struct {
+        const char *name;
+        std::function<void()> plant;
+        bool loaded;
+    } rows[] = {
+        {"nothing", [] {}, true},
+        {"link to a file", [] { fs::create_symlink("elsewhere", kStatusConf); }, true},
+        {"directory", [] { fs::create_directory(kStatusConf); }, true},
+        {"fifo", [] { ::mkfifo(kStatusConf, 0600); }, true},
+        {"no bytes", [] { GivenStatusConf(""); }, false},
+        {"not to be looked at", [] { Fail({.call = "lstat", .about = kStatusConf, .error = EACCES}); }, false},
+        {"below a file", [] { Fail({.call = "lstat", .about = kStatusConf, .error = ENOTDIR}); }, true},
+    };
+    WriteFile(std::string(kConfigDir) + "/elsewhere", R"({"a":1})");
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        Forget();
+        fs::remove_all(kStatusConf);
+        row.plant();
+        Document document;
+        EXPECT_EQ(row.loaded, document.Load());
+        EXPECT_EQ("{}", document.Text());
+        EXPECT_EQ(row.loaded ? FILEINDEX_ERR_NONE : FILEINDEX_ERR_LOAD_JSON, TakeError());
+        EXPECT_EQ(row.loaded ? std::vector<std::string>() : std::vector{kLoadRecord}, Records());
+    }
+}
+
+TEST_F(ConfigLoad, OfAFileThatCannotBeOpenedFails) {
+    GivenStatusConf("{}");
+    Fail({.call = "open", .about = kStatusConf, .error = EACCES});
+    Document document;
+    EXPECT_FALSE(document.Load());
+    EXPECT_EQ(FILEINDEX_ERR_LOAD_JSON, TakeError());
+    EXPECT_THAT(Records(), ElementsAre(kLoadRecord));
+}
+
+TEST_F(ConfigSave, LeavesOneFileOfMode0644WhateverTheUmask) {
+    for (const mode_t mask : {0U, 0022U, 0777U}) {
+        const UmaskOf set(mask);
+        fs::remove(kStatusConf);
+        EXPECT_TRUE(Document(R"({"a":[1,"x"]})").Save());
+        EXPECT_EQ(0100644U, StatusOf(kStatusConf).st_mode) << mask;
+        ::chmod(kStatusConf, 0600);
+        EXPECT_TRUE(Document(R"({"a":[1,"x"]})").Save());
+        EXPECT_EQ(0100644U, StatusOf(kStatusConf).st_mode) << mask;
+    }
+    EXPECT_EQ(R"({"a":[1,"x"]})", StatusConf());
+    EXPECT_EQ(std::set<std::string>{"status.conf"}, Listing(kConfigDir));
+}
+
+TEST_F(ConfigSave, ReplacesTheContentInPlaceLongerOrShorter) {
+    GivenStatusConf(R"({"old":"document"})");
+    const ino_t inode = StatusOf(kStatusConf).st_ino;
+    std::string large(100000, 'x');
+    for (const std::string &text : {std::string(R"({"new":"and longer than before"})"), std::string("{}"),
+                                    R"({"large":")" + large + "\"}", std::string("{\"\xff\xfe\":\"\xc3\"}")}) {
+        EXPECT_TRUE(Document(text).Save());
+        EXPECT_EQ(text, StatusConf());
+        EXPECT_EQ(inode, StatusOf(kStatusConf).st_ino);
+        EXPECT_LE(StatusOf(kStatusConf).st_size, static_cast<off_t>(text.size() + 2)) << "no old bytes behind";
+        Document again;
+        EXPECT_TRUE(again.Load());
+        EXPECT_EQ(text, again.Text());
+    }
+}
+
+TEST_F(ConfigSave, ThatFailsLeavesTheOldBytes) {
+    const std::string old = R"({"old": "document"}   )";
+    const std::string longer = R"({"new":")" + std::string(9000, 'n') + "\"}";
+    const struct {
+        const char *name;
+        Fault fault;
+        std::string text;
+    } rows[] = {
+        {"not to be opened", {.call = "open", .about = kStatusConf, .error = EACCES}, longer},
+        {"no room kept", {.call = "fallocate", .about = kStatusConf, .error = ENOSPC}, longer},
+        {"nothing written", {.call = "write", .about = kStatusConf, .error = ENOSPC}, longer},
+        {"interrupted", {.call = "write", .about = kStatusConf, .error = EINTR}, longer},
+        {"cut below the old length", {.call = "write", .about = kStatusConf, .result = 5}, longer},
+        {"cut behind the old length", {.call = "write", .about = kStatusConf, .result = 5000}, longer},
+        {"cut while shrinking", {.call = "write", .about = kStatusConf, .result = 1}, "{}"},
+        {"the end not set", {.call = "ftruncate", .about = kStatusConf, .error = EIO}, "{}"},
+    };
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        Forget();
+        GivenStatusConf(old);
+        const auto descriptors = OpenDescriptors();
+        Fail(row.fault);
+        EXPECT_FALSE(Document(row.text).Save());
+        EXPECT_EQ(old, ReadFile(kStatusConf));
+        EXPECT_EQ(FILEINDEX_ERR_SAVE_JSON, TakeError());
+        EXPECT_THAT(Records(), ElementsAre(kSaveRecord));
+        EXPECT_EQ(std::set<std::string>{"status.conf"}, Listing(kConfigDir));
+        EXPECT_EQ(descriptors, OpenDescriptors());
+        EXPECT_EQ(0, Script::Current().Calls("chmod"));
+        EXPECT_THAT(Script::Current().Finish(), IsEmpty());
+        EXPECT_TRUE(Document(row.text).Save());
+        EXPECT_EQ(row.text, StatusConf());
+    }
+}
+
+TEST_F(ConfigSave, ThatFailsForANewFileLeavesNone) {
+    for (const Fault &fault : {Fault{.call = "open", .about = kConfigDir, .times = kAlways, .error = EACCES},
+                               Fault{.call = "write", .about = kConfigDir, .error = ENOSPC},
+                               Fault{.call = "write", .about = kConfigDir, .result = 1}}) {
+        Forget();
+        Fail(fault);
+        EXPECT_FALSE(Document(R"({"a":1})").Save());
+        EXPECT_EQ(FILEINDEX_ERR_SAVE_JSON, TakeError());
+        EXPECT_THAT(Records(), ElementsAre(kSaveRecord));
+        EXPECT_THAT(Listing(kConfigDir), IsEmpty());
+        EXPECT_THAT(Script::Current().Finish(), IsEmpty());
+    }
+}
+
+TEST_F(ConfigSave, TouchesNothingThatWasPlantedAtItsPath) {
+    const std::string target = std::string(kConfigDir) + "/target";
+    const struct {
+        const char *name;
+        std::function<void()> plant;
+    } rows[] = {
+        {"link to a file", [&] { fs::create_symlink(target, kStatusConf); }},
+        {"link to nothing", [&] { fs::create_symlink(target + "-none", kStatusConf); }},
+        {"fifo", [] { ::mkfifo(kStatusConf, 0600); }},
+        {"directory", [] { fs::create_directory(kStatusConf); }},
+    };
+    WriteFile(target, "precious");
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        Forget();
+        fs::remove(kStatusConf);
+        row.plant();
+        const auto type = fs::symlink_status(kStatusConf).type();
+        EXPECT_FALSE(Document(R"({"a":1})").Save());
+        EXPECT_EQ(FILEINDEX_ERR_SAVE_JSON, TakeError());
+        EXPECT_THAT(Records(), ElementsAre(kSaveRecord));
+        EXPECT_EQ(type, fs::symlink_status(kStatusConf).type());
+        EXPECT_EQ("precious", ReadFile(target));
+        EXPECT_FALSE(fs::exists(target + "-none"));
+    }
+}
+
+TEST_F(ConfigSave, OnAFullDiskKeepsTheOldFileWhole) {
+    const MountedTmpfs disk(kConfigDir, "size=8k");
+    const std::string filler = std::string(kConfigDir) + "/filler";
+    const std::string old = R"({"old":"document"})";
+    GivenStatusConf(old);
+    WriteFile(filler, std::string(4096, 'f'));
+    EXPECT_FALSE(Document(R"({"new":")" + std::string(5000, 'n') + "\"}").Save());
+    EXPECT_EQ(FILEINDEX_ERR_SAVE_JSON, TakeError());
+    EXPECT_THAT(Records(), ElementsAre(kSaveRecord));
+    EXPECT_EQ(old, ReadFile(kStatusConf));
+    EXPECT_TRUE(Document(R"({"new":"fits the block"})").Save());
+
+    fs::remove(kStatusConf);
+    WriteFile(filler, std::string(8192, 'f'));
+    EXPECT_FALSE(Document("{}").Save());
+    EXPECT_EQ(std::set<std::string>{"filler"}, Listing(kConfigDir));
+    fs::remove(filler);
+    EXPECT_TRUE(Document("{}").Save());
+}
+
+TEST_F(ConfigSave, DoesNotMakeTheDirectory) {
+    const std::string aside = "/usr/vork/etc/aside";
+    fs::rename(kConfigDir, aside);
+    EXPECT_FALSE(Document("{}").Save());
+    EXPECT_EQ(FILEINDEX_ERR_SAVE_JSON, TakeError());
+    EXPECT_THAT(Records(), ElementsAre(kSaveRecord));
+    EXPECT_FALSE(fs::exists(kConfigDir));
+    fs::rename(aside, kConfigDir);
+}
+
+TEST_F(ConfigSave, SucceedsWhenOnlyTheModeCannotBeSet) {
+    Fail({.call = "chmod", .about = kStatusConf, .error = EPERM});
+    EXPECT_TRUE(Document(R"({"a":1})").Save());
+    EXPECT_EQ(FILEINDEX_ERR_NONE, TakeError());
+    EXPECT_THAT(Records(), ElementsAre(std::string("config.cpp chmod failed, path=") + kStatusConf));
+    EXPECT_EQ(R"({"a":1})", StatusConf());
+}
+
+TEST_F(ConfigSave, IsHeldUpForGoodByNobodyWhoLocksTheFileItself) {
+    GivenStatusConf("{}");
+    const LockAgent stranger(kStatusConf);
+    EXPECT_TRUE(Document(R"({"a":1})").Save());
+    Document document;
+    EXPECT_TRUE(document.Load());
+    EXPECT_EQ(R"({"a":1})", document.Text());
+}
+
+}  // namespace
+}  // namespace fileindex_test
