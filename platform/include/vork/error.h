@@ -5,6 +5,7 @@
 #ifndef VORK_ERROR_H
 #define VORK_ERROR_H
 
+#pragma GCC visibility push(default)
 #ifdef __cplusplus
 extern "C" {
 #endif
@@ -41,5 +42,6 @@ int VLIBCErrorGetLine(void);
 #ifdef __cplusplus
 }
 #endif
+#pragma GCC visibility pop
 
 #endif

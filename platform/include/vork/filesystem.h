@@ -5,6 +5,7 @@
 #ifndef VORK_FILESYSTEM_H
 #define VORK_FILESYSTEM_H
 
+#pragma GCC visibility push(default)
 #ifdef __cplusplus
 extern "C" {
 #endif
@@ -33,5 +34,6 @@ int VLIBFhsPathInSnapshot(const char *szPath, int *pInSnapshot);
 #ifdef __cplusplus
 }
 #endif
+#pragma GCC visibility pop
 
 #endif

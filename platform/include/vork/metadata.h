@@ -5,6 +5,7 @@
 #ifndef VORK_METADATA_H
 #define VORK_METADATA_H
 
+#pragma GCC visibility push(default)
 #ifdef __cplusplus
 extern "C" {
 #endif
@@ -21,5 +22,6 @@ int VORKEAMKDir(int flags, const char *szPath);
 #ifdef __cplusplus
 }
 #endif
+#pragma GCC visibility pop
 
 #endif

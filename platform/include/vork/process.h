@@ -6,6 +6,7 @@
 #ifndef VORK_PROCESS_H
 #define VORK_PROCESS_H
 
+#pragma GCC visibility push(default)
 #ifdef __cplusplus
 extern "C" {
 #endif
@@ -25,5 +26,6 @@ int VLIBCExecv(const char *szPath, const char *const argv[], int a, int b);
 #ifdef __cplusplus
 }
 #endif
+#pragma GCC visibility pop
 
 #endif

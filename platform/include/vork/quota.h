@@ -5,6 +5,7 @@
 #ifndef VORK_QUOTA_H
 #define VORK_QUOTA_H
 
+#pragma GCC visibility push(default)
 #ifdef __cplusplus
 extern "C" {
 #endif
@@ -18,5 +19,6 @@ int VORKQuotaIsEnough(unsigned int uid, const char *szPath, unsigned long long c
 #ifdef __cplusplus
 }
 #endif
+#pragma GCC visibility pop
 
 #endif

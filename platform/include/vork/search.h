@@ -5,6 +5,7 @@
 #ifndef VORK_SEARCH_H
 #define VORK_SEARCH_H
 
+#pragma GCC visibility push(default)
 #ifdef __cplusplus
 extern "C" {
 #endif
@@ -19,5 +20,6 @@ int VORKSMBSetSpotlight(int enable);
 #ifdef __cplusplus
 }
 #endif
+#pragma GCC visibility pop
 
 #endif

@@ -10,6 +10,7 @@
 #ifndef VORK_SERVICE_H
 #define VORK_SERVICE_H
 
+#pragma GCC visibility push(default)
 #ifdef __cplusplus
 extern "C" {
 #endif
@@ -27,5 +28,6 @@ int VLIBServiceRestart(const char *szName);
 #ifdef __cplusplus
 }
 #endif
+#pragma GCC visibility pop
 
 #endif

@@ -9,6 +9,7 @@
 #ifndef VORK_SHARE_H
 #define VORK_SHARE_H
 
+#pragma GCC visibility push(default)
 #ifdef __cplusplus
 extern "C" {
 #endif
@@ -54,5 +55,6 @@ int VLIBShareIsReadOnlyGet(const struct _tag_VORKSHARE *pShare, int *pReadOnly);
 #ifdef __cplusplus
 }
 #endif
+#pragma GCC visibility pop
 
 #endif

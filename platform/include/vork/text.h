@@ -5,6 +5,7 @@
 #ifndef VORK_TEXT_H
 #define VORK_TEXT_H
 
+#pragma GCC visibility push(default)
 #ifdef __cplusplus
 extern "C" {
 #endif
@@ -18,5 +19,6 @@ int VLIBCUnicodeUTF8StrCaseCmp(const char *a, const char *b);
 #ifdef __cplusplus
 }
 #endif
+#pragma GCC visibility pop
 
 #endif

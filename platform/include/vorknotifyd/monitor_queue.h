@@ -10,6 +10,7 @@
 
 #include <string>
 
+#pragma GCC visibility push(default)
 namespace VORKNOTIFYD {
 
 /// What a registration feeds. The library passes the value 1.
@@ -44,5 +45,6 @@ private:
 };
 
 }  // namespace VORKNOTIFYD
+#pragma GCC visibility pop
 
 #endif

@@ -1,0 +1,40 @@
+// JSON documents on disk: read whole, replaced whole, changed by one process at a time.
+#ifndef PLATFORM_LINUX_COMMON_DOCUMENT_H
+#define PLATFORM_LINUX_COMMON_DOCUMENT_H
+
+#include "common/descriptor.h"
+
+#include <json/value.h>
+
+#include <optional>
+#include <string>
+
+namespace VORK::PLATFORM {
+
+/// Everything that can be read from the descriptor, up to 64 MiB; nothing, with errno set, on failure.
+std::optional<std::string> ReadAll(int fd);
+
+/// The whole file; nothing, with errno set, on failure.
+std::optional<std::string> ReadFile(const std::string &path);
+
+/// Parses one JSON object, strictly: no comments, no trailing text, no member twice. Nothing when the text is
+/// anything else.
+std::optional<Json::Value> ParseObject(const std::string &text);
+
+/// Indented text with a final newline, members sorted, bytes of strings as they are.
+std::string FormatDocument(const Json::Value &document);
+
+/// Puts `text` in the place of the file in one step that survives a crash: a reader sees the old text or the new
+/// one. Keeps mode and owner of a file that exists (a link is followed), gives a new one `mode`. False with
+/// errno set on failure; the file is then as it was.
+///
+/// The temporary file beside it has a fixed name, so that a crash leaves no more than one: hold the lock.
+bool ReplaceFile(const std::string &path, const std::string &text, unsigned int mode);
+
+/// Takes the exclusive lock on the lock file, making the file when needed. Waits two seconds at most: the
+/// callers' own callers hold locks. Nothing, with errno set (ETIMEDOUT when others kept it), on failure.
+std::optional<Descriptor> TakeLock(const std::string &lockPath);
+
+}  // namespace VORK::PLATFORM
+
+#endif

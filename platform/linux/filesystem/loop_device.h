@@ -1,0 +1,16 @@
+// Files mounted as if they were disks.
+#ifndef PLATFORM_LINUX_FILESYSTEM_LOOP_DEVICE_H
+#define PLATFORM_LINUX_FILESYSTEM_LOOP_DEVICE_H
+
+#include "filesystem/mount_table.h"
+
+#include <string>
+
+namespace VORK::PLATFORM {
+
+/// The file behind the loop device (or a partition of one) that the mount is from; empty when it is from none.
+std::string BackingFileOf(const Mount &mount);
+
+}  // namespace VORK::PLATFORM
+
+#endif

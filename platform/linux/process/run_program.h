@@ -1,0 +1,34 @@
+// Running one program: spawned without a shell, waited for, bounded when asked to.
+#ifndef PLATFORM_LINUX_PROCESS_RUN_PROGRAM_H
+#define PLATFORM_LINUX_PROCESS_RUN_PROGRAM_H
+
+#include <chrono>
+#include <optional>
+
+namespace VORK::PLATFORM {
+
+struct RunOptions {
+    bool discardOutput = false;
+    /// The program and all it started in its process group are killed when this moment passes. Without it the
+    /// wait is endless, and the program stays in the caller's process group.
+    std::optional<std::chrono::steady_clock::time_point> deadline;
+};
+
+struct RunResult {
+    enum class End {
+        kExited,         ///< `status` is the exit status
+        kUnknownStatus,  ///< ran to its end, but the host had its children reaped by others
+        kSignalled,
+        kOverdue,
+        kNotRun  ///< `status` is the errno value
+    };
+    End end = End::kNotRun;
+    int status = 0;
+};
+
+/// Runs the program at the absolute path with a null-terminated vector. Standard input is /dev/null.
+RunResult RunProgram(const char *path, const char *const argv[], const RunOptions &options);
+
+}  // namespace VORK::PLATFORM
+
+#endif

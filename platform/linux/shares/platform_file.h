@@ -1,0 +1,49 @@
+// Shares from the platform's own file, "/usr/vork/etc/platform.conf".
+#ifndef PLATFORM_LINUX_SHARES_PLATFORM_FILE_H
+#define PLATFORM_LINUX_SHARES_PLATFORM_FILE_H
+
+#include "shares/share_source.h"
+
+#include <sys/stat.h>
+
+#include <mutex>
+#include <string>
+
+namespace VORK::PLATFORM {
+
+inline constexpr const char *kPlatformFile = "/usr/vork/etc/platform.conf";
+
+/// Keeps the parsed table for as long as the file's identity stays the same. A missing file means no shares.
+class PlatformFileShares final : public ShareSource {
+public:
+    explicit PlatformFileShares(std::string path) : path_(std::move(path)) {}
+
+    Snapshot Current() override;
+
+private:
+    struct Identity {
+        dev_t device = 0;
+        ino_t inode = 0;
+        off_t size = -1;
+        timespec modified{};
+        timespec changed{};
+
+        bool operator==(const Identity &other) const;
+    };
+
+    static Identity IdentityOf(const struct stat &status);
+    bool IsKnown(const struct stat &status) const;
+    void Load();
+    void LoadText(int fd);
+    void Keep(int error);
+
+    const std::string path_;
+    std::mutex mutex_;
+    Identity identity_;
+    bool mayHaveChangedUnseen_ = true;
+    Snapshot snapshot_{std::make_shared<const ShareTable>(), 0};
+};
+
+}  // namespace VORK::PLATFORM
+
+#endif
