@@ -1,0 +1,173 @@
+// Which paths and shares are indexed, asked of the class interface and of the C functions, and the lookups.
+#include "fixture.h"
+
+#include <string>
+#include <vector>
+
+namespace fileindex_test {
+namespace {
+
+class Coverage : public FileIndexTest {
+protected:
+    void SetUp() override {
+        FileIndexTest::SetUp();
+        GivenShare("photo");
+        GivenFolders({FolderRecord("/photo/2019", "Year", "p"), FolderRecord("/gone/x", "", "d")});
+    }
+};
+
+TEST_F(Coverage, FollowsComponentsAndBytes) {
+    const struct {
+        const char *path;
+        bool indexed, containsIndexed;
+    } rows[] = {
+        {"/photo/2019", true, true},
+        {"/photo/2019/a/b", true, false},
+        {"/photo/2019/", true, false},
+        {"/photo/20190", false, false},
+        {"/photo", false, true},
+        {"/photo/", false, false},
+        {"/Photo/2019", false, false},
+        {"/photo//2019", false, false},
+        {"", false, true},
+        {"/", false, false},
+        {"photo/2019", false, false},
+        {"/gone/x/y", true, false},
+        {"/photo/2019/../x", true, false},
+        {"/gone", false, true},
+    };
+    std::vector<Folder> folders;
+    ASSERT_TRUE(IndexMgr::List(folders));
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.path);
+        EXPECT_EQ(row.indexed, IndexMgr::IsPathIndexed(row.path));
+        EXPECT_EQ(row.indexed, IndexMgr::IsPathIndexed(row.path, folders));
+        EXPECT_EQ(row.indexed ? 1 : 0, FILEIDXIsPathIndexed(row.path));
+        EXPECT_EQ(row.containsIndexed, IndexMgr::IsPathContainIndexed(row.path));
+        EXPECT_EQ(row.containsIndexed, IndexMgr::IsPathContainIndexed(row.path, folders));
+    }
+    EXPECT_FALSE(IndexMgr::IsPathIndexed("/photo/2019", {}));
+    EXPECT_FALSE(IndexMgr::IsPathContainIndexed("", {}));
+}
+
+TEST_F(Coverage, OfFullPathsKnowsOnlyFoldersWhoseShareIsThere) {
+    const struct {
+        const char *path;
+        bool indexed;
+    } rows[] = {{"/vol1/photo/2019", true},
+                {"/vol1/photo/2019/x", true},
+                {"/vol1/photo/2019/", true},
+                {"/vol1/photo/20190", false},
+                {"/vol1/photo", false},
+                {"/photo/2019", false},
+                {"", false},
+                {"/", false},
+                {"/gone/x", false}};
+    std::vector<Folder> folders;
+    ASSERT_TRUE(IndexMgr::List(folders));
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.path);
+        EXPECT_EQ(row.indexed, IndexMgr::IsFullPathIndexed(row.path));
+        EXPECT_EQ(row.indexed, IndexMgr::IsFullPathIndexed(row.path, folders));
+        EXPECT_EQ(row.indexed ? 1 : 0, FILEIDXIsFullPathIndexed(row.path));
+    }
+}
+
+TEST_F(Coverage, OfSharesComparesWholeNames) {
+    for (const auto &[share, indexed] : {std::pair("photo", true),
+                                         {"Photo", false},
+                                         {"photos", false},
+                                         {"phot", false},
+                                         {"gone", true},
+                                         {"", false},
+                                         {"music", false}}) {
+        EXPECT_EQ(indexed, IndexMgr::IsShareIndexed(share)) << share;
+        EXPECT_EQ(indexed ? 1 : 0, FILEIDXIsShareIndexed(share)) << share;
+    }
+    EXPECT_THAT(Records(), IsEmpty());
+
+    GivenFolders({FolderRecord("", "", ""), FolderRecord("/photo", "", "")});
+    EXPECT_TRUE(IndexMgr::IsShareIndexed("photo"));
+    EXPECT_EQ("index_mgr.cpp", SyslogCapture::Records().back().file);
+    EXPECT_EQ("Failed to get share name from path: ", SyslogCapture::Records().back().message);
+}
+
+TEST_F(Coverage, IsNoneWithoutFoldersOrWithoutAReadableFile) {
+    for (const char *text : {"{}", "{", "[]"}) {
+        SCOPED_TRACE(text);
+        GivenFolderConf(text);
+        EXPECT_FALSE(IndexMgr::IsPathIndexed("/photo/2019"));
+        EXPECT_FALSE(IndexMgr::IsPathContainIndexed(""));
+        EXPECT_FALSE(IndexMgr::IsFullPathIndexed("/vol1/photo/2019"));
+        EXPECT_FALSE(IndexMgr::IsShareIndexed("photo"));
+        EXPECT_EQ(0, FILEIDXIsPathIndexed("/photo/2019"));
+        EXPECT_EQ(0, FILEIDXIsFullPathIndexed("/vol1/photo/2019"));
+        EXPECT_EQ(0, FILEIDXIsShareIndexed("photo"));
+        std::vector<Folder> folders;
+        EXPECT_EQ(std::string(text) == "{}", IndexMgr::List(folders));
+        EXPECT_THAT(folders, IsEmpty());
+    }
+}
+
+TEST_F(Coverage, AnswersNoToANullPointer) {
+    EXPECT_EQ(0, FILEIDXIsPathIndexed(nullptr));
+    EXPECT_EQ(0, FILEIDXIsFullPathIndexed(nullptr));
+    EXPECT_EQ(0, FILEIDXIsShareIndexed(nullptr));
+}
+
+TEST_F(Coverage, TakesNoLock) {
+    const LockAgent writer(kFolderLock);
+    EXPECT_TRUE(IndexMgr::IsPathIndexed("/photo/2019"));
+    EXPECT_TRUE(IndexMgr::IsFullPathIndexed("/vol1/photo/2019"));
+    EXPECT_TRUE(IndexMgr::IsShareIndexed("photo"));
+    EXPECT_EQ(0, Script::Current().Calls("flock", kFolderLock));
+}
+
+TEST_F(Coverage, GetReadsOneFolderUnderTheLock) {
+    Json::Value result = "before";
+    EXPECT_TRUE(IndexMgr::Get(result, "/photo/2019"));
+    EXPECT_EQ("{" + FolderRecord("/photo/2019", "Year", "p") + "}", R"({"/photo/2019":)" + Print(result) + "}");
+    EXPECT_THAT(Journal(), ElementsAre("lock folder exclusive", "unlock folder"));
+}
+
+TEST_F(Coverage, GetThatFailsLetsGoOfTheLock) {
+    const struct {
+        const char *name, *path;
+        Fault fault;
+        _tag_fileindex_err_ code;
+        const char *record;
+    } rows[] = {
+        {"unknown folder",
+         "/photo/2019/",
+         {.call = "none"},
+         FILEINDEX_ERR_NO_SUCH_FOLDER,
+         "folders.cpp No such folder: /photo/2019/"},
+        {"busy",
+         "/photo/2019",
+         {.call = "flock", .about = kFolderLock, .times = 3, .error = EAGAIN},
+         FILEINDEX_ERR_LOCK,
+         "config.cpp Failed to lock folder"},
+        {"unreadable",
+         "/photo/2019",
+         {.call = "open", .about = kFolderConf},
+         FILEINDEX_ERR_LOAD_JSON,
+         "config.cpp Failed to load json from /usr/vork/etc/fileindex/folder.conf"},
+    };
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        Forget();
+        const auto descriptors = OpenDescriptors();
+        Fail(row.fault);
+        Json::Value result = "before";
+        EXPECT_FALSE(IndexMgr::Get(result, row.path));
+        EXPECT_EQ("before", result);
+        EXPECT_EQ(row.code, TakeError());
+        EXPECT_THAT(Records(), ElementsAre(row.record));
+        EXPECT_EQ(descriptors, OpenDescriptors());
+        EXPECT_FALSE(IsLocked(kFolderLock));
+        Script::Current().Finish();
+    }
+}
+
+}  // namespace
+}  // namespace fileindex_test
