@@ -1,0 +1,226 @@
+// Events for the daemon in a share's queue file.
+#include "fixture.h"
+
+#include <sys/stat.h>
+
+#include <cerrno>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+namespace fs = std::filesystem;
+
+namespace fileindex_test {
+namespace {
+
+constexpr char kQueue[] = "/vol1/photo/@eaDir/VORK@file_index_queue";
+constexpr char kPath[] = "/vol1/photo/a";
+constexpr int kReindex = 0x10000;
+constexpr int kSetting = 0x20000;
+const std::string kSettingLine = R"({"data":{"audio":true},"event":131072,"path":"/vol1/photo/a"})";
+const std::string kReindexLine = R"({"data":null,"event":65536,"path":"/vol1/photo/a"})";
+const std::string kNeedReindex = R"({"need_reindex":{"photo":true}})";
+
+class EventQueue : public FileIndexTest {
+protected:
+    void SetUp() override {
+        FileIndexTest::SetUp();
+        GivenShare("photo");
+    }
+    static bool AddSetting(const std::string &path = kPath) {
+        return AddCustomEvent(kSetting, path, Parse(R"({"audio":true})"));
+    }
+};
+
+TEST_F(EventQueue, GetsOneLineForEachEvent) {
+    const mode_t before = ::umask(0);
+    EXPECT_TRUE(AddSetting());
+    ::umask(before);
+    EXPECT_TRUE(AddCustomEvent(kReindex, kPath, Json::Value()));
+    EXPECT_TRUE(AddCustomEvent(-1, "/vol1/photo", "\xff\n"));
+    EXPECT_EQ(kSettingLine + "\n" + kReindexLine + "\n" +
+                  "{\"data\":\"\xff\\n\",\"event\":-1,\"path\":\"/vol1/photo\"}\n",
+              ReadFile(kQueue));
+    EXPECT_EQ(fs::perms(0644), fs::status(kQueue).permissions());
+    EXPECT_EQ("(missing)", StatusConf());
+    EXPECT_THAT(Records(), IsEmpty());
+}
+
+TEST_F(EventQueue, DropsWhatAQueuedReindexOfThePathCovers) {
+    const std::string junk =
+        "not json\n\n[65536]\n{\"event\":65536}\n{\"path\":\"/vol1/photo/a\"}\n"
+        "{\"event\":\"65536\",\"path\":\"/vol1/photo/a\"}\n"
+        "{\"event\":65536,\"path\":[\"/vol1/photo/a\"]}\n"
+        "{\"event\":-65536,\"path\":\"/vol1/photo/a\"}\n"
+        "{\"event\":65536,\"path\":\"/vol1/photo/a\"} // and more\n";
+    const std::string monitorLine = R"({"event":256,"path":"/vol1/photo/a","path_old":"/vol1/photo/b"})";
+    const std::string endless =
+        R"({"event":65536,"data":")" + std::string(1 << 20, 'x') + R"(","path":"/vol1/photo/a"})";
+    const struct {
+        const char *name;
+        std::string queue, companion;
+        const char *path;
+        bool dropped;
+    } rows[] = {
+        {"the same path", kReindexLine + "\n", "", "/vol1/photo/a", true},
+        {"a path below", kReindexLine + "\n", "", "/vol1/photo/a/b", false},
+        {"the path with a slash", kReindexLine + "\n", "", "/vol1/photo/a/", false},
+        {"the share above", kReindexLine + "\n", "", "/vol1/photo", false},
+        {"another event of the path", kSettingLine + "\n" + monitorLine + "\n", "", "/vol1/photo/a", false},
+        {"in the companion", "", kReindexLine + "\n", "/vol1/photo/a", true},
+        {"only malformed lines", junk, junk, "/vol1/photo/a", false},
+        {"behind malformed lines", junk + kReindexLine + "\n" + junk, "", "/vol1/photo/a", true},
+        {"event written as 65536.0",
+         R"({"event":65536.0,"path":"/vol1/photo/a"})"
+         "\n",
+         "", "/vol1/photo/a", true},
+        {"in a line beyond 1 MiB", endless + "\n", "", "/vol1/photo/a", false},
+        {"behind a line beyond 1 MiB", endless + "\n" + kReindexLine + "\n", "", "/vol1/photo/a", true},
+    };
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        GivenQueue("photo", row.queue);
+        GivenQueue("photo", row.companion, ".tmp");
+        EXPECT_TRUE(AddSetting(row.path));
+        EXPECT_EQ(row.dropped ? row.queue.size()
+                              : row.queue.size() + kSettingLine.size() + 1 + std::string(row.path).size() -
+                                    std::string(kPath).size(),
+                  fs::file_size(kQueue));
+        EXPECT_EQ(row.companion, ReadFile(std::string(kQueue) + ".tmp"));
+    }
+    EXPECT_THAT(Records(), IsEmpty());
+}
+
+TEST_F(EventQueue, ThatCannotBeReadIsWrittenAllTheSame) {
+    GivenQueue("photo", kReindexLine + "\n");
+    Fail({.call = "open", .about = kQueue, .error = EACCES});
+    EXPECT_TRUE(AddSetting());
+    EXPECT_THAT(Queue("photo"), ElementsAre(kReindexLine, kSettingLine));
+    EXPECT_THAT(Records(), ElementsAre(std::string("utils.cpp:95 Failed to open queue=") + kQueue +
+                                       ", reason=Permission denied"));
+}
+
+TEST_F(EventQueue, HeldByAnotherLosesTheEventAfterThreeAttempts) {
+    GivenQueue("photo", "");
+    Script::Current().random = 13;
+    const LockAgent reader(kQueue);
+    for (const int level : {3, 7}) {
+        Forget();
+        LOG_LEVEL = level;
+        EXPECT_TRUE(AddSetting());
+        EXPECT_EQ(3, Script::Current().Calls("flock", kQueue));
+        EXPECT_EQ(3, Script::Current().Calls("usleep", "3000"));
+    }
+    EXPECT_THAT(Records(), ElementsAre(std::string("utils.cpp:516 try lock too many times, path=") + kQueue +
+                                       ", reason=Resource temporarily unavailable"));
+    EXPECT_EQ("", ReadFile(kQueue));
+    EXPECT_EQ("(missing)", StatusConf());
+    EXPECT_EQ(FILEINDEX_ERR_NONE, TakeError());
+}
+
+TEST_F(EventQueue, HeldForAMomentGetsTheEventInTheEnd) {
+    GivenQueue("photo", "");
+    LockAgent reader(kQueue);
+    Fail({.call = "usleep", .nth = 2, .action = [&] { reader.Release(); }});
+    Fail({.call = "flock", .about = kQueue, .error = EINTR});
+    EXPECT_TRUE(AddSetting());
+    EXPECT_THAT(Queue("photo"), ElementsAre(kSettingLine));
+}
+
+TEST_F(EventQueue, TakenAwayBeforeTheLockIsOpenedAgainAtOnce) {
+    GivenQueue("photo", "");
+    const std::string taken = std::string(kQueue) + ".taken";
+    Fail({.call = "flock", .about = kQueue, .times = 9, .action = [&] { fs::rename(kQueue, taken); }});
+    EXPECT_TRUE(AddSetting());
+    EXPECT_EQ("", ReadFile(taken));
+    EXPECT_THAT(Queue("photo"), ElementsAre(kSettingLine));
+    EXPECT_EQ(0, Script::Current().Calls("usleep"));
+    EXPECT_EQ(0, fs::exists(kStatusConf));
+}
+
+TEST_F(EventQueue, AlwaysTakenAwayEndsTheAttempts) {
+    GivenQueue("photo", "");
+    const std::string taken = std::string(kQueue) + ".taken";
+    Fail({.call = "flock", .about = kQueue, .times = kAlways, .action = [&] { fs::rename(kQueue, taken); }});
+    AddSetting();
+    EXPECT_EQ("", ReadFile(taken));
+    EXPECT_LE(Script::Current().Calls("open", kQueue), 16 + 3);
+}
+
+TEST_F(EventQueue, WrittenShortCountsAsWritten) {
+    GivenQueue("photo", "");
+    for (const int level : {3, 7}) {
+        Forget();
+        LOG_LEVEL = level;
+        Fail({.call = "write", .about = kQueue, .result = 5});
+        EXPECT_TRUE(AddSetting());
+        Fail({.call = "write", .about = kQueue, .error = ENOSPC});
+        EXPECT_TRUE(AddSetting());
+        Script::Current().Finish();
+    }
+    const std::string size = std::to_string(kSettingLine.size() + 1);
+    EXPECT_THAT(Records(), ElementsAre("utils.cpp:502 write fail, (5, " + size + ")",
+                                       "utils.cpp:502 write fail, (-1, " + size + ")"));
+    EXPECT_EQ(kSettingLine.substr(0, 5) + kSettingLine.substr(0, 5), ReadFile(kQueue));
+    EXPECT_EQ("(missing)", StatusConf());
+}
+
+TEST_F(EventQueue, ThatCannotBeUsedMarksTheShareForReindexing) {
+    const std::string elsewhere = "/vol1/photo/elsewhere";
+    const std::string hardLock =
+        std::string("utils.cpp:507 flock fail, path=") + kQueue + ", reason=No locks available";
+    const struct {
+        const char *name;
+        std::function<void()> plant;
+        int logLevel;
+        std::vector<std::string> records;
+    } rows[] = {
+        {"not to be opened", [] { Fail({.call = "open", .about = kQueue, .error = EACCES}); }, 7, {}},
+        {"no lock", [] { Fail({.call = "flock", .about = kQueue, .error = ENOLCK}); }, 3, {}},
+        {"no lock, debugging", [] { Fail({.call = "flock", .about = kQueue, .error = ENOLCK}); }, 7, {hardLock}},
+        {"directory", [] { fs::create_directory(kQueue); }, 7, {}},
+        {"fifo", [] { ::mkfifo(kQueue, 0600); }, 7, {}},
+        {"link", [&] { fs::create_symlink(elsewhere, kQueue); }, 7, {}},
+        {"link to a file", [&] { WriteFile(elsewhere, ""), fs::create_symlink(elsewhere, kQueue); }, 7, {}},
+        {"share gone in between",
+         [] { Fail({.call = "VORKShareGet", .error = 0x1400}); },
+         3,
+         {"utils.cpp:772 VORKShareGet failed, name=photo, code=5120",
+          "utils.cpp:478 FILEIDXQueuePathGet failed, share=photo"}},
+    };
+    fs::create_directory("/vol1/photo/@eaDir");
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        Forget();
+        fs::remove(kQueue);
+        fs::remove(kStatusConf);
+        LOG_LEVEL = row.logLevel;
+        const auto descriptors = OpenDescriptors();
+        row.plant();
+        EXPECT_FALSE(AddSetting());
+        EXPECT_EQ(kNeedReindex, StatusConf());
+        EXPECT_EQ(row.records, Records());
+        EXPECT_EQ(descriptors, OpenDescriptors());
+        EXPECT_FALSE(fs::exists(elsewhere) && fs::file_size(elsewhere) > 0);
+        EXPECT_THAT(Script::Current().Finish(), IsEmpty());
+    }
+}
+
+TEST_F(EventQueue, OfAPathOutsideEveryShareMarksTheEmptyName) {
+    EXPECT_FALSE(AddSetting("/vol9/x"));
+    EXPECT_EQ(R"({"need_reindex":{"":true}})", StatusConf());
+    EXPECT_THAT(Records(), ElementsAre("utils.cpp:472 VORKShareNamePathGet failed, path=/vol9/x"));
+    EXPECT_EQ(FILEINDEX_ERR_NONE, TakeError());
+}
+
+TEST_F(EventQueue, SaysWhenNotEvenTheMarkCanBeSet) {
+    const LockAgent other(kStatusLock);
+    Fail({.call = "open", .about = kQueue, .error = EMFILE});
+    EXPECT_FALSE(AddSetting());
+    EXPECT_THAT(Records(), ElementsAre("config.cpp Failed to lock folder",
+                                       "utils.cpp:522 ShareSetNeedReindex failed, share=photo"));
+    EXPECT_EQ(FILEINDEX_ERR_LOCK, TakeError());
+}
+
+}  // namespace
+}  // namespace fileindex_test
