@@ -1,6 +1,8 @@
 /**
  * \file
- * File systems: type, mount points, snapshots. None of these may hang on a dead network server.
+ * File systems: type, mount points, snapshots. None of these may hang on a dead network server: below a network
+ * mount nothing is looked at, so a path there is taken to exist and its links are not followed. Above it, links
+ * are followed and automounts are not triggered.
  */
 #ifndef VORK_FILESYSTEM_H
 #define VORK_FILESYSTEM_H
@@ -15,7 +17,7 @@ extern "C" {
 
 /**
  * The type code of the file system that holds the path, -1 when it cannot be told (the path does not exist, for
- * one). The codes are the platform's own; `flags` is 0.
+ * one, or its type is not in the platform's table). The codes are the platform's own; `flags` is 0.
  */
 int VORKGetFSType(const char *szPath, int flags);
 
@@ -28,7 +30,10 @@ int VORKFSIsImageFS(int type);
 /** 1 when the path is the root of a mount, 0 when not, negative on failure. */
 int VORKFSDirIsMntPoint(const char *szPath);
 
-/** 0 with `*pInSnapshot` 1 or 0; negative when it cannot be told. The path need not be a directory. */
+/**
+ * 0 with `*pInSnapshot` 1 or 0; negative when it cannot be told. The path need not be a directory. A share whose
+ * own directory lies in a writable snapshot (after a restore) is live.
+ */
 int VLIBFhsPathInSnapshot(const char *szPath, int *pInSnapshot);
 
 #ifdef __cplusplus

@@ -1,7 +1,11 @@
 /**
  * \file
- * Running programs and waiting for them: by argument vector, never through a shell. The child gets default
- * signal dispositions (the library ignores SIGPIPE in its host) and no descriptor but the standard three.
+ * Running programs and waiting for them: by argument vector, never through a shell. Programs are given by
+ * absolute path. The child gets default signal dispositions (the library ignores SIGPIPE in its host), /dev/null
+ * as its input and no descriptor but the standard three.
+ *
+ * A host that ignores SIGCHLD, or collects any child that ends, leaves no exit status to return: 0 then means
+ * that the program ran to its end.
  */
 #ifndef VORK_PROCESS_H
 #define VORK_PROCESS_H
@@ -13,7 +17,7 @@ extern "C" {
 
 /**
  * Runs `szProgram` with up to four arguments (unused ones null; the first null ends the list) and waits for it.
- * Its exit status (0 is success), negative when it could not be run or was ended by a signal.
+ * Its exit status (0 is success), negative with VORK_ERR_EXEC when it could not be run or was ended by a signal.
  */
 int VLIBCExec(const char *szProgram, const char *arg1, const char *arg2, const char *arg3, const char *arg4);
 

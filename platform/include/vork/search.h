@@ -14,7 +14,7 @@ extern "C" {
 int VORKSMBIsEnableSpotlight(void);
 
 /** Stores the setting; it takes effect when the service is restarted. Negative on failure, with the platform
- * error set and the setting as it was. */
+ * error set and the setting as it was. Waits two seconds at most for another writer (VORK_ERR_TIMEOUT). */
 int VORKSMBSetSpotlight(int enable);
 
 #ifdef __cplusplus

@@ -3,9 +3,10 @@
  * System services, by the library's names for them: "fileindexd" and "samba" (the file-sharing service). A
  * platform maps the names to its own.
  *
- * The library holds a lock for which others wait no more than 30 ms: every call is bounded to seconds, whatever
- * the service does. Negative on failure, with the platform error set; an unknown service is
- * VORK_ERR_NO_SUCH_SERVICE.
+ * The library holds a lock for which others wait no more than 30 ms: every call is bounded to ten seconds,
+ * whatever the service does. Negative on failure, with the platform error set: VORK_ERR_NO_SUCH_SERVICE for an
+ * unknown service, VORK_ERR_TIMEOUT for one that took longer (its start may still succeed), VORK_ERR_SERVICE for
+ * one that refused.
  */
 #ifndef VORK_SERVICE_H
 #define VORK_SERVICE_H
@@ -22,7 +23,8 @@ int VLIBServiceStart(const char *szName, int flag);
  * is no failure. */
 int VLIBServiceStop(const char *szName, int flag);
 
-/** Makes the service read its settings anew. For "samba" this keeps clients connected where it can. */
+/** Makes the service read its settings anew by restarting it. "samba" is left alone when it does not run, where
+ * that can be told. */
 int VLIBServiceRestart(const char *szName);
 
 #ifdef __cplusplus

@@ -24,7 +24,12 @@ typedef struct _tag_VORKSHARE {
 
 /**
  * Looks a share up by name. 0, with a record in `*ppShare` that the caller releases with VORKShareFree; negative,
- * with `*ppShare` untouched and the platform error set, when there is no such share.
+ * with `*ppShare` untouched and the platform error set, when there is no such share (VORK_ERR_NO_SUCH_SHARE), its
+ * directory has another name (VORK_ERR_SHARE_DIRECTORY_NAME), its record is damaged (VORK_ERR_MALFORMED) or the
+ * name cannot be one component of a path (VORK_ERR_BAD_PARAMETER).
+ *
+ * When the platform's configuration cannot be read, lookups answer from what it was last, and the platform error
+ * tells, also beside a success.
  *
  * Called once for each folder of each loaded configuration: it has to be quick (microseconds) with a thousand
  * shares.
@@ -36,7 +41,8 @@ void VORKShareFree(struct _tag_VORKSHARE *pShare);
 
 /**
  * Finds the share that holds a full path (the innermost, where shares are nested) and writes its name and its
- * directory, NUL-terminated. The path need not exist. Negative when no share holds it or a buffer is too short.
+ * directory, NUL-terminated. The path need not exist; it is compared byte for byte on component boundaries, so
+ * links and ".." are not looked through. Negative when no share holds it or a buffer is too short.
  */
 int VORKShareNamePathGet(const char *szFullPath, char *szName, int cbName, char *szPath, int cbPath);
 

@@ -2,7 +2,8 @@
 /// The client of the notification daemon, which watches directories and writes what changes into queue files.
 ///
 /// A registration is kept durably under the queue's path and a name. The daemon reads all registrations when it
-/// starts and notices each change of them.
+/// starts and notices each change of them. Processes that register at the same time wait for each other, two
+/// seconds at most.
 #ifndef VORKNOTIFYD_MONITOR_QUEUE_H
 #define VORKNOTIFYD_MONITOR_QUEUE_H
 

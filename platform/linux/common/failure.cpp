@@ -17,12 +17,12 @@ const char *FileNameOf(const char *path) {
 
 }  // namespace
 
-int Fail(int code, std::source_location where) {
-    VLIBCErrSetEx(code, FileNameOf(where.file_name()), static_cast<int>(where.line()));
+int Fail(int code, Place where) {
+    VLIBCErrSetEx(code, FileNameOf(where.file), where.line);
     return -1;
 }
 
-int FailErrno(int error, std::source_location where) {
+int FailErrno(int error, Place where) {
     return Fail(CodeOfErrno(error), where);
 }
 

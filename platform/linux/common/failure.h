@@ -2,16 +2,24 @@
 #ifndef PLATFORM_LINUX_COMMON_FAILURE_H
 #define PLATFORM_LINUX_COMMON_FAILURE_H
 
-#include <source_location>
-
 namespace VORK::PLATFORM {
+
+/// A place in the source. As a default argument, `Place::Here()` is the place of the call.
+struct Place {
+    const char *file;
+    int line;
+
+    static constexpr Place Here(const char *file = __builtin_FILE(), int line = __builtin_LINE()) {
+        return {file, line};
+    }
+};
 
 /// Sets the platform error with the place of the call; the result is the negative value that the C functions
 /// return.
-int Fail(int code, std::source_location where = std::source_location::current());
+int Fail(int code, Place where = Place::Here());
 
 /// Fail with the code that stands for the errno value `error`.
-int FailErrno(int error, std::source_location where = std::source_location::current());
+int FailErrno(int error, Place where = Place::Here());
 
 /// The platform code for an errno value.
 int CodeOfErrno(int error);

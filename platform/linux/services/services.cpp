@@ -11,7 +11,6 @@
 #include <exception>
 #include <memory>
 #include <optional>
-#include <source_location>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -57,7 +56,7 @@ std::unique_ptr<ServiceManager> ManagerOfThisMachine() {
 
 // Runs `act` with the manager and the service's name here, and turns its error into a result.
 template <typename Act>
-int WithService(const char *name, Act act, std::source_location where = std::source_location::current()) try {
+int WithService(const char *name, Act act, Place where = Place::Here()) try {
     if (!IsServiceName(name)) {
         return Fail(VORK_ERR_BAD_PARAMETER, where);
     }
