@@ -99,8 +99,8 @@ check_frame "the daemon is told of the folder" \
 
 show "the queue of the share photo" "$photoQueue"
 check_lines "it holds one event" 1 "$photoQueue"
-check_json "settings changed (0x20000), and for which kinds of file" "$photoQueue" '{"data":{"audio":false,
-    "document":false,"photo":true,"video":true},"event":131072,"path":"/vol1/photo/2015"}'
+check_json "settings changed (0x20000), for every kind of file: nothing governed them before" "$photoQueue" \
+    '{"data":{"audio":true,"document":true,"photo":true,"video":true},"event":131072,"path":"/vol1/photo/2015"}'
 
 heading "Add a whole share of documents"
 run_ctl add /documents --media document
@@ -142,7 +142,7 @@ check_frame "the daemon is told the same time" "{\"data\":{\"resume_time\":$resu
 run_ctl resume
 expect_frames 5
 check_frame "the daemon is told to go on" '{"data":{},"type":"resume"}'
-check "the pause is gone from status.conf" test -z "$(grep resume_time "$statusConf")"
+check_json "and nothing is paused in status.conf" "$statusConf" '{"resume_time":-1}'
 
 heading "Everything the daemon received"
 show "length and text of each frame" "$frames"

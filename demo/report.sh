@@ -90,11 +90,13 @@ lengths_are_right() {
 
 # Runs fileindexctl, whose exit status shall be the first argument.
 ctl_ends_with() {
-    local expected=$1 status
+    local expected=$1 status argument line=fileindexctl
     shift
-    printf '\n   %s$ fileindexctl' "$bold"
-    printf ' %q' "$@"
-    printf '%s\n' "$plain"
+    for argument in "$@"; do
+        [[ $argument != *' '* ]] || argument="\"$argument\""
+        line+=" $argument"
+    done
+    printf '\n   %s$ %s%s\n' "$bold" "$line" "$plain"
     "$ctl" "$@" 2>&1 | indent
     status=${PIPESTATUS[0]}
     [[ $status -eq $expected ]]
