@@ -3,9 +3,9 @@
 #ifndef FILEINDEX_SRC_COVERAGE_H
 #define FILEINDEX_SRC_COVERAGE_H
 
-#include <fileindex/folder.h>
+#include "folder_access.h"
 
-#include <json/value.h>
+#include <fileindex/folder.h>
 
 #include <string>
 #include <string_view>
@@ -15,12 +15,19 @@ namespace VORK::FILEINDEX::internal {
 /// Does `path` + "/" start with `folder` + "/"? So "/photo/2019" holds itself and "/photo/2019/x", not
 /// "/photo/20190". Bytes are compared, nothing is normalised.
 inline bool IsAtOrUnder(std::string_view path, std::string_view folder) {
-    return path.starts_with(folder) && (path.size() == folder.size() || path[folder.size()] == '/');
+    if (path.size() > folder.size() && path[folder.size()] != '/') {
+        return false;  // settles most comparisons without looking at the folder's text
+    }
+    return path.starts_with(folder);
 }
 
 /// Does the folder cover the full path? One that could not be resolved covers none; compared by the rule above
 /// its empty path would cover all.
 inline bool Covers(const Folder &folder, std::string_view fullPath) {
+    const std::string &stored = FolderAccess::StoredFullPath(folder);
+    if (!stored.empty()) {
+        return IsAtOrUnder(fullPath, stored);
+    }
     const std::string place = folder.GetFullPath();
     return !place.empty() && IsAtOrUnder(fullPath, place);
 }
@@ -38,8 +45,8 @@ public:
         }
     }
 
-    /// The folder's record, or an object without members.
-    Json::Value asJson() const { return folder_ != nullptr ? folder_->asJson() : Json::Value(Json::objectValue); }
+    /// Null when none covers the path.
+    const Folder *Get() const { return folder_; }
 
 private:
     std::string_view full_path_;

@@ -1,3 +1,4 @@
+#include "folder_access.h"
 #include "json/text.h"
 #include "names.h"
 
@@ -25,8 +26,7 @@ bool Folder::Load(const std::string &sharePath, const Json::Value &record) {
     RetrieveBoolFromJsonObj(audio, "audio", record);
     RetrieveBoolFromJsonObj(video, "video", record);
     RetrieveBoolFromJsonObj(photo, "photo", record);
-    full_path_.clear();  // the place of another path is worse than none
-    return FILEINDEX::GetFullPath(full_path_, path);
+    return internal::FolderAccess::Resolve(*this);
 }
 
 bool Folder::Reload(const std::string &sharePath, const Json::Value &record) {
@@ -39,8 +39,7 @@ bool Folder::Reload(const std::string &sharePath, const Json::Value &record) {
 
 bool Folder::SetPath(const std::string &sharePath) {
     path = sharePath;
-    full_path_.clear();
-    return FILEINDEX::GetFullPath(full_path_, path);
+    return internal::FolderAccess::Resolve(*this);
 }
 
 std::string Folder::GetFullPath() const {

@@ -14,8 +14,14 @@
 namespace VORK {
 namespace FILEINDEX {
 
+namespace internal {
+struct FolderAccess;
+}
+
 /// A plain value, copied freely.
 class Folder {
+    friend struct internal::FolderAccess;
+
     std::string full_path_;  // empty when `path` could not be resolved
 
 public:
@@ -28,7 +34,7 @@ public:
 
     /// Sets `path` from the argument (never from the record), then each field that `record` holds with the
     /// right type; the others stay as they are. False only when the path cannot be resolved
-    /// (FILEINDEX_ERR_PATH); the fields are set all the same.
+    /// (FILEINDEX_ERR_PATH; an empty path sets no code and leaves a record); the fields are set all the same.
     FILEINDEX_API bool Load(const std::string &sharePath, const Json::Value &record);
 
     /// Load into a folder whose fields have first been reset to empty and false.

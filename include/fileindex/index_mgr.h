@@ -5,7 +5,8 @@
 /// Success means that the configuration is saved and every party has been told; the daemon acts later. Changes
 /// are serialised between processes by /tmp/fileidx_cfg_folder.lock, held from the load to the last
 /// notification; a call that finds it busy fails within 30 ms with FILEINDEX_ERR_LOCK. Nothing is rolled back:
-/// folder.conf is saved before anyone is told, and after a failure the same call repeated brings all into step.
+/// folder.conf is saved before anyone is told, and after a failure the same call repeated tells everyone again
+/// (its events then report no change against what was saved: Reindex has the folders read anew).
 /// Nothing here throws.
 #ifndef FILEINDEX_INDEX_MGR_H
 #define FILEINDEX_INDEX_MGR_H
@@ -57,8 +58,9 @@ public:
                                    const std::string &sort_by, const std::string &sort_direction,
                                    const Json::Value &additional);
 
-    /// The record of the folder stored under exactly this share path. Takes the exclusive lock, so it waits for
-    /// no one and never sees a change half announced. Unknown: FILEINDEX_ERR_NO_SUCH_FOLDER.
+    /// The record of the folder stored under exactly this share path. Takes the exclusive lock, so it never sees
+    /// a change half announced, and fails with FILEINDEX_ERR_LOCK while one is under way. Unknown:
+    /// FILEINDEX_ERR_NO_SUCH_FOLDER.
     FILEINDEX_API static bool Get(Json::Value &result, const std::string &path);
     /// @}
 
@@ -85,7 +87,8 @@ public:
 
     /// Removes folders: `paths` is an array of share paths; one that is not indexed is no error. A share left
     /// without folders loses its queue, index database and monitor; when no folder is left anywhere, the
-    /// daemon is stopped and the search setting switched off.
+    /// daemon is stopped and the search setting switched off. A folder whose share is gone is removed and saved,
+    /// but the call fails where its event cannot be queued or its share not be cleaned.
     FILEINDEX_API static bool Delete(const Json::Value &paths);
 
     /// Queues a reindex of each share path of the array, whose shares must be indexed, and revives shares that
@@ -125,7 +128,8 @@ public:
     FILEINDEX_API static bool ShareResume(const std::string &share);
 
     /// Deletes the share's queue file, its ".tmp" companion and its index database directory. No lock. The
-    /// caller sees to it that the share is not in use.
+    /// caller sees to it that the share is not in use. Refused, with nothing deleted, when the share's "@eaDir"
+    /// is a link or a path might have been cut.
     FILEINDEX_API static bool CleanShareIndexData(const std::string &share);
     /// @}
 };

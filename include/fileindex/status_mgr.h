@@ -49,8 +49,8 @@ public:
     /// The service as a whole: "processing", "paused" or "finished".
     ///
     /// Inferred from the queue files of the shares that have an indexable folder: one that exists, even empty,
-    /// is work left; only then does a pause show. False, `status` untouched, when a configuration file or a
-    /// share cannot be read.
+    /// is work left; only then does a pause show. False, `status` untouched, when a configuration file cannot
+    /// be read. Folders whose share is away do not count.
     FILEINDEX_API static bool GetStatus(std::string &status);
 
     /// One folder (share path): "finished", "paused", "processing" or "err_no_space".

@@ -1,4 +1,5 @@
 #include "coverage.h"
+#include "folder_access.h"
 #include "json/text.h"
 #include "names.h"
 
@@ -9,6 +10,8 @@
 
 #include <syslog.h>
 
+#include <cstddef>
+#include <iterator>
 #include <utility>
 
 namespace VORK {
@@ -19,11 +22,13 @@ using internal::ToString;
 
 namespace {
 
-/// The configuration that governs `fullPath` when the record stored under `path` is `own` (null: none is).
+using FolderMap = std::map<std::string, Folder>;
+
+/// The folder that governs `fullPath` when the record stored under `path` is `own` (null: none is).
 ///
 /// Walks the store as it was or will be without copying it.
-Json::Value GoverningCfg(const std::map<std::string, Folder> &folders, const std::string &fullPath,
-                         const std::string &path, const Folder *own) {
+const Folder *GoverningFolder(const FolderMap &folders, const std::string &fullPath, const std::string &path,
+                              const Folder *own) {
     internal::Governing governing(fullPath);
     const auto split = folders.lower_bound(path);
     for (auto it = folders.begin(); it != split; ++it) {
@@ -35,19 +40,17 @@ Json::Value GoverningCfg(const std::map<std::string, Folder> &folders, const std
     for (auto it = folders.upper_bound(path); it != folders.end(); ++it) {
         governing.Consider(it->second);
     }
-    return governing.asJson();
+    return governing.Get();
 }
 
-/// True for each media kind that is indexed differently after the change. A side that no folder governs lacks
-/// the member, which always counts as a difference.
-Json::Value ChangeReport(const Json::Value &before, const Json::Value &after) {
+/// True for each media kind that is indexed differently after the change. A side that no folder governs always
+/// counts as a difference.
+Json::Value ChangeReport(const Folder *before, const Folder *after) {
     Json::Value report(Json::objectValue);
-    for (const char *kind : internal::kMediaKeys) {
-        bool was = false;
-        bool is = false;
-        const bool governed =
-            RetrieveBoolFromJsonObj(was, kind, before) && RetrieveBoolFromJsonObj(is, kind, after);
-        report[kind] = !governed || was != is;
+    for (std::size_t kind = 0; kind < std::size(internal::kMediaKeys); ++kind) {
+        const bool Folder::*flag = internal::kMediaFlags[kind];
+        report[internal::kMediaKeys[kind]] =
+            before == nullptr || after == nullptr || before->*flag != after->*flag;
     }
     return report;
 }
@@ -64,34 +67,6 @@ std::string Folders::GetLockPath() const {
 
 std::string Folders::GetPath() const {
     return internal::kFolderConf;
-}
-
-bool Folders::Load() {
-    if (!LoadJson()) {
-        return false;
-    }
-    if (!document_.isObject()) {
-        syslog(LOG_ERR, "%s:%d Malformed folders: %s", kFoldersModule, __LINE__, ToString(document_).c_str());
-        ErrorHandler::SetError(FILEINDEX_ERR_MALFORMED_CONFIG);
-        return false;
-    }
-    for (auto it = document_.begin(); it != document_.end(); ++it) {
-        const std::string path = it.name();
-        Folder folder;
-        folder.Load(path, *it);  // a folder whose share is away stays in the list
-        folders_.emplace(path, std::move(folder));
-    }
-    return true;
-}
-
-bool Folders::Save() {
-    document_ = Json::Value(Json::objectValue);
-    for (const auto &[path, folder] : folders_) {
-        if (!folder.AddToJson(document_)) {
-            return false;
-        }
-    }
-    return SaveJson();
 }
 
 bool Folders::Get(Json::Value &out, const std::string &path) {
@@ -143,9 +118,9 @@ bool Folders::Upsert(Json::Value &out, const Json::Value &folder) {
             return false;
         }
     }
-    const Json::Value before = GoverningCfg(folders_, fullPath, path, known ? &found->second : nullptr);
+    const Folder *before = GoverningFolder(folders_, fullPath, path, known ? &found->second : nullptr);
     // After the change the record itself counts, even where a folder later in the list governs the path.
-    out = ChangeReport(before, updated.asJson());
+    out = ChangeReport(before, &updated);
     if (known) {
         found->second = std::move(updated);
     }
@@ -158,8 +133,8 @@ bool Folders::Delete(Json::Value &out, const std::string &path) {
     if (!GetFullPath(fullPath, path)) {
         return true;  // a folder of a share that is gone can still be removed
     }
-    const Json::Value before = GoverningCfg(folders_, fullPath, path, removed ? &removed.mapped() : nullptr);
-    const Json::Value after = GoverningCfg(folders_, fullPath, path, nullptr);
+    const Folder *before = GoverningFolder(folders_, fullPath, path, removed ? &removed.mapped() : nullptr);
+    const Folder *after = GoverningFolder(folders_, fullPath, path, nullptr);
     out = Json::Value(Json::objectValue);
     out[path] = ChangeReport(before, after);
     return true;
@@ -170,7 +145,8 @@ Json::Value GetMostSuitableCfg(std::vector<Folder> folders, const std::string &p
     for (const Folder &folder : folders) {
         governing.Consider(folder);
     }
-    return governing.asJson();
+    const Folder *folder = governing.Get();
+    return folder != nullptr ? folder->asJson() : Json::Value(Json::objectValue);
 }
 
 }  // namespace FILEINDEX

@@ -1,8 +1,8 @@
 #include "json/text.h"
 #include "names.h"
 #include "no_throw.h"
+#include "utils/event_queue.h"
 
-#include <fileindex/daemon.h>
 #include <fileindex/error.h>
 #include <fileindex/index_mgr.h>
 #include <fileindex/paths.h>
@@ -11,6 +11,7 @@
 #include <syslog.h>
 
 #include <set>
+#include <vector>
 
 namespace VORK {
 namespace FILEINDEX {
@@ -47,6 +48,15 @@ bool Check(const Json::Value &paths, std::set<std::string> &outOfSpace) {
     return true;
 }
 
+std::vector<std::string> Strings(const Json::Value &array) {
+    std::vector<std::string> strings;
+    strings.reserve(array.size());
+    for (const Json::Value &element : array) {
+        strings.push_back(element.asString());
+    }
+    return strings;
+}
+
 }  // namespace
 
 bool IndexMgr::Reindex(const Json::Value &jsArrPath) {
@@ -64,6 +74,7 @@ bool IndexMgr::Reindex(const Json::Value &jsArrPath) {
                 syslog(LOG_ERR, "%s:%d ShareRevice failed, share=%s", kIndexMgrModule, 400, share.c_str());
             }
         }
+        PendingReindexes pending(Strings(jsArrPath));
         for (const Json::Value &element : jsArrPath) {
             const std::string path = element.asString();
             std::string fullPath;
@@ -72,7 +83,7 @@ bool IndexMgr::Reindex(const Json::Value &jsArrPath) {
                 ErrorHandler::SetError(FILEINDEX_ERR_PATH);
                 return false;
             }
-            if (!AddCustomEvent(kReindexEvent, fullPath, Json::Value())) {
+            if (!AddEvent(pending, kReindexEvent, fullPath, path, Json::Value())) {
                 syslog(LOG_ERR, "%s:%d AddCustomEvent failed, path=%s", kIndexMgrModule, 413, path.c_str());
                 return false;
             }

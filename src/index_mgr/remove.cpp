@@ -1,4 +1,6 @@
 #include "index_mgr/changes.h"
+#include "index_mgr/events.h"
+#include "index_mgr/share_folders.h"
 #include "index_mgr/stop_indexing.h"
 #include "json/text.h"
 #include "names.h"
@@ -66,8 +68,9 @@ bool SendCommands(const Json::Value &paths) {
 }
 
 bool QueueEvents(const Json::Value &reports) {
+    PendingReindexes pending = PendingReindexesOf(reports);
     for (auto report = reports.begin(); report != reports.end(); ++report) {
-        if (!IndexMgr::Update(report.name(), *report)) {
+        if (!UpdateOne(pending, report.name(), *report)) {
             syslog(LOG_ERR, "%s:%d Update failed", kIndexMgrModule, 111);
             return false;
         }
@@ -86,8 +89,7 @@ bool FollowShare(Folders &saved, const std::string &share) {
     // "No" can also mean that folder.conf could not be read again. Cleaning then would delete the index of a share
     // that is in use; what was just saved decides.
     std::vector<Folder> left;
-    saved.List(left, share);
-    if (!left.empty()) {
+    if (!FoldersOf(saved, share, left) || !left.empty()) {
         syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", kIndexMgrModule, 121, share.c_str());
         return false;
     }

@@ -1,3 +1,4 @@
+#include "index_mgr/share_folders.h"
 #include "index_mgr/stop_indexing.h"
 #include "names.h"
 #include "no_throw.h"
@@ -24,20 +25,6 @@ using namespace internal;
 namespace {
 
 constexpr StopIndexingLines kStopLines = {535, 540, 542};
-
-/// An empty name means the records whose own share name is empty, and never all of them.
-bool FoldersOf(Folders &store, const std::string &share, std::vector<Folder> &folders) {
-    if (!store.List(folders, share)) {
-        return false;
-    }
-    if (share.empty()) {
-        std::erase_if(folders, [](const Folder &folder) {
-            std::string owner;
-            return !GetShareNameByPath(owner, folder.path) || !owner.empty();
-        });
-    }
-    return true;
-}
 
 bool SendShareCommand(const char *command, const std::string &share) {
     Json::Value data(Json::objectValue);

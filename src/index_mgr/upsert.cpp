@@ -1,4 +1,5 @@
 #include "index_mgr/changes.h"
+#include "index_mgr/events.h"
 #include "json/text.h"
 #include "names.h"
 #include "no_throw.h"
@@ -71,6 +72,7 @@ bool SendCommands(const Json::Value &folders) {
 }
 
 bool QueueEvents(const Json::Value &reports) {
+    PendingReindexes pending = PendingReindexesOf(reports);
     for (auto report = reports.begin(); report != reports.end(); ++report) {
         const std::string path = report.name();
         std::string fullPath;
@@ -79,7 +81,7 @@ bool QueueEvents(const Json::Value &reports) {
             ErrorHandler::SetError(FILEINDEX_ERR_PATH);
             return false;
         }
-        if (!AddCustomEvent(kSettingEvent, fullPath, *report)) {
+        if (!AddEvent(pending, kSettingEvent, fullPath, path, *report)) {
             syslog(LOG_ERR, "%s:%d AddCustomEvent failed", kIndexMgrModule, 634);
             return false;
         }
@@ -118,22 +120,6 @@ bool IndexMgr::Set(const Json::Value &folders) {
 
 bool IndexMgr::Add(const Json::Value &folders) {
     return Upsert(folders);
-}
-
-bool IndexMgr::Update(const std::string &path, const Json::Value &data) {
-    return NoThrow([&] {
-        std::string fullPath;
-        if (!GetFullPath(fullPath, path)) {
-            syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", kIndexMgrModule, 430, path.c_str());
-            ErrorHandler::SetError(FILEINDEX_ERR_PATH);
-            return false;
-        }
-        if (!AddCustomEvent(kSettingEvent, fullPath, data)) {
-            syslog(LOG_ERR, "%s:%d AddCustomEvent failed", kIndexMgrModule, 436);
-            return false;
-        }
-        return true;
-    });
 }
 
 }  // namespace FILEINDEX

@@ -1,6 +1,5 @@
 #include "json/file.h"
 
-#include "json/text.h"
 #include "scoped.h"
 
 #include <fcntl.h>
@@ -12,7 +11,6 @@
 #include <cerrno>
 #include <chrono>
 #include <cstddef>
-#include <cstdio>
 #include <thread>
 
 namespace VORK::FILEINDEX::internal {
@@ -103,7 +101,7 @@ bool WriteOnce(int fd, const std::string &text) {
 
 /// Replaces the content of an open file. The text is padded with blanks, which JSON ignores, to the old length,
 /// and the length set last: a writer that dies in between leaves a whole document at every instant.
-bool Replace(UniqueFd fd, std::string text) {
+bool Replace(UniqueFd fd, const std::string &path, const std::string &text) {
     struct stat status = {};
     if (!IsRegular(fd.Get(), status)) {
         return false;
@@ -113,17 +111,26 @@ bool Replace(UniqueFd fd, std::string text) {
     if (!ReadAll(fd.Get(), status.st_size, old)) {
         return false;
     }
-    const std::size_t size = text.size();
-    if (size > old.size() && !Reserve(fd.Get(), size)) {
+    if (text.size() > old.size() && !Reserve(fd.Get(), text.size())) {
         (void)Truncate(fd.Get(), old.size());  // gives back what was claimed before the disk was full
         return false;
     }
-    text.resize(std::max(size, old.size()), ' ');
-    if (!WriteOnce(fd.Get(), text) || (text.size() > size && !Truncate(fd.Get(), size))) {
+    const bool shrinks = text.size() < old.size();
+    const bool written = shrinks ? WriteOnce(fd.Get(), text + std::string(old.size() - text.size(), ' ')) &&
+                                       Truncate(fd.Get(), text.size())
+                                 : WriteOnce(fd.Get(), text);
+    if (!written) {
         Restore(fd.Get(), old);
         return false;
     }
-    return fd.Close();
+    if (!fd.Close()) {
+        const UniqueFd again(open(path.c_str(), O_WRONLY | kOpenFlags));
+        if (again) {
+            Restore(again.Get(), old);
+        }
+        return false;
+    }
+    return true;
 }
 
 std::string DirectoryOf(const std::string &path) {
@@ -140,6 +147,8 @@ bool Publish(int fd, const std::string &path) {
     return linkat(AT_FDCWD, self.c_str(), AT_FDCWD, path.c_str(), AT_SYMLINK_FOLLOW) == 0;
 }
 
+/// For file systems without nameless files. A file that could not be written goes away again: empty it would be a
+/// broken configuration, missing it is none yet.
 bool CreateByName(const std::string &path, const std::string &text) {
     UniqueFd fd(open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | kOpenFlags, 0644));
     if (!fd) {
@@ -149,7 +158,7 @@ bool CreateByName(const std::string &path, const std::string &text) {
     if (WriteOnce(fd.Get(), text) && fd.Close()) {
         return true;
     }
-    (void)unlink(path.c_str());  // an empty file would be a broken configuration, a missing one is none yet
+    (void)unlink(path.c_str());
     return false;
 }
 
@@ -161,31 +170,32 @@ bool Create(const std::string &path, const std::string &text) {
         const bool unsupported = errno == EOPNOTSUPP || errno == EISDIR || errno == EINVAL;
         return unsupported && CreateByName(path, text);
     }
-    return WriteOnce(fd.Get(), text) && Publish(fd.Get(), path) && fd.Close();
+    if (!WriteOnce(fd.Get(), text) || !Publish(fd.Get(), path)) {
+        return false;
+    }
+    if (!fd.Close()) {
+        (void)unlink(path.c_str());
+        return false;
+    }
+    return true;
 }
 
 }  // namespace
 
-bool FromFile(const std::string &path, Json::Value &out) {
-    UniqueFd fd(open(path.c_str(), O_RDONLY | kOpenFlags));
+bool ReadFile(const std::string &path, std::string &text) {
+    const UniqueFd fd(open(path.c_str(), O_RDONLY | kOpenFlags));
     struct stat status = {};
     if (!fd || !IsRegular(fd.Get(), status)) {
         return false;
     }
     AwaitDataLock(fd.Get(), LOCK_SH);
-    std::string text;
-    if (!ReadAll(fd.Get(), status.st_size, text)) {
-        return false;
-    }
-    fd.Close();  // lets a writer in while this process parses
-    return JsonReader().Parse(text, out);
+    return ReadAll(fd.Get(), status.st_size, text);
 }
 
-bool ToFile(const std::string &path, const Json::Value &value) {
-    std::string text = ToString(value) + '\n';
+bool WriteFile(const std::string &path, const std::string &text) {
     UniqueFd fd(open(path.c_str(), O_RDWR | kOpenFlags));
     if (fd) {
-        return Replace(std::move(fd), std::move(text));
+        return Replace(std::move(fd), path, text);
     }
     return errno == ENOENT && Create(path, text);
 }

@@ -2,6 +2,7 @@
 
 #include <json/writer.h>
 
+#include <algorithm>
 #include <exception>
 
 namespace VORK::FILEINDEX::internal {
@@ -23,11 +24,110 @@ std::unique_ptr<Json::CharReader> NewReader() {
     return std::unique_ptr<Json::CharReader>(builder.newCharReader());
 }
 
+bool NeedsEscape(char c) {
+    return static_cast<unsigned char>(c) < 0x20 || c == '"' || c == '\\';
+}
+
+void AppendEscaped(std::string &out, char c) {
+    switch (c) {
+        case '"':
+            out += "\\\"";
+            return;
+        case '\\':
+            out += "\\\\";
+            return;
+        case '\b':
+            out += "\\b";
+            return;
+        case '\f':
+            out += "\\f";
+            return;
+        case '\n':
+            out += "\\n";
+            return;
+        case '\r':
+            out += "\\r";
+            return;
+        case '\t':
+            out += "\\t";
+            return;
+        default: {
+            constexpr char kHex[] = "0123456789abcdef";
+            out += "\\u00";
+            out += kHex[(c >> 4) & 0xF];
+            out += kHex[c & 0xF];
+        }
+    }
+}
+
+void Append(std::string &out, const Json::Value &value);
+
+void AppendArray(std::string &out, const Json::Value &array) {
+    char separator = '[';
+    for (const Json::Value &element : array) {
+        out += separator;
+        Append(out, element);
+        separator = ',';
+    }
+    out += array.empty() ? "[]" : "]";
+}
+
+void AppendObject(std::string &out, const Json::Value &object) {
+    char separator = '{';
+    for (auto member = object.begin(); member != object.end(); ++member) {
+        char const *end = nullptr;
+        const char *name = member.memberName(&end);
+        out += separator;
+        AppendQuoted(out, {name, static_cast<std::size_t>(end - name)});
+        out += ':';
+        Append(out, *member);
+        separator = ',';
+    }
+    out += object.empty() ? "{}" : "}";
+}
+
+void Append(std::string &out, const Json::Value &value) {
+    switch (value.type()) {
+        case Json::nullValue:
+            out += "null";
+            return;
+        case Json::intValue:
+            out += std::to_string(value.asLargestInt());
+            return;
+        case Json::uintValue:
+            out += std::to_string(value.asLargestUInt());
+            return;
+        case Json::realValue:
+            out += Json::valueToString(value.asDouble());
+            return;
+        case Json::stringValue: {
+            const char *begin = nullptr;
+            const char *end = nullptr;
+            value.getString(&begin, &end);
+            AppendQuoted(out, {begin, static_cast<std::size_t>(end - begin)});
+            return;
+        }
+        case Json::booleanValue:
+            out += value.asBool() ? "true" : "false";
+            return;
+        case Json::arrayValue:
+            AppendArray(out, value);
+            return;
+        case Json::objectValue:
+            AppendObject(out, value);
+            return;
+    }
+}
+
 }  // namespace
 
 JsonReader::JsonReader() : reader_(NewReader()) {}
 
 bool JsonReader::Parse(std::string_view text, Json::Value &out) const {
+    // To the parser a NUL is the end of the text, whatever follows.
+    if (text.find('\0') != std::string_view::npos) {
+        return false;
+    }
     try {
         return reader_->parse(text.data(), text.data() + text.size(), &out, nullptr);
     } catch (const std::exception &) {
@@ -35,12 +135,25 @@ bool JsonReader::Parse(std::string_view text, Json::Value &out) const {
     }
 }
 
+// Not the JSON library's writer: setting one up costs as much as sending the text it makes.
 std::string ToString(const Json::Value &value) {
-    Json::StreamWriterBuilder builder;
-    builder["indentation"] = "";
-    builder["commentStyle"] = "None";
-    builder["emitUTF8"] = true;
-    return Json::writeString(builder, value);
+    std::string out;
+    Append(out, value);
+    return out;
+}
+
+void AppendQuoted(std::string &out, std::string_view content) {
+    out += '"';
+    while (!content.empty()) {
+        const auto escape = std::find_if(content.begin(), content.end(), NeedsEscape);
+        out.append(content.begin(), escape);
+        if (escape == content.end()) {
+            break;
+        }
+        AppendEscaped(out, *escape);
+        content.remove_prefix(static_cast<std::size_t>(escape - content.begin()) + 1);
+    }
+    out += '"';
 }
 
 }  // namespace VORK::FILEINDEX::internal

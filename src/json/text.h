@@ -29,6 +29,9 @@ private:
 /// escape unchanged, UTF-8 or not.
 std::string ToString(const Json::Value &value);
 
+/// Appends the JSON string with that content, quotes included.
+void AppendQuoted(std::string &out, std::string_view content);
+
 }  // namespace VORK::FILEINDEX::internal
 
 #endif

@@ -1,8 +1,9 @@
+#include "utils/event_queue.h"
+
 #include "json/text.h"
 #include "names.h"
 #include "no_throw.h"
 #include "scoped.h"
-#include "utils/queue_file.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/error.h>
@@ -33,19 +34,23 @@ bool WantDebugRecords() {
     return LOG_LEVEL == kDebugLevel;
 }
 
+constexpr unsigned kReindexType = kReindexEvent;
+
+/// Asks about one queue file whether a reindex of the event's path is waiting in it.
+using PendingCheck = std::function<bool(const std::string &queueFile)>;
+
+void RecordUnreadable(const std::string &queueFile) {
+    syslog(LOG_ERR, "%s:%d Failed to open queue=%s, reason=%m", kUtilsModule, 95, queueFile.c_str());
+}
+
 /// Is a reindex of exactly this path waiting in the file?
 bool IsReindexQueued(const std::string &fullPath, const std::string &queueFile) {
     if (!IsFileExist(queueFile)) {
         return false;
     }
     bool queued = false;
-    const bool opened = ScanQueue(queueFile, [&](std::string_view, const QueueEvent *event) {
-        queued =
-            event != nullptr && event->type == static_cast<unsigned>(kReindexEvent) && event->path == fullPath;
-        return !queued;
-    });
-    if (!opened) {
-        syslog(LOG_ERR, "%s:%d Failed to open queue=%s, reason=%m", kUtilsModule, 95, queueFile.c_str());
+    if (!FindInQueue(queueFile, kReindexType, fullPath, queued)) {
+        RecordUnreadable(queueFile);
     }
     return queued;
 }
@@ -118,7 +123,8 @@ bool Append(const std::string &queuePath, const std::string &line) {
 }
 
 /// Sets `share` as soon as it is known; false when the event cannot be queued.
-bool QueueEventOf(std::string &share, int type, const std::string &fullPath, const Json::Value &data) {
+bool QueueEventOf(std::string &share, int type, const std::string &fullPath, const Json::Value &data,
+                  const PendingCheck &isReindexQueued) {
     char shareName[kShareNameSize] = {};
     char sharePath[kPathSize] = {};
     if (VORKShareNamePathGet(fullPath.c_str(), shareName, sizeof(shareName), sharePath, sizeof(sharePath)) < 0) {
@@ -133,7 +139,7 @@ bool QueueEventOf(std::string &share, int type, const std::string &fullPath, con
     }
     const std::string queuePath = buffer;
     // Whatever the new event is: a reindex that is still to come makes it redundant.
-    if (IsReindexQueued(fullPath, queuePath) || IsReindexQueued(fullPath, queuePath + kQueueTmpSuffix)) {
+    if (isReindexQueued(queuePath) || isReindexQueued(queuePath + kQueueTmpSuffix)) {
         return true;
     }
     Json::Value record(Json::objectValue);
@@ -143,19 +149,82 @@ bool QueueEventOf(std::string &share, int type, const std::string &fullPath, con
     return Append(queuePath, ToString(record) + "\n");
 }
 
+bool QueueOrMark(int type, const std::string &fullPath, const Json::Value &data,
+                 const PendingCheck &isReindexQueued) {
+    std::string share;
+    if (QueueEventOf(share, type, fullPath, data, isReindexQueued)) {
+        return true;
+    }
+    // Outside every share the name is empty; the mark is then the only trace of the lost event.
+    if (!StatusMgr::ShareSetNeedReindex(share, true)) {
+        syslog(LOG_ERR, "%s:%d ShareSetNeedReindex failed, share=%s", kUtilsModule, 522, share.c_str());
+    }
+    return false;
+}
+
 }  // namespace
+
+namespace internal {
+
+PendingReindexes::PendingReindexes(std::vector<std::string> sharePaths) : share_paths_(std::move(sharePaths)) {}
+
+PendingReindexes::KnownQueue &PendingReindexes::Queue(const std::string &queueFile, std::string_view volume) {
+    KnownQueue &queue = queues_[queueFile];
+    if (queue.wanted.empty() || queue.volume != volume) {
+        queue = KnownQueue();
+        queue.volume = volume;
+        for (const std::string &sharePath : share_paths_) {
+            queue.wanted.insert(queue.volume + sharePath);
+        }
+    }
+    return queue;
+}
+
+bool PendingReindexes::IsQueued(const std::string &fullPath, const std::string &sharePath,
+                                const std::string &queueFile) {
+    if (share_paths_.size() < 2 || !fullPath.ends_with(sharePath)) {
+        return IsReindexQueued(fullPath, queueFile);
+    }
+    if (!IsFileExist(queueFile)) {
+        return false;
+    }
+    KnownQueue &queue = Queue(queueFile, std::string_view(fullPath).substr(0, fullPath.size() - sharePath.size()));
+    if (!queue.wanted.contains(fullPath)) {
+        return IsReindexQueued(fullPath, queueFile);
+    }
+    bool inLastLine = false;
+    const auto restarted = [&] { queue.pending.clear(); };
+    const auto visit = [&](std::string_view, const QueueEvent *event) {
+        if (event == nullptr || event->type != kReindexType) {
+            return true;
+        }
+        if (!event->whole) {
+            inLastLine = event->path == fullPath;
+        } else if (queue.wanted.contains(event->path)) {
+            queue.pending.emplace(event->path);
+        }
+        return true;
+    };
+    if (!ScanQueueFrom(queueFile, queue.position, restarted, visit)) {
+        RecordUnreadable(queueFile);
+        return false;
+    }
+    return inLastLine || queue.pending.contains(fullPath);
+}
+
+bool AddEvent(PendingReindexes &pending, int type, const std::string &fullPath, const std::string &sharePath,
+              const Json::Value &data) {
+    return QueueOrMark(type, fullPath, data, [&](const std::string &queueFile) {
+        return pending.IsQueued(fullPath, sharePath, queueFile);
+    });
+}
+
+}  // namespace internal
 
 bool AddCustomEvent(const int &type, const std::string &fullPath, const Json::Value &data) {
     return NoThrow([&] {
-        std::string share;
-        if (QueueEventOf(share, type, fullPath, data)) {
-            return true;
-        }
-        // Outside every share the name is empty; the mark is then the only trace of the lost event.
-        if (!StatusMgr::ShareSetNeedReindex(share, true)) {
-            syslog(LOG_ERR, "%s:%d ShareSetNeedReindex failed, share=%s", kUtilsModule, 522, share.c_str());
-        }
-        return false;
+        return QueueOrMark(type, fullPath, data,
+                           [&](const std::string &queueFile) { return IsReindexQueued(fullPath, queueFile); });
     });
 }
 

@@ -1,5 +1,6 @@
 #include "utils/queue_file.h"
 
+#include "json/ordinary.h"
 #include "json/text.h"
 #include "names.h"
 #include "scoped.h"
@@ -12,7 +13,9 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
+#include <cstring>
 #include <optional>
 #include <vector>
 
@@ -20,118 +23,257 @@ namespace VORK::FILEINDEX::internal {
 
 namespace {
 
-constexpr std::size_t kBlockSize = 64 * 1024;
+constexpr std::size_t kBlockSize = 128 * 1024;
 constexpr std::size_t kMaxLine = 1024 * 1024;  // longer than any record; a file without newlines is no queue
 constexpr std::size_t kShownOfLongLine = 256;
 
-UniqueFd OpenRegular(const std::string &path) {
-    UniqueFd fd(open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
-    struct stat status = {};
-    if (!fd || fstat(fd.Get(), &status) != 0) {
-        return {};
-    }
-    if (!S_ISREG(status.st_mode)) {
-        fd.Close();
-        errno = EINVAL;
-        return {};
-    }
-    return fd;
-}
+/// Some whole lines, newlines included; the file's last line may lack it.
+struct Lines {
+    std::string_view text;
+    bool tooLong = false;  ///< the beginning of one line that is passed over
+};
 
-std::optional<QueueEvent> ParseEvent(const JsonReader &reader, std::string_view line) {
-    Json::Value record;
-    QueueEvent event;
-    if (!reader.Parse(line, record) || !RetrieveStringFromJsonObj(event.path, kPathKey, record) ||
-        !record.isMember(kEventKey) || !record[kEventKey].isConvertibleTo(Json::uintValue)) {
-        return std::nullopt;
-    }
-    event.type = record[kEventKey].asUInt();
-    if (event.type == kRenameEvent) {
-        RetrieveStringFromJsonObj(event.oldPath, kOldPathKey, record);
-    }
-    return event;
-}
-
-/// Cuts blocks into lines; a line may lie across blocks.
-class LineCutter {
+/// Reads a queue file in blocks and cuts them between lines.
+class BlockReader {
 public:
-    explicit LineCutter(const QueueVisitor &visit) : visit_(visit) {}
-
-    /// False when the visitor has seen enough.
-    bool Feed(std::string_view block) {
-        while (!block.empty()) {
-            const std::size_t end = block.find('\n');
-            if (end == std::string_view::npos) {
-                Keep(block);
-                return true;
-            }
-            Keep(block.substr(0, end));
-            if (!EndLine()) {
-                return false;
-            }
-            block.remove_prefix(end + 1);
+    /// False with the reason in `errno`.
+    bool Open(const std::string &path, struct stat &status) {
+        fd_ = UniqueFd(open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
+        if (!fd_ || fstat(fd_.Get(), &status) != 0) {
+            return false;
         }
+        if (!S_ISREG(status.st_mode)) {
+            errno = EINVAL;
+            return false;
+        }
+        buffer_.resize(kBlockSize + OrdinaryReader::kPadding);
         return true;
     }
 
-    /// The last line may lack its newline.
-    void Finish() {
-        if (!line_.empty() || too_long_) {
-            EndLine();
+    void StartAt(off_t offset) { read_ = behind_whole_ = offset; }
+
+    /// Where in the file the first line begins that has not been delivered whole.
+    off_t BehindWholeLines() const { return behind_whole_; }
+
+    bool Next(Lines &lines) {
+        DropDelivered();
+        for (;;) {
+            const std::size_t end = EndOfLastLine();
+            if (end > 0 && skipping_) {
+                SkipToNewline();
+                continue;
+            }
+            if (end > 0) {
+                return Deliver(lines, end);
+            }
+            if (!skipping_ && filled_ > kMaxLine) {
+                skipping_ = true;
+                lines = {{buffer_.data(), kShownOfLongLine}, true};
+                return true;
+            }
+            if (skipping_) {
+                filled_ = 0;
+            }
+            if (!Fill()) {
+                break;
+            }
         }
+        lines = {{buffer_.data(), filled_}, false};
+        delivered_ = filled_;
+        return filled_ > 0;
     }
 
 private:
-    void Keep(std::string_view part) {
-        if (too_long_) {
-            return;
-        }
-        if (line_.size() + part.size() > kMaxLine) {
-            too_long_ = true;
-            line_.append(part.substr(0, kShownOfLongLine));
-            line_.resize(kShownOfLongLine);
-            line_.shrink_to_fit();
-            return;
-        }
-        line_.append(part);
+    std::size_t EndOfLastLine() const {
+        const void *newline = memrchr(buffer_.data(), '\n', filled_);
+        return newline == nullptr
+                   ? 0
+                   : static_cast<std::size_t>(static_cast<const char *>(newline) - buffer_.data()) + 1;
     }
 
-    bool EndLine() {
-        const std::optional<QueueEvent> event = too_long_ ? std::nullopt : ParseEvent(reader_, line_);
-        const bool goOn = visit_(line_, event ? &*event : nullptr);
-        line_.clear();
-        too_long_ = false;
-        return goOn;
+    bool Deliver(Lines &lines, std::size_t size) {
+        lines = {{buffer_.data(), size}, false};
+        delivered_ = size;
+        behind_whole_ = read_ - static_cast<off_t>(filled_ - size);
+        return true;
     }
 
-    const QueueVisitor &visit_;
-    JsonReader reader_;
-    std::string line_;
-    bool too_long_ = false;
+    void DropDelivered() { Drop(std::exchange(delivered_, 0)); }
+
+    void Drop(std::size_t size) {
+        std::memmove(buffer_.data(), buffer_.data() + size, filled_ - size);
+        filled_ -= size;
+    }
+
+    void SkipToNewline() {
+        const void *newline = std::memchr(buffer_.data(), '\n', filled_);
+        Drop(static_cast<std::size_t>(static_cast<const char *>(newline) - buffer_.data()) + 1);
+        behind_whole_ = read_ - static_cast<off_t>(filled_);
+        skipping_ = false;
+    }
+
+    /// False at the end of the file; a read error ends it too.
+    bool Fill() {
+        if (filled_ + OrdinaryReader::kPadding == buffer_.size()) {
+            // A line longer than the block, and shorter than the longest allowed: grown for, never kept.
+            buffer_.resize(std::min(filled_ * 2, kMaxLine + kBlockSize) + OrdinaryReader::kPadding);
+        }
+        const std::size_t room = buffer_.size() - OrdinaryReader::kPadding - filled_;
+        ssize_t count = 0;
+        do {
+            count = pread(fd_.Get(), buffer_.data() + filled_, room, read_);
+        } while (count < 0 && errno == EINTR);
+        if (count <= 0) {
+            return false;
+        }
+        filled_ += static_cast<std::size_t>(count);
+        read_ += count;
+        return true;
+    }
+
+    UniqueFd fd_;
+    std::vector<char> buffer_;
+    std::size_t filled_ = 0;
+    std::size_t delivered_ = 0;
+    off_t read_ = 0;
+    off_t behind_whole_ = 0;
+    bool skipping_ = false;
 };
+
+/// Tells what one line says: the fast reader where it is sure, the exact one otherwise.
+class LineReader {
+public:
+    /// Null when the line is malformed. Readable bytes have to follow the line (OrdinaryReader::kPadding).
+    const QueueEvent *Read(std::string_view line, bool whole) {
+        if (line.size() > kMaxLine) {
+            return nullptr;
+        }
+        OrdinaryEvent event;
+        if (ordinary_.ReadEvent(line, event)) {
+            event_ = {event.type, event.path, event.oldPath};
+        } else if (!ReadExactly(line)) {
+            return nullptr;
+        }
+        if (event_.type != kRenameEvent) {
+            event_.oldPath = {};
+        }
+        event_.whole = whole;
+        return &event_;
+    }
+
+private:
+    bool ReadExactly(std::string_view line) {
+        if (!exact_) {
+            exact_.emplace();
+        }
+        Json::Value record;
+        path_.clear();
+        old_path_.clear();
+        if (!exact_->Parse(line, record) || !RetrieveStringFromJsonObj(path_, kPathKey, record) ||
+            !record.isMember(kEventKey) || !record[kEventKey].isConvertibleTo(Json::uintValue)) {
+            return false;
+        }
+        RetrieveStringFromJsonObj(old_path_, kOldPathKey, record);
+        event_ = {record[kEventKey].asUInt(), path_, old_path_};
+        return true;
+    }
+
+    OrdinaryReader ordinary_;
+    std::optional<JsonReader> exact_;
+    std::string path_;
+    std::string old_path_;
+    QueueEvent event_;
+};
+
+/// Takes the first line off `text`, without its newline.
+std::string_view TakeLine(std::string_view &text) {
+    const std::size_t end = std::min(text.find('\n'), text.size());
+    const std::string_view line = text.substr(0, end);
+    text.remove_prefix(std::min(end + 1, text.size()));
+    return line;
+}
+
+bool Contains(std::string_view text, std::string_view part) {
+    return memmem(text.data(), text.size(), part.data(), part.size()) != nullptr;
+}
+
+/// Visits the lines that `wanted` lets pass. False when the visitor has seen enough.
+template <typename Wanted>
+bool Visit(const Lines &lines, LineReader &reader, const QueueVisitor &visit, Wanted wanted) {
+    if (lines.tooLong) {
+        return visit(lines.text, nullptr);
+    }
+    for (std::string_view rest = lines.text; !rest.empty();) {
+        const std::string_view line = TakeLine(rest);
+        const bool whole = line.data() + line.size() < lines.text.data() + lines.text.size();
+        if (wanted(line) && !visit(line, reader.Read(line, whole))) {
+            return false;
+        }
+    }
+    return true;
+}
+
+constexpr auto kEveryLine = [](std::string_view) { return true; };
 
 }  // namespace
 
 bool ScanQueue(const std::string &queueFile, const QueueVisitor &visit) {
-    const UniqueFd fd = OpenRegular(queueFile);
-    if (!fd) {
+    BlockReader blocks;
+    struct stat status = {};
+    if (!blocks.Open(queueFile, status)) {
         return false;
     }
-    LineCutter lines(visit);
-    std::vector<char> block(kBlockSize);
-    for (;;) {
-        const ssize_t count = read(fd.Get(), block.data(), block.size());
-        if (count < 0 && errno == EINTR) {
-            continue;
-        }
-        if (count <= 0) {
-            lines.Finish();
-            return true;
-        }
-        if (!lines.Feed({block.data(), static_cast<std::size_t>(count)})) {
-            return true;
+    LineReader reader;
+    Lines lines;
+    while (blocks.Next(lines) && Visit(lines, reader, visit, kEveryLine)) {
+    }
+    return true;
+}
+
+bool ScanQueueFrom(const std::string &queueFile, QueuePosition &position, const std::function<void()> &restarted,
+                   const QueueVisitor &visit) {
+    BlockReader blocks;
+    struct stat status = {};
+    if (!blocks.Open(queueFile, status)) {
+        return false;
+    }
+    if (status.st_dev != position.device || status.st_ino != position.inode || status.st_size < position.offset) {
+        position = {status.st_dev, status.st_ino, 0};
+        restarted();
+    }
+    blocks.StartAt(position.offset);
+    LineReader reader;
+    Lines lines;
+    while (blocks.Next(lines) && Visit(lines, reader, visit, kEveryLine)) {
+    }
+    position.offset = blocks.BehindWholeLines();
+    return true;
+}
+
+bool FindInQueue(const std::string &queueFile, unsigned type, const std::string &path, bool &found) {
+    found = false;
+    BlockReader blocks;
+    struct stat status = {};
+    if (!blocks.Open(queueFile, status)) {
+        return false;
+    }
+    const QueueVisitor visit = [&](std::string_view, const QueueEvent *event) {
+        found = event != nullptr && event->type == type && event->path == path;
+        return !found;
+    };
+    // A string without escapes stands in the text as it is: a line that holds neither a backslash nor the path
+    // cannot name it, and need not be read.
+    const auto mayName = [&](std::string_view text) {
+        return std::memchr(text.data(), '\\', text.size()) != nullptr || Contains(text, path);
+    };
+    LineReader reader;
+    Lines lines;
+    while (blocks.Next(lines)) {
+        if (!lines.tooLong && mayName(lines.text) && !Visit(lines, reader, visit, mayName)) {
+            break;
         }
     }
+    return true;
 }
 
 }  // namespace VORK::FILEINDEX::internal

@@ -2,8 +2,12 @@
 /// The lines of a share's event queue file, for everyone who reads one.
 ///
 /// The daemon consumes and other processes append while we read: a scan sees what is there when it gets to it.
+/// Lines are separated by "\n"; a last one without it counts. No lock is taken, and no more than a block, or one
+/// line if that is longer, is held in memory.
 #ifndef FILEINDEX_SRC_UTILS_QUEUE_FILE_H
 #define FILEINDEX_SRC_UTILS_QUEUE_FILE_H
+
+#include <sys/types.h>
 
 #include <functional>
 #include <string>
@@ -11,20 +15,41 @@
 
 namespace VORK::FILEINDEX::internal {
 
-/// A well-formed line: an object with "event", convertible to unsigned, and "path", a string.
+/// A well-formed line: an object with "event", convertible to unsigned, and "path", a string. The views live until
+/// the next line.
 struct QueueEvent {
     unsigned type = 0;
-    std::string path;
-    std::string oldPath;  ///< "path_old" of a rename event; empty when absent or not a string
+    std::string_view path;
+    std::string_view oldPath;  ///< "path_old" of a rename event; empty when absent or not a string
+    bool whole = true;         ///< false for a last line without its newline, which may yet grow
 };
 
 /// Gets each line without its newline (of one beyond 1 MiB only the beginning), and its event or null when it is
 /// malformed. False ends the scan.
 using QueueVisitor = std::function<bool(std::string_view line, const QueueEvent *event)>;
 
-/// Visits the lines in order; a last one without a newline counts. False when the file cannot be opened as a
-/// regular file, with the reason in `errno`. Takes no lock and holds at most one line in memory.
+/// Visits all lines in order. False when the file cannot be opened as a regular file, with the reason in `errno`.
 bool ScanQueue(const std::string &queueFile, const QueueVisitor &visit);
+
+/// Where a scan of the same file can go on later.
+struct QueuePosition {
+    dev_t device = 0;
+    ino_t inode = 0;
+    off_t offset = 0;  ///< behind the last whole line
+};
+
+/// Visits the well-formed lines of exactly that type, from `position` on: from the start when the file at the path
+/// is another one by now or has become shorter. Moves `position` behind the last whole line; a line without its
+/// newline is visited now and again later. Result as ScanQueue.
+///
+/// `restarted` is called before the first line when the scan begins at the start.
+bool ScanQueueFrom(const std::string &queueFile, QueuePosition &position, const std::function<void()> &restarted,
+                   const QueueVisitor &visit);
+
+/// Is there a well-formed line of exactly that type and path? Result as ScanQueue; `found` is false when that is.
+///
+/// Several times faster than a scan that looks at every line.
+bool FindInQueue(const std::string &queueFile, unsigned type, const std::string &path, bool &found);
 
 }  // namespace VORK::FILEINDEX::internal
 

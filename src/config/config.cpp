@@ -1,4 +1,5 @@
-#include "json/file.h"
+#include "config/load_save.h"
+#include "json/text.h"
 #include "names.h"
 
 #include <fileindex/config.h>
@@ -6,7 +7,6 @@
 
 #include <fcntl.h>
 #include <sys/file.h>
-#include <sys/stat.h>
 #include <syslog.h>
 #include <unistd.h>
 
@@ -21,18 +21,6 @@ using internal::kConfigModule;
 namespace {
 
 constexpr int kLockAttempts = 3;
-
-enum class Presence { kMissing, kPresent, kUnknown };
-
-/// Only a path that certainly has no regular file counts as missing: a file that cannot be looked at is there
-/// all the same, and treating it as missing would let the next save erase it.
-Presence PresenceOf(const std::string &path) {
-    struct stat status = {};
-    if (lstat(path.c_str(), &status) == 0) {
-        return S_ISREG(status.st_mode) ? Presence::kPresent : Presence::kMissing;
-    }
-    return errno == ENOENT || errno == ENOTDIR ? Presence::kMissing : Presence::kUnknown;
-}
 
 }  // namespace
 
@@ -74,30 +62,12 @@ void Config::Unlock() {
 }
 
 bool Config::LoadJson() {
-    const std::string path = GetPath();
-    const Presence presence = PresenceOf(path);
-    if (presence == Presence::kMissing) {
-        return true;
-    }
-    if (presence == Presence::kPresent && internal::FromFile(path, document_)) {
-        return true;
-    }
-    syslog(LOG_ERR, "%s:%d Failed to load json from %s", kConfigModule, __LINE__, path.c_str());
-    ErrorHandler::SetError(FILEINDEX_ERR_LOAD_JSON);
-    return false;
+    return internal::LoadConfig(
+        GetPath(), [this](const std::string &text) { return internal::JsonReader().Parse(text, document_); });
 }
 
 bool Config::SaveJson() {
-    const std::string path = GetPath();
-    if (!internal::ToFile(path, document_)) {
-        syslog(LOG_ERR, "%s:%d Failed to save json to %s", kConfigModule, __LINE__, path.c_str());
-        ErrorHandler::SetError(FILEINDEX_ERR_SAVE_JSON);
-        return false;
-    }
-    if (chmod(path.c_str(), 0644) == -1) {
-        syslog(LOG_ERR, "%s:%d chmod failed, path=%s", kConfigModule, __LINE__, path.c_str());
-    }
-    return true;
+    return internal::SaveConfig(GetPath(), internal::ToString(document_) + '\n');
 }
 
 }  // namespace FILEINDEX

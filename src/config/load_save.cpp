@@ -1,0 +1,57 @@
+#include "config/load_save.h"
+
+#include "json/file.h"
+#include "names.h"
+
+#include <fileindex/error.h>
+
+#include <sys/stat.h>
+#include <syslog.h>
+
+#include <cerrno>
+
+namespace VORK::FILEINDEX::internal {
+
+namespace {
+
+enum class Presence { kMissing, kPresent, kUnknown };
+
+/// Only a path that certainly has no regular file counts as missing: a file that cannot be looked at is there
+/// all the same, and treating it as missing would let the next save erase it.
+Presence PresenceOf(const std::string &path) {
+    struct stat status = {};
+    if (lstat(path.c_str(), &status) == 0) {
+        return S_ISREG(status.st_mode) ? Presence::kPresent : Presence::kMissing;
+    }
+    return errno == ENOENT || errno == ENOTDIR ? Presence::kMissing : Presence::kUnknown;
+}
+
+}  // namespace
+
+bool LoadConfig(const std::string &path, const TextParser &parse) {
+    const Presence presence = PresenceOf(path);
+    if (presence == Presence::kMissing) {
+        return true;
+    }
+    std::string text;
+    if (presence == Presence::kPresent && ReadFile(path, text) && parse(text)) {
+        return true;
+    }
+    syslog(LOG_ERR, "%s:%d Failed to load json from %s", kConfigModule, __LINE__, path.c_str());
+    ErrorHandler::SetError(FILEINDEX_ERR_LOAD_JSON);
+    return false;
+}
+
+bool SaveConfig(const std::string &path, const std::string &text) {
+    if (!WriteFile(path, text)) {
+        syslog(LOG_ERR, "%s:%d Failed to save json to %s", kConfigModule, __LINE__, path.c_str());
+        ErrorHandler::SetError(FILEINDEX_ERR_SAVE_JSON);
+        return false;
+    }
+    if (chmod(path.c_str(), 0644) == -1) {
+        syslog(LOG_ERR, "%s:%d chmod failed, path=%s", kConfigModule, __LINE__, path.c_str());
+    }
+    return true;
+}
+
+}  // namespace VORK::FILEINDEX::internal

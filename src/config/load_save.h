@@ -1,0 +1,22 @@
+/// \file
+/// Loading and saving a configuration file, with the records and codes of every failure.
+#ifndef FILEINDEX_SRC_CONFIG_LOAD_SAVE_H
+#define FILEINDEX_SRC_CONFIG_LOAD_SAVE_H
+
+#include <functional>
+#include <string>
+
+namespace VORK::FILEINDEX::internal {
+
+/// Gets the file's text, which it may change, and tells whether it is JSON.
+using TextParser = std::function<bool(std::string &text)>;
+
+/// True also when there is no file; then `parse` is not called. Otherwise one record and FILEINDEX_ERR_LOAD_JSON.
+bool LoadConfig(const std::string &path, const TextParser &parse);
+
+/// Writes the JSON text, mode 0644. On failure one record and FILEINDEX_ERR_SAVE_JSON; the old file stands.
+bool SaveConfig(const std::string &path, const std::string &text);
+
+}  // namespace VORK::FILEINDEX::internal
+
+#endif

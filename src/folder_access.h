@@ -1,0 +1,29 @@
+/// \file
+/// What the library's own code may do with a Folder beyond its interface.
+#ifndef FILEINDEX_SRC_FOLDER_ACCESS_H
+#define FILEINDEX_SRC_FOLDER_ACCESS_H
+
+#include <fileindex/folder.h>
+#include <fileindex/paths.h>
+
+#include <string>
+
+namespace VORK::FILEINDEX::internal {
+
+/// In the order of kMediaKeys.
+inline constexpr bool Folder::*kMediaFlags[] = {&Folder::document, &Folder::audio, &Folder::video, &Folder::photo};
+
+struct FolderAccess {
+    /// The full path as found when the path was set, without asking again; empty when it could not be resolved.
+    static const std::string &StoredFullPath(const Folder &folder) { return folder.full_path_; }
+
+    /// Finds the full path anew. One of another path is worse than none, so the former is forgotten first.
+    static bool Resolve(Folder &folder) {
+        folder.full_path_.clear();
+        return GetFullPath(folder.full_path_, folder.path);
+    }
+};
+
+}  // namespace VORK::FILEINDEX::internal
+
+#endif

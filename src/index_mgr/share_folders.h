@@ -1,0 +1,30 @@
+/// \file
+/// The folders of one share, for the operations that change or clean shares.
+#ifndef FILEINDEX_SRC_INDEX_MGR_SHARE_FOLDERS_H
+#define FILEINDEX_SRC_INDEX_MGR_SHARE_FOLDERS_H
+
+#include <fileindex/folders.h>
+#include <fileindex/paths.h>
+
+#include <string>
+#include <vector>
+
+namespace VORK::FILEINDEX::internal {
+
+/// As Folders::List by share, but an empty name means the records whose own share name is empty, never all.
+inline bool FoldersOf(Folders &store, const std::string &share, std::vector<Folder> &folders) {
+    if (!store.List(folders, share)) {
+        return false;
+    }
+    if (share.empty()) {
+        std::erase_if(folders, [](const Folder &folder) {
+            std::string owner;
+            return !GetShareNameByPath(owner, folder.path) || !owner.empty();
+        });
+    }
+    return true;
+}
+
+}  // namespace VORK::FILEINDEX::internal
+
+#endif

@@ -1,0 +1,158 @@
+#include "json/ordinary.h"
+
+#include "names.h"
+
+#include <simdjson.h>
+
+#include <cstdint>
+#include <iterator>
+#include <limits>
+
+namespace VORK::FILEINDEX::internal {
+
+namespace {
+
+using simdjson::dom::element;
+using simdjson::dom::element_type;
+using simdjson::dom::object;
+
+constexpr std::size_t kMaxDepth = 16;  // far below the exact reader's limit
+
+/// The two readers may differ about \u escapes of surrogates. One search settles it for most texts.
+bool HasUnicodeEscape(std::string_view text) {
+    return text.find('\\') != std::string_view::npos && text.find("\\u") != std::string_view::npos;
+}
+
+/// Free of reals: their range is where the two readers may differ.
+bool IsPlain(const element &value) {
+    switch (value.type()) {
+        case element_type::DOUBLE:
+            return false;
+        case element_type::ARRAY:
+            for (const element child : simdjson::dom::array(value.get_array().value_unsafe())) {
+                if (!IsPlain(child)) {
+                    return false;
+                }
+            }
+            return true;
+        case element_type::OBJECT:
+            for (const auto member : object(value.get_object().value_unsafe())) {
+                if (!IsPlain(member.value)) {
+                    return false;
+                }
+            }
+            return true;
+        default:
+            return true;
+    }
+}
+
+int MediaKindOf(std::string_view key) {
+    for (std::size_t kind = 0; kind < std::size(kMediaKeys); ++kind) {
+        if (key == kMediaKeys[kind]) {
+            return static_cast<int>(kind);
+        }
+    }
+    return -1;
+}
+
+/// False when a member that counts is repeated or any member is a real, an array or an object.
+bool ReadRecord(const object &members, FolderRecord &record) {
+    bool nameSeen = false;
+    bool flagSeen[std::size(kMediaKeys)] = {};
+    for (const auto member : members) {
+        const element_type type = member.value.type();
+        if (type == element_type::DOUBLE || type == element_type::ARRAY || type == element_type::OBJECT) {
+            return false;
+        }
+        const int kind = MediaKindOf(member.key);
+        bool *const seen = kind >= 0 ? &flagSeen[kind] : member.key == kNameKey ? &nameSeen : nullptr;
+        if (seen == nullptr) {
+            continue;
+        }
+        if (*seen) {
+            return false;
+        }
+        *seen = true;
+        if (kind >= 0) {
+            record.hasFlag[kind] = member.value.get_bool().get(record.flag[kind]) == simdjson::SUCCESS;
+        } else {
+            record.hasName = member.value.get_string().get(record.name) == simdjson::SUCCESS;
+        }
+    }
+    return true;
+}
+
+}  // namespace
+
+struct OrdinaryReader::Parser {
+    simdjson::dom::parser parser;
+
+    /// The text's top-level object; it is kept in the parser until the next text.
+    bool Parse(std::string_view text, object &root) {
+        if (text.empty() || HasUnicodeEscape(text)) {
+            return false;
+        }
+        if (text.size() > parser.capacity() && parser.allocate(text.size(), kMaxDepth) != simdjson::SUCCESS) {
+            return false;
+        }
+        return parser.parse(text.data(), text.size(), false).get_object().get(root) == simdjson::SUCCESS;
+    }
+};
+
+OrdinaryReader::OrdinaryReader() : parser_(std::make_unique<Parser>()) {}
+
+OrdinaryReader::~OrdinaryReader() = default;
+
+bool OrdinaryReader::ReadEvent(std::string_view line, OrdinaryEvent &event) {
+    object root;
+    if (!parser_->Parse(line, root)) {
+        return false;
+    }
+    std::uint64_t type = 0;
+    int types = 0;
+    int paths = 0;
+    int oldPaths = 0;
+    event.oldPath = {};
+    for (const auto member : root) {
+        if (member.key == kEventKey) {
+            ++types;
+            if (member.value.get_uint64().get(type) != simdjson::SUCCESS) {
+                return false;
+            }
+        } else if (member.key == kPathKey) {
+            ++paths;
+            if (member.value.get_string().get(event.path) != simdjson::SUCCESS) {
+                return false;
+            }
+        } else if (member.key == kOldPathKey && member.value.is_string()) {
+            ++oldPaths;
+            event.oldPath = member.value.get_string().value_unsafe();
+        } else if (member.key == kOldPathKey || !IsPlain(member.value)) {
+            return false;
+        }
+    }
+    event.type = static_cast<unsigned>(type);
+    return types == 1 && paths == 1 && oldPaths <= 1 && type <= std::numeric_limits<unsigned>::max();
+}
+
+bool OrdinaryReader::ReadFolders(std::string_view text, std::vector<FolderRecord> &records) {
+    object root;
+    if (!parser_->Parse(text, root)) {
+        return false;
+    }
+    for (const auto member : root) {
+        object members;
+        FolderRecord record;
+        record.path = member.key;
+        const bool sorted = records.empty() || records.back().path < record.path;
+        if (!sorted || member.value.get_object().get(members) != simdjson::SUCCESS ||
+            !ReadRecord(members, record)) {
+            return false;
+        }
+        records.push_back(record);
+    }
+    return true;
+}
+
+}  // namespace VORK::FILEINDEX::internal
