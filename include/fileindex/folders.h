@@ -20,7 +20,8 @@ namespace VORK {
 namespace FILEINDEX {
 
 /// Folders keyed by share path, in byte order. Keys match exactly: "/Music", "/music" and "/music/" are three
-/// folders. Not locked by itself: Lock(true) before a change, Unlock after it.
+/// folders. Not locked by itself: Lock(true) before a change, Unlock after it. The folders live in a map of their
+/// own; the document of Config is not kept in step with it.
 class FILEINDEX_API Folders : public Config {
 public:
     Folders();

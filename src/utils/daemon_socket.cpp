@@ -51,13 +51,13 @@ private:
     std::string buffer_;
 };
 
+using Clock = std::chrono::steady_clock;
+
 /// Writes in chunks. A result of -1 counts like any other: the position moves back by a byte and one more is to
 /// be written. The daemon has always been spoken to like this, and frames that it resynchronises on must not
-/// change. The step back may go down to `floor`; beyond it the frame is given up, which ends the loop within
-/// milliseconds when the peer is gone. A peer that is there and does not read costs a timeout for each step, so
-/// the whole is bounded as well.
-bool WriteAll(int fd, std::size_t size, const char *buffer, const char *floor) {
-    const auto deadline = std::chrono::steady_clock::now() + kWholeSendLimit;
+/// change. The step back may go down to `floor`; beyond it the frame is given up, which soon ends the loop when the
+/// peer is gone. A peer that is there and does not read costs a timeout for each step, hence the deadline.
+bool WriteAll(int fd, std::size_t size, const char *buffer, const char *floor, Clock::time_point deadline) {
     const char *position = buffer;
     std::size_t remaining = size;
     int retries = kEmptyWriteRetries;
@@ -70,7 +70,7 @@ bool WriteAll(int fd, std::size_t size, const char *buffer, const char *floor) {
             --retries;
             continue;
         }
-        if (count < 0 && (position == floor || std::chrono::steady_clock::now() >= deadline)) {
+        if (count < 0 && (position == floor || (errno == EAGAIN && Clock::now() >= deadline))) {
             return false;
         }
         remaining -= static_cast<std::size_t>(count);
@@ -109,8 +109,9 @@ bool SendCammandToDaemon(const std::string &command, const Json::Value &data) {
         message["type"] = command;
         message[kDataKey] = data;
         const Frame frame(ToString(message));
-        return WriteAll(fd.Get(), Frame::kLengthSize, frame.Length(), frame.Floor()) &&
-               WriteAll(fd.Get(), frame.BodySize(), frame.Body(), frame.Floor());
+        const Clock::time_point deadline = Clock::now() + kWholeSendLimit;
+        return WriteAll(fd.Get(), Frame::kLengthSize, frame.Length(), frame.Floor(), deadline) &&
+               WriteAll(fd.Get(), frame.BodySize(), frame.Body(), frame.Floor(), deadline);
     });
 }
 
