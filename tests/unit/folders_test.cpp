@@ -132,6 +132,30 @@ TEST_F(FoldersStore, KeepsNamesByteForByte) {
     EXPECT_EQ(conf, FolderConf());
 }
 
+TEST_F(FoldersStore, KeepsEscapedNames) {
+    const std::string name = R"(\u00e4\ud83d\ude00 \u0000\u0001\u001f\u007f \"\\\/\b\f\n\r\t)";
+    GivenFolderConf("{" + FolderRecord("/photo/a", name, "") + "," + FolderRecord("/photo/" + name, "", "") + "}");
+    const std::string conf = FolderConf();
+    Folders store;
+    ASSERT_TRUE(store.Load());
+    ASSERT_TRUE(store.Save());
+    EXPECT_EQ(conf, FolderConf());
+}
+
+TEST_F(FoldersStore, HoldsTheDocumentForItsSubclasses) {
+    class Document : public Folders {
+    public:
+        [[nodiscard]] std::string Text() const { return Print(document_); }
+    };
+    GivenFolderConf(R"({"/photo/a":{"audio":true,"later":1}})");
+    Document store;
+    EXPECT_EQ("{}", store.Text());
+    ASSERT_TRUE(store.Load());
+    EXPECT_EQ(R"({"/photo/a":{"audio":true,"later":1}})", store.Text());
+    ASSERT_TRUE(store.Save());
+    EXPECT_EQ("{" + FolderRecord("/photo/a", "", "a") + "}", store.Text());
+}
+
 TEST_F(FoldersStore, RefusesADocumentThatIsNoObject) {
     for (const char *text : {"[]", R"("text")", "5", "null", "true"}) {
         Forget();
