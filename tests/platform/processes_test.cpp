@@ -1,0 +1,156 @@
+// Child processes, errors and metadata directories.
+#include "support.h"
+
+#include <vork/metadata.h>
+#include <vork/process.h>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+
+#include <csignal>
+#include <thread>
+
+using platform_test::Fork;
+using platform_test::ReadText;
+using platform_test::WaitFor;
+using platform_test::WriteFile;
+
+namespace {
+
+int Sh(const char *script) {
+    return VLIBCExec("/bin/sh", "-c", script, nullptr, nullptr);
+}
+
+int Exec(const char *program) {
+    return VLIBCExec(program, nullptr, nullptr, nullptr, nullptr);
+}
+
+TEST(ProcessesTest, GiveTheirExitStatus) {
+    EXPECT_EQ(Sh("exit 0"), 0);
+    EXPECT_EQ(Sh("exit 3"), 3);
+    EXPECT_EQ(Sh("exit 255"), 255);
+    EXPECT_EQ(VLIBCExec("/bin/sh", "-c", "test \"$1\" = 'two words' -a $# = 1", "sh", "two words"), 0);
+}
+
+TEST(ProcessesTest, TellFailureFromAnExitStatus) {
+    const char *const none[] = {nullptr};
+    const char *const argv[] = {"true", nullptr};
+    WriteFile("/tmp/not-executable", "text");
+    const struct {
+        const char *name;
+        int code;
+        std::function<int()> run;
+    } rows[] = {
+        {"killed", VORK_ERR_EXEC, [] { return Sh("kill -9 $$"); }},
+        {"missing", VORK_ERR_EXEC, [] { return Exec("/bin/no-such-program"); }},
+        {"not executable", VORK_ERR_EXEC, [] { return Exec("/tmp/not-executable"); }},
+        {"relative", VORK_ERR_BAD_PARAMETER, [] { return Exec("true"); }},
+        {"null", VORK_ERR_BAD_PARAMETER, [] { return Exec(nullptr); }},
+        {"no vector", VORK_ERR_BAD_PARAMETER, [] { return VLIBCExecv("/bin/true", nullptr, 0, 0); }},
+        {"empty vector", VORK_ERR_BAD_PARAMETER, [&] { return VLIBCExecv("/bin/true", none, 0, 0); }},
+        {"reserved argument", VORK_ERR_BAD_PARAMETER, [&] { return VLIBCExecv("/bin/true", argv, 0, 1); }},
+    };
+    for (const auto &row : rows) {
+        VLIBCErrSetEx(0, "", 0);
+        EXPECT_LT(row.run(), 0) << row.name;
+        EXPECT_EQ(VLIBCErrGet(), row.code) << row.name;
+    }
+}
+
+TEST(ProcessesTest, StartCleanWhateverTheHostDoes) {
+    const int leaking = open("/dev/null", O_RDONLY);
+    ASSERT_GE(leaking, 3);
+    sigset_t blocked;
+    sigfillset(&blocked);
+    sigset_t former;
+    sigprocmask(SIG_BLOCK, &blocked, &former);
+    const auto formerPipe = std::signal(SIGPIPE, SIG_IGN);
+    const auto formerUsr1 = std::signal(SIGUSR1, SIG_IGN);
+    // Two signals of the C library's own, 32 and 33, are its business.
+    EXPECT_EQ(Sh("exec >/tmp/child; ls /proc/self/fd | wc -l; readlink /proc/self/fd/0;"
+                 "sed -nE 's/^Sig(Blk|Ign):\t0*(18000000)?/\\1 /p' /proc/self/status"),
+              0);
+    std::signal(SIGPIPE, formerPipe);
+    std::signal(SIGUSR1, formerUsr1);
+    sigprocmask(SIG_SETMASK, &former, nullptr);
+    close(leaking);
+    // The fourth descriptor is that of "ls" on the directory.
+    EXPECT_EQ(ReadText("/tmp/child"), "4\n/dev/null\nBlk \nIgn 0\n");
+}
+
+TEST(ProcessesTest, SucceedInAHostThatIgnoresItsChildren) {
+    std::signal(SIGCHLD, SIG_IGN);
+    EXPECT_EQ(Sh("echo ran >/tmp/ignored"), 0);
+    std::signal(SIGCHLD, SIG_DFL);
+    EXPECT_EQ(ReadText("/tmp/ignored"), "ran\n") << "returned before the end";
+}
+
+TEST(ProcessesTest, KeepOutputOrDiscardIt) {
+    for (const int discard : {0, 1}) {
+        const pid_t child = Fork([discard] {
+            dup2(open("/tmp/output", O_WRONLY | O_CREAT | O_TRUNC, 0600), 1);
+            dup2(1, 2);
+            const char *const argv[] = {"sh", "-c", "echo out; echo err >&2", nullptr};
+            return VLIBCExecv("/bin/sh", argv, discard, 0);
+        });
+        EXPECT_EQ(WaitFor(child), 0);
+        EXPECT_EQ(ReadText("/tmp/output"), discard == 1 ? "" : "out\nerr\n");
+    }
+}
+
+TEST(ErrorsTest, BelongToTheThread) {
+    VLIBCErrSetEx(0x2900, "here.cpp", 7);
+    std::thread([] {
+        EXPECT_EQ(VLIBCErrGet(), 0);
+        EXPECT_STREQ(VLIBCErrorGetFile(), "");
+        EXPECT_EQ(VLIBCErrorGetLine(), 0);
+        VLIBCErrSetEx(1, nullptr, 2);
+        EXPECT_STREQ(VLIBCErrorGetFile(), "");
+    }).join();
+    EXPECT_EQ(VLIBCErrGet(), 0x2900);
+    EXPECT_STREQ(VLIBCErrorGetFile(), "here.cpp");
+    EXPECT_EQ(VLIBCErrorGetLine(), 7);
+}
+
+TEST(ErrorsTest, NameThePlaceWithoutItsDirectory) {
+    VORKEAMKDir(0, nullptr);
+    EXPECT_STREQ(VLIBCErrorGetFile(), "metadata.cpp");
+    EXPECT_GT(VLIBCErrorGetLine(), 0);
+}
+
+TEST(MetadataTest, KnowsTheHiddenName) {
+    for (const char *name : {"@eaDir/", "@eadir", "@eaDirs", "", "/@eaDir"}) {
+        EXPECT_EQ(VORKEAIsHiddenDir(name), 0) << name;
+    }
+    EXPECT_EQ(VORKEAIsHiddenDir("@eaDir"), 1);
+    EXPECT_EQ(VORKEAIsHiddenDir(nullptr), 0);
+}
+
+TEST(MetadataTest, MakesDirectoriesAndNothingElseWillDo) {
+    std::filesystem::create_directories("/vol1/photo");
+    std::filesystem::create_directory_symlink("/vol1", "/vol1/link");
+    WriteFile("/vol1/file", "");
+    const struct {
+        const char *path;
+        int result, code;
+    } rows[] = {
+        {"/vol1/photo/@eaDir", 0, 0},
+        {"/vol1/photo/@eaDir", 0, 0},
+        {"/vol1/link", -1, VORK_ERR_EXISTS},
+        {"/vol1/file", -1, VORK_ERR_EXISTS},
+        {"/vol1/missing/@eaDir", -1, VORK_ERR_NOT_FOUND},
+        {"/vol1/file/@eaDir", -1, VORK_ERR_NOT_FOUND},
+        {"/proc/@eaDir", -1, VORK_ERR_NOT_FOUND},
+        {"relative", -1, VORK_ERR_BAD_PARAMETER},
+    };
+    for (const auto &row : rows) {
+        VLIBCErrSetEx(0, "", 0);
+        EXPECT_EQ(VORKEAMKDir(0, row.path), row.result) << row.path;
+        EXPECT_EQ(VLIBCErrGet(), row.code) << row.path;
+    }
+    struct stat status {};
+    ASSERT_EQ(stat("/vol1/photo/@eaDir", &status), 0);
+    EXPECT_EQ(status.st_mode & 0022U, 0U) << "users of the share could plant files here";
+}
+
+}  // namespace
