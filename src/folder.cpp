@@ -1,4 +1,5 @@
 #include "folder_access.h"
+#include "json/elements.h"
 #include "json/text.h"
 #include "names.h"
 
@@ -101,7 +102,7 @@ bool Folder::GetAdditional(Json::Value &out, const Json::Value &keys) const {
         ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);
         return false;
     }
-    for (const Json::Value &key : keys) {
+    for (const Json::Value &key : internal::Elements(keys)) {
         if (!key.isString()) {
             syslog(LOG_ERR, "%s:%d Bad param: %s", kFolderModule, __LINE__, ToString(key).c_str());
             ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);

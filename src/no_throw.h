@@ -3,17 +3,19 @@
 #ifndef FILEINDEX_SRC_NO_THROW_H
 #define FILEINDEX_SRC_NO_THROW_H
 
-#include <exception>
+#include <cxxabi.h>
 
 namespace VORK::FILEINDEX::internal {
 
 /// The operation's result, or `onException` (false, 0, empty by default) when the JSON library, an allocation
-/// or the platform throws.
+/// or the platform throws. The cancellation of a thread is no failure and goes on.
 template <typename Operation>
-auto NoThrow(Operation operation, decltype(operation()) onException = {}) noexcept -> decltype(operation()) {
+auto NoThrow(Operation operation, decltype(operation()) onException = {}) -> decltype(operation()) {
     try {
         return operation();
-    } catch (const std::exception &) {
+    } catch (const abi::__forced_unwind &) {
+        throw;
+    } catch (...) {
         return onException;
     }
 }

@@ -2,8 +2,9 @@
 /// The last error code and the log level, both process-wide.
 ///
 /// Neither is per thread and neither is guarded: concurrent failures overwrite each other, and the last wins.
-/// Every failure also writes one record to the system log (`syslog`, LOG_ERR, "file:line message"); the
-/// library never calls `openlog`, so identity and facility are the host's.
+/// Most failures also write a record to the system log (`syslog`, LOG_ERR, "file:line message"), and each layer
+/// that fails because of it adds its own; the library never calls `openlog`, so identity and facility are the
+/// host's.
 #ifndef FILEINDEX_ERROR_H
 #define FILEINDEX_ERROR_H
 

@@ -50,8 +50,8 @@ public:
 
     /// One page as JSON: {"total": all folders, "offset": as given, "folder": [records with "additional"]}.
     ///
-    /// @param sort_by         "name" (any case alike), "document", "audio", "video", "photo" (false first);
-    ///                        anything else sorts by path, any case alike
+    /// @param sort_by         "name", "document", "audio", "video", "photo" (false first); anything else
+    ///                        sorts by path. Names and paths are compared without regard to letter case
     /// @param sort_direction  exactly "DESC" gives the first min(total - offset, limit) of the ascending
     ///                        order, reversed, without regard to the offset; anything else ascends
     /// @param additional      keys for Folder::GetAdditional; errors in them do not stop the listing

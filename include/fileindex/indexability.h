@@ -26,7 +26,8 @@ FILEINDEX_API bool IsSkipIndex(const std::string &fullPath);
 FILEINDEX_API bool CanPathBeIndexed(const std::string &sharePath);
 
 /// The same for a full path, which must be free of links, "." and ".." components, doubled and trailing "/".
-/// A file system of unknown type is refused.
+/// A file system of unknown type is refused. A path outside every share, an unknown share, a mount point and a
+/// path that is not real each write a record; the first also sets FILEINDEX_ERR_PATH.
 FILEINDEX_API bool CanFullPathBeIndexed(const std::string &fullPath);
 
 /// Is the share neither excluded by name, nor locked by encryption, nor read-only? A null share is not
@@ -34,7 +35,7 @@ FILEINDEX_API bool CanFullPathBeIndexed(const std::string &fullPath);
 FILEINDEX_API bool CanShareBeIndexed(struct _tag_VORKSHARE *share);
 
 /// Is there room for index data (10 MiB) on the share's volume? A check that fails for any reason but lack of
-/// space or quota counts as room.
+/// space or quota counts as room. An unknown share writes a record.
 FILEINDEX_API bool IsShareSpaceEnough(const std::string &shareName);
 
 }  // namespace FILEINDEX

@@ -32,7 +32,7 @@ public:
     bool Resume();
 
     /// The time given to Pause, -1 when there is none. False, with one record and `resumeTime` unchanged, when
-    /// the stored value is no number.
+    /// the stored value cannot be read as a number (null reads as 0).
     bool GetPauseInfo(long long &resumeTime);
 
     /// Marks or unmarks the share (its name) as out of space. The first mark notifies the administrators, once;

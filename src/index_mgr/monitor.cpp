@@ -1,8 +1,8 @@
 #include "json/text.h"
 #include "names.h"
 #include "no_throw.h"
+#include "utils/storage.h"
 
-#include <fileindex/fileidx.h>
 #include <fileindex/folders.h>
 #include <fileindex/index_mgr.h>
 #include <fileindex/paths.h>
@@ -48,7 +48,7 @@ bool WatchList(Json::Value &config, const std::vector<Folder> &folders) {
 bool IndexMgr::UpsertVorkNotifydCfg(const std::string &share) {
     return NoThrow([&] {
         char queuePath[kPathSize] = {};
-        if (FILEIDXQueuePathGet(share.c_str(), queuePath, sizeof(queuePath)) < 0) {
+        if (QueuePathOf(share, queuePath) < 0) {
             syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kIndexMgrModule, 286, share.c_str());
             return false;
         }
@@ -82,7 +82,7 @@ bool IndexMgr::UpsertVorkNotifydCfg(const std::string &share) {
 bool IndexMgr::DeleteVorkNotifydCfg(const std::string &share) {
     return NoThrow([&] {
         char queuePath[kPathSize] = {};
-        if (FILEIDXQueuePathGet(share.c_str(), queuePath, sizeof(queuePath)) < 0) {
+        if (QueuePathOf(share, queuePath) < 0) {
             syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kIndexMgrModule, 344, share.c_str());
             return false;
         }

@@ -1,3 +1,4 @@
+#include "json/elements.h"
 #include "json/text.h"
 #include "names.h"
 #include "no_throw.h"
@@ -28,7 +29,7 @@ bool Malformed(const Json::Value &what, int line) {
 
 /// Checks the whole request before anything is changed, and finds the shares that are out of space.
 bool Check(const Json::Value &paths, std::set<std::string> &outOfSpace) {
-    for (const Json::Value &element : paths) {
+    for (const Json::Value &element : Elements(paths)) {
         if (!element.isString()) {
             return Malformed(element, 377);
         }
@@ -51,7 +52,7 @@ bool Check(const Json::Value &paths, std::set<std::string> &outOfSpace) {
 std::vector<std::string> Strings(const Json::Value &array) {
     std::vector<std::string> strings;
     strings.reserve(array.size());
-    for (const Json::Value &element : array) {
+    for (const Json::Value &element : Elements(array)) {
         strings.push_back(element.asString());
     }
     return strings;
@@ -75,7 +76,7 @@ bool IndexMgr::Reindex(const Json::Value &jsArrPath) {
             }
         }
         PendingReindexes pending(Strings(jsArrPath));
-        for (const Json::Value &element : jsArrPath) {
+        for (const Json::Value &element : Elements(jsArrPath)) {
             const std::string path = element.asString();
             std::string fullPath;
             if (!GetFullPath(fullPath, path)) {

@@ -2,6 +2,7 @@
 #include "index_mgr/events.h"
 #include "index_mgr/share_folders.h"
 #include "index_mgr/stop_indexing.h"
+#include "json/elements.h"
 #include "json/text.h"
 #include "names.h"
 #include "no_throw.h"
@@ -34,7 +35,7 @@ bool BadParam(const Json::Value &what) {
 
 /// In memory: a batch that fails in the middle leaves folder.conf as it was.
 bool DeleteAll(Folders &store, const Json::Value &paths, Changes &changes) {
-    for (const Json::Value &element : paths) {
+    for (const Json::Value &element : Elements(paths)) {
         if (!element.isString()) {
             return BadParam(element);
         }
@@ -57,7 +58,7 @@ bool DeleteAll(Folders &store, const Json::Value &paths, Changes &changes) {
 
 bool SendCommands(const Json::Value &paths) {
     Json::Value command(Json::objectValue);
-    for (const Json::Value &path : paths) {
+    for (const Json::Value &path : Elements(paths)) {
         command[kFolderPathKey] = path.asString();
         if (!SendCammandToDaemon(kDeleteCommand, command)) {
             syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", kIndexMgrModule, 104);

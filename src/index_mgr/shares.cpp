@@ -3,6 +3,7 @@
 #include "names.h"
 #include "no_throw.h"
 #include "scoped.h"
+#include "utils/storage.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/fileidx.h>
@@ -122,7 +123,7 @@ bool IndexMgr::ShareResume(const std::string &share) {
 bool IndexMgr::CleanShareIndexData(const std::string &share) {
     return NoThrow([&] {
         char location[kPathSize] = {};
-        if (!IsOwnLocation(location, FILEIDXQueuePathGet(share.c_str(), location, sizeof(location)))) {
+        if (!IsOwnLocation(location, QueuePathOf(share, location))) {
             syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kIndexMgrModule, 653, share.c_str());
             return false;
         }

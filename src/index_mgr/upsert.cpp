@@ -1,5 +1,6 @@
 #include "index_mgr/changes.h"
 #include "index_mgr/events.h"
+#include "json/elements.h"
 #include "json/text.h"
 #include "names.h"
 #include "no_throw.h"
@@ -31,7 +32,7 @@ std::string PathOf(const Json::Value &element) {
 
 /// In memory: a batch that fails in the middle leaves folder.conf as it was.
 bool UpsertAll(Folders &store, const Json::Value &folders, Changes &changes) {
-    for (const Json::Value &element : folders) {
+    for (const Json::Value &element : Elements(folders)) {
         const std::string path = PathOf(element);
         Json::Value report;
         if (!store.Upsert(report, element)) {
@@ -61,7 +62,7 @@ bool RegisterMonitors(const std::set<std::string> &shares) {
 
 bool SendCommands(const Json::Value &folders) {
     Json::Value command(Json::objectValue);
-    for (const Json::Value &element : folders) {
+    for (const Json::Value &element : Elements(folders)) {
         command[kFolderPathKey] = PathOf(element);
         if (!SendCammandToDaemon(kUpsertCommand, command)) {
             syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", kIndexMgrModule, 621);

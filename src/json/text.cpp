@@ -1,5 +1,7 @@
 #include "json/text.h"
 
+#include "json/elements.h"
+
 #include <json/writer.h>
 
 #include <algorithm>
@@ -64,7 +66,7 @@ void Append(std::string &out, const Json::Value &value);
 
 void AppendArray(std::string &out, const Json::Value &array) {
     char separator = '[';
-    for (const Json::Value &element : array) {
+    for (const Json::Value &element : Elements(array)) {
         out += separator;
         Append(out, element);
         separator = ',';

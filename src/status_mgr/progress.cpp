@@ -2,8 +2,8 @@
 #include "names.h"
 #include "no_throw.h"
 #include "utils/queue_file.h"
+#include "utils/storage.h"
 
-#include <fileindex/fileidx.h>
 #include <fileindex/index_mgr.h>
 #include <fileindex/indexability.h>
 #include <fileindex/paths.h>
@@ -90,7 +90,7 @@ bool ServiceStatus(std::string &status) {
     }
     for (const std::string &share : shares) {
         char buffer[kPathSize] = {};
-        if (FILEIDXQueuePathGet(share.c_str(), buffer, sizeof(buffer)) < 0) {
+        if (QueuePathOf(share, buffer) < 0) {
             syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kStatusMgrModule, 146, share.c_str());
             return false;
         }
@@ -122,7 +122,7 @@ std::string FolderStatus(const std::string &path) {
         return kNoSpace;
     }
     char buffer[kPathSize] = {};
-    if (FILEIDXQueuePathGet(share.c_str(), buffer, sizeof(buffer)) < 0) {
+    if (QueuePathOf(share, buffer) < 0) {
         syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kStatusMgrModule, 100, share.c_str());
         return kFinished;
     }

@@ -55,8 +55,8 @@ using Clock = std::chrono::steady_clock;
 
 /// Writes in chunks. A result of -1 counts like any other: the position moves back by a byte and one more is to
 /// be written. The daemon has always been spoken to like this, and frames that it resynchronises on must not
-/// change. The step back may go down to `floor`; beyond it the frame is given up, which soon ends the loop when the
-/// peer is gone. A peer that is there and does not read costs a timeout for each step, hence the deadline.
+/// change. The step back may go down to `floor`; beyond it the frame is given up, which soon ends the loop when
+/// the peer is gone. A peer that is there and does not read costs a timeout for each step, hence the deadline.
 bool WriteAll(int fd, std::size_t size, const char *buffer, const char *floor, Clock::time_point deadline) {
     const char *position = buffer;
     std::size_t remaining = size;

@@ -4,6 +4,7 @@
 #include "names.h"
 #include "no_throw.h"
 #include "scoped.h"
+#include "utils/storage.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/error.h>
@@ -127,7 +128,8 @@ bool QueueEventOf(std::string &share, int type, const std::string &fullPath, con
                   const PendingCheck &isReindexQueued) {
     char shareName[kShareNameSize] = {};
     char sharePath[kPathSize] = {};
-    if (VORKShareNamePathGet(fullPath.c_str(), shareName, sizeof(shareName), sharePath, sizeof(sharePath)) < 0) {
+    if (HasNul(fullPath) ||
+        VORKShareNamePathGet(fullPath.c_str(), shareName, sizeof(shareName), sharePath, sizeof(sharePath)) < 0) {
         syslog(LOG_ERR, "%s:%d VORKShareNamePathGet failed, path=%s", kUtilsModule, 472, fullPath.c_str());
         return false;
     }
@@ -186,6 +188,7 @@ bool PendingReindexes::IsQueued(const std::string &fullPath, const std::string &
         return IsReindexQueued(fullPath, queueFile);
     }
     if (!IsFileExist(queueFile)) {
+        queues_.erase(queueFile);  // consumed: a new file may get the number of the old one
         return false;
     }
     KnownQueue &queue = Queue(queueFile, std::string_view(fullPath).substr(0, fullPath.size() - sharePath.size()));

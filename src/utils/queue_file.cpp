@@ -145,9 +145,6 @@ class LineReader {
 public:
     /// Null when the line is malformed. Readable bytes have to follow the line (OrdinaryReader::kPadding).
     const QueueEvent *Read(std::string_view line, bool whole) {
-        if (line.size() > kMaxLine) {
-            return nullptr;
-        }
         OrdinaryEvent event;
         if (ordinary_.ReadEvent(line, event)) {
             event_ = {event.type, event.path, event.oldPath};
@@ -205,6 +202,12 @@ bool Visit(const Lines &lines, LineReader &reader, const QueueVisitor &visit, Wa
     }
     for (std::string_view rest = lines.text; !rest.empty();) {
         const std::string_view line = TakeLine(rest);
+        if (line.size() > kMaxLine) {
+            if (!visit(line.substr(0, kShownOfLongLine), nullptr)) {
+                return false;
+            }
+            continue;
+        }
         const bool whole = line.data() + line.size() < lines.text.data() + lines.text.size();
         if (wanted(line) && !visit(line, reader.Read(line, whole))) {
             return false;

@@ -2,7 +2,6 @@
 
 #include "names.h"
 
-#include <vork/error.h>
 #include <vork/search.h>
 #include <vork/service.h>
 
@@ -16,8 +15,9 @@ constexpr int kServiceFlag = 1;  // the platform's
 
 bool RestartFileSharing(const RecordAt &failure) {
     if (VLIBServiceRestart(kFileSharingService) < 0) {
+        const PlatformError error;
         syslog(LOG_ERR, "%s:%d VLIBServiceRestart failed: err=[0x%04X %s:%d]", failure.module, failure.line,
-               VLIBCErrGet(), VLIBCErrorGetFile(), VLIBCErrorGetLine());
+               error.code, error.file, error.line);
         return false;
     }
     return true;
@@ -27,8 +27,9 @@ bool RestartFileSharing(const RecordAt &failure) {
 
 bool StartDaemon(const RecordAt &failure) {
     if (VLIBServiceStart(kDaemonService, kServiceFlag) < 0) {
+        const PlatformError error;
         syslog(LOG_ERR, "%s:%d VLIBServiceStart failed: err=[0x%04X %s:%d]", failure.module, failure.line,
-               VLIBCErrGet(), VLIBCErrorGetFile(), VLIBCErrorGetLine());
+               error.code, error.file, error.line);
         return false;
     }
     return true;
@@ -36,8 +37,9 @@ bool StartDaemon(const RecordAt &failure) {
 
 bool StopDaemon(const RecordAt &failure) {
     if (VLIBServiceStop(kDaemonService, kServiceFlag) < 0) {
+        const PlatformError error;
         syslog(LOG_ERR, "%s:%d VLIBServiceStop failed: err=[0x%04X %s:%d]", failure.module, failure.line,
-               VLIBCErrGet(), VLIBCErrorGetFile(), VLIBCErrorGetLine());
+               error.code, error.file, error.line);
         return false;
     }
     return true;
@@ -45,8 +47,9 @@ bool StopDaemon(const RecordAt &failure) {
 
 bool SetSearch(bool on, const RecordAt &failure) {
     if (VORKSMBSetSpotlight(on ? 1 : 0) < 0) {
+        const PlatformError error;
         syslog(LOG_ERR, "%s:%d VORKSMBSetSpotlight failed: err=[0x%04X %s:%d]", failure.module, failure.line,
-               VLIBCErrGet(), VLIBCErrorGetFile(), VLIBCErrorGetLine());
+               error.code, error.file, error.line);
         return false;
     }
     return true;

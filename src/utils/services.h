@@ -3,12 +3,21 @@
 #ifndef FILEINDEX_SRC_UTILS_SERVICES_H
 #define FILEINDEX_SRC_UTILS_SERVICES_H
 
+#include <vork/error.h>
+
 namespace VORK::FILEINDEX::internal {
 
 /// Where a failure is reported from: each operation keeps records of its own for the same step.
 struct RecordAt {
     const char *module;
     int line;
+};
+
+/// The platform's last error, read in one order everywhere.
+struct PlatformError {
+    int code = VLIBCErrGet();
+    const char *file = VLIBCErrorGetFile();
+    int line = VLIBCErrorGetLine();
 };
 
 bool StartDaemon(const RecordAt &failure);

@@ -7,7 +7,6 @@
 #include <fileindex/paths.h>
 #include <fileindex/updater.h>
 
-#include <vork/error.h>
 #include <vork/service.h>
 
 #include <syslog.h>
@@ -28,8 +27,9 @@ bool StopIndexing() {
         return true;
     }
     // The words name the start although the stop failed; support tools know the record by them.
-    syslog(LOG_ERR, "%s:%d VLIBServiceStart failed: err=[0x%04X %s:%d]", kUtilsModule, 641, VLIBCErrGet(),
-           VLIBCErrorGetFile(), VLIBCErrorGetLine());
+    const PlatformError error;
+    syslog(LOG_ERR, "%s:%d VLIBServiceStart failed: err=[0x%04X %s:%d]", kUtilsModule, 641, error.code, error.file,
+           error.line);
     return false;
 }
 

@@ -1,0 +1,26 @@
+/// \file
+/// Where a share's index data lies, for names that come as strings.
+#ifndef FILEINDEX_SRC_UTILS_STORAGE_H
+#define FILEINDEX_SRC_UTILS_STORAGE_H
+
+#include "names.h"
+
+#include <fileindex/fileidx.h>
+
+#include <string>
+
+namespace VORK::FILEINDEX::internal {
+
+/// A name or path with a NUL inside names nothing; as a C string it would name something else.
+inline bool HasNul(const std::string &text) {
+    return text.find('\0') != std::string::npos;
+}
+
+/// FILEIDXQueuePathGet; -1 also for a name that is none.
+inline int QueuePathOf(const std::string &share, char (&buffer)[kPathSize]) {
+    return HasNul(share) ? -1 : FILEIDXQueuePathGet(share.c_str(), buffer, kPathSize);
+}
+
+}  // namespace VORK::FILEINDEX::internal
+
+#endif
