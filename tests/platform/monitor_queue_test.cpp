@@ -95,6 +95,15 @@ TEST_F(MonitorQueueTest, StoresTheDescriptionAsItIs) {
     EXPECT_EQ(Parse(ReadText(kFile)).toStyledString(), expected.toStyledString());
 }
 
+TEST_F(MonitorQueueTest, WritesTheDocumentedExample) {
+    const Json::Value example = Parse(platform_test::DocumentedExample("\"registrations\""));
+    Json::Value description = example["registrations"][0];
+    description.removeMember("name");
+    description.removeMember("type");
+    ASSERT_TRUE(Upsert(description));
+    EXPECT_EQ(Parse(ReadText(kFile)), example);
+}
+
 TEST_F(MonitorQueueTest, DoesNotWakeTheDaemonWithoutNeed) {
     ASSERT_TRUE(Upsert(Description("/q", "/vol1/a")));
     std::filesystem::create_hard_link(kFile, "/usr/vork/etc/before");

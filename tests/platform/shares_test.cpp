@@ -163,6 +163,14 @@ TEST_F(SharesTest, KnowsRecycleBins) {
     }
 }
 
+TEST_F(SharesTest, ReadsTheDocumentedExample) {
+    WriteFile(kConfiguration, platform_test::DocumentedExample("\"shares\""));
+    EXPECT_EQ(PathOf("photo"), "/vol1/photo");
+    EXPECT_EQ(PathOf("music"), "/vol2/music");
+    EXPECT_NE(VORKShareIsShareRecycle("/vol1/photo/#recycle/x"), 0);
+    EXPECT_EQ(VORKShareIsShareRecycle("/vol2/music/#recycle/x"), 0);
+}
+
 TEST_F(SharesTest, KeepsTheLastGoodTableWhenTheFileBreaks) {
     EXPECT_EQ(PathOf("photo"), kNoSuchShare) << "no file";
     for (const char *text :

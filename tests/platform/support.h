@@ -36,6 +36,22 @@ inline std::string ReadText(const std::string &path) {
     return {std::istreambuf_iterator<char>(file), {}};
 }
 
+/// The JSON example in the platform's README that holds the text.
+inline std::string DocumentedExample(const std::string &text) {
+    const char *source = std::getenv("SOURCE_DIR");
+    const std::string readme = ReadText((source == nullptr ? "." : std::string(source)) + "/platform/README.md");
+    const std::string start = "```json\n";
+    for (size_t at = readme.find(start); at != std::string::npos; at = readme.find(start, at + 1)) {
+        const std::string example =
+            readme.substr(at + start.size(), readme.find("```", at + 1) - at - start.size());
+        if (example.find(text) != std::string::npos) {
+            return example;
+        }
+    }
+    ADD_FAILURE() << "no such example: " << text;
+    return "";
+}
+
 inline void WriteScript(const std::string &path, const std::string &body) {
     WriteFile(path, "#!/bin/sh\n" + body);
     std::filesystem::permissions(path, std::filesystem::perms(0755));
