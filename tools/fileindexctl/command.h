@@ -35,16 +35,11 @@ struct Command {
     ExitStatus (*run)(const Arguments &, Output &);
 };
 
-struct Group {
-    std::string_view name;
-    std::string_view help;
-};
-
 /// All commands, in the order in which help shows them.
 std::span<const Command> Commands();
 
-/// The names that commands are grouped under.
-std::span<const Group> Groups();
+/// What the commands of a group are about.
+std::string_view HelpOfGroup(std::string_view group);
 
 }  // namespace fileindexctl
 

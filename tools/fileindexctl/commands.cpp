@@ -1,8 +1,6 @@
 #include "command.h"
 #include "handlers.h"
 
-#include <array>
-
 namespace fileindexctl {
 
 namespace {
@@ -29,20 +27,56 @@ constexpr Parameter kAdd[] = {
      "what to index: document, audio, video and photo, with commas between; all (if not given); none"},
 };
 constexpr Parameter kSet[] = {{"PATH", Arity::One, "", "the indexed folder: /SHARE/..."}, kName, kMedia};
+constexpr Parameter kYes = {"--yes", Arity::Flag, "", "delete without asking"};
+constexpr Parameter kRemove[] = {
+    {"PATH", Arity::Many, "", "indexed folders"},
+    {"--force", Arity::Flag, "", "also folders whose share is away"},
+    kYes,
+};
 constexpr Parameter kQuestion[] = {{"PATH", Arity::One, "", "a share path (/SHARE/...) or a full path"}};
 constexpr Parameter kPause[] = {
     {"HOURS", Arity::Optional, "", "for how long: 8h or 8; 0 or nothing: without an end"},
     {"--until", Arity::One, "HH:MM", "until this local time comes next"},
 };
+constexpr Parameter kStatus[] = {
+    {"PATH", Arity::Optional, "", "only this indexed folder"},
+    {"--share", Arity::One, "SHARE", "only this share"},
+};
+constexpr Parameter kReindex[] = {{"PATH", Arity::Many, "", "share paths in or of indexed folders"}};
+constexpr Parameter kRevive[] = {{"SHARE", Arity::Many, "", "names of shares"}};
+constexpr Parameter kShare[] = {{"SHARE", Arity::One, "", "the name of the share"}};
+constexpr Parameter kShareRename[] = {
+    {"OLD", Arity::One, "", "the name that the share had"},
+    {"NEW", Arity::One, "", "the name that the share has now"},
+};
+constexpr Parameter kShareDelete[] = {{"SHARE", Arity::One, "", "the name of the share"}, kYes};
+constexpr Parameter kMigrate[] = {{"--dry-run", Arity::Flag, "", "only say what would be done"}};
+
+constexpr struct {
+    std::string_view name;
+    std::string_view help;
+} kGroups[] = {{"share", "Keep the index in step with a share"}};
 
 constexpr Command kCommands[] = {
     {"", "list", "Show the indexed folders", kList, ListFolders},
     {"", "show", "Show one indexed folder", kFolder, ShowFolder},
     {"", "add", "Have a folder indexed", kAdd, AddFolder},
     {"", "set", "Change an indexed folder; without options, tell everybody about it again", kSet, SetFolder},
+    {"", "remove", "Stop indexing folders", kRemove, RemoveFolders},
     {"", "check", "Is the path indexed?", kQuestion, CheckPath},
+    {"", "contains", "Does an indexed folder lie at or under the path?", kQuestion, ContainsFolder},
+    {"", "governs", "Whose settings hold for the path?", kQuestion, GoverningFolder},
+    {"", "status", "How far indexing is, and what waits", kStatus, ShowStatus},
     {"", "pause", "Pause indexing", kPause, PauseIndexing},
     {"", "resume", "Go on with indexing", {}, ResumeIndexing},
+    {"", "reindex", "Have paths indexed again", kReindex, ReindexPaths},
+    {"", "revive", "Go on with shares that were out of space", kRevive, ReviveShares},
+    {"share", "rename", "Move the indexed folders of a share that was renamed", kShareRename, RenameShare},
+    {"share", "remove", "Forget the indexed folders of a share", kShareDelete, RemoveShare},
+    {"share", "pause", "Stop the worker and the monitor of a share", kShare, PauseShare},
+    {"share", "resume", "Start the monitor and the worker of a share again", kShare, ResumeShare},
+    {"share", "clean", "Delete the queue and the index database of a share", kShareDelete, CleanShare},
+    {"", "migrate", "Bring everything into line with the folders after an upgrade", kMigrate, Migrate},
 };
 
 }  // namespace
@@ -51,7 +85,12 @@ std::span<const Command> Commands() {
     return kCommands;
 }
 
-std::span<const Group> Groups() {
+std::string_view HelpOfGroup(std::string_view group) {
+    for (const auto &row : kGroups) {
+        if (row.name == group) {
+            return row.help;
+        }
+    }
     return {};
 }
 

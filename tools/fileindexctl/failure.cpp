@@ -37,11 +37,6 @@ bool MayNot(const std::string &path, int mode) {
     return faccessat(AT_FDCWD, path.c_str(), mode, AT_EACCESS) != 0 && IsDenied(errno);
 }
 
-bool MayNotWrite(const std::string &path) {
-    return MayNot(path, W_OK) ||
-           (access(path.c_str(), F_OK) != 0 && MayNot(path.substr(0, path.rfind('/')), W_OK));
-}
-
 Failure Denied(const std::string &path) {
     return {ExitStatus::Permission, "no permission for " + path + "; run this as the administrator"};
 }
@@ -57,7 +52,7 @@ Failure LoadFailure(const std::string &path) {
     if (MayNot(path, R_OK)) {
         return Denied(path);
     }
-    return {ExitStatus::Malformed, path + " cannot be read as JSON; nothing was changed"};
+    return {ExitStatus::Malformed, path + " cannot be read as JSON"};
 }
 
 Failure SaveFailure(const std::string &path) {
@@ -73,6 +68,11 @@ Failure SaveFailure(const std::string &path) {
 
 }  // namespace
 
+bool MayNotWrite(const std::string &path) {
+    return MayNot(path, W_OK) ||
+           (access(path.c_str(), F_OK) != 0 && MayNot(path.substr(0, path.rfind('/')), W_OK));
+}
+
 void ForgetErrors() {
     ErrorHandler::SetError(VORK::FILEINDEX::FILEINDEX_ERR_NONE);
     VLIBCErrSetEx(0, "", 0);
@@ -87,7 +87,7 @@ Failure FailureOf(const Config &config) {
         case FILEINDEX_ERR_LOAD_JSON:
             return LoadFailure(config.GetPath());
         case FILEINDEX_ERR_MALFORMED_CONFIG:
-            return {ExitStatus::Malformed, config.GetPath() + " is not a JSON object; nothing was changed"};
+            return {ExitStatus::Malformed, config.GetPath() + " is not a JSON object"};
         case FILEINDEX_ERR_SAVE_JSON:
             return SaveFailure(config.GetPath());
         case FILEINDEX_ERR_EXCEED_MAX_FOLDER:

@@ -22,9 +22,9 @@ using VORK::FILEINDEX::IndexMgr;
 
 constexpr std::string_view kIndexMgr = "index_mgr.cpp";
 
-const std::vector<PlannedStep> &UpsertPlan() {
-    static const std::vector<PlannedStep> plan = {
-        {"saved", "folder.conf could not be saved", {}},
+std::vector<PlannedStep> UpsertPlan() {
+    return {
+        SaveStep(),
         {"monitor", "the file-change monitor could not be registered", {{kIndexMgr, 598}}},
         {"service", "fileindexd could not be started", {{kIndexMgr, 605}}},
         {"search setting",
@@ -34,7 +34,6 @@ const std::vector<PlannedStep> &UpsertPlan() {
         {"daemon told", "fileindexd cannot be reached", {{kIndexMgr, 621}}},
         {"events queued", "the event could not be queued", {{kIndexMgr, 629}, {kIndexMgr, 634}}},
     };
-    return plan;
 }
 
 // What is stored now, whoever stored it.
@@ -58,12 +57,8 @@ ExitStatus Upsert(const Json::Value &record, Output &output) {
     Json::Value request(Json::arrayValue);
     request.append(record);
     const bool searchWasOn = VORKSMBIsEnableSpotlight() != 0;
-    ForgetErrors();
-    const bool succeeded = IndexMgr::Upsert(request);
-    if (!succeeded && !HasFatalRecord(UpsertPlan())) {
-        throw FailureOf(VORK::FILEINDEX::Folders());
-    }
-    StepReport report = StepReport::Trace(UpsertPlan(), succeeded);
+    StepReport report =
+        StepReport::Perform(UpsertPlan(), VORK::FILEINDEX::Folders(), [&] { return IndexMgr::Upsert(request); });
     if (searchWasOn) {
         report.Correct("search setting", StepResult::Already);
     }
@@ -71,11 +66,12 @@ ExitStatus Upsert(const Json::Value &record, Output &output) {
     report.Show(output);
     StateFolder(path, output);
     if (report.Status() != ExitStatus::Done) {
+        const std::string word = ShellWord(path);
         // A repeated change finds nothing changed any more, so the daemon is asked to look at everything.
         output.Error(report.Status(),
                      "the change is saved, but not everybody knows; once the cause is mended: "
                      "\"fileindexctl set " +
-                         path + "\", then \"fileindexctl reindex " + path + "\"");
+                         word + "\", then \"fileindexctl reindex " + word + "\"");
     }
     return report.Status();
 }

@@ -18,12 +18,34 @@ ExitStatus ShowFolder(const Arguments &arguments, Output &output);
 ExitStatus AddFolder(const Arguments &arguments, Output &output);
 ExitStatus SetFolder(const Arguments &arguments, Output &output);
 
+// folder_removal.cpp
+ExitStatus RemoveFolders(const Arguments &arguments, Output &output);
+
 // questions.cpp
 ExitStatus CheckPath(const Arguments &arguments, Output &output);
+ExitStatus ContainsFolder(const Arguments &arguments, Output &output);
+ExitStatus GoverningFolder(const Arguments &arguments, Output &output);
+
+// status.cpp
+ExitStatus ShowStatus(const Arguments &arguments, Output &output);
 
 // schedule.cpp
 ExitStatus PauseIndexing(const Arguments &arguments, Output &output);
 ExitStatus ResumeIndexing(const Arguments &arguments, Output &output);
+
+// reindex.cpp
+ExitStatus ReindexPaths(const Arguments &arguments, Output &output);
+ExitStatus ReviveShares(const Arguments &arguments, Output &output);
+
+// shares.cpp
+ExitStatus RenameShare(const Arguments &arguments, Output &output);
+ExitStatus RemoveShare(const Arguments &arguments, Output &output);
+ExitStatus PauseShare(const Arguments &arguments, Output &output);
+ExitStatus ResumeShare(const Arguments &arguments, Output &output);
+ExitStatus CleanShare(const Arguments &arguments, Output &output);
+
+// migrate.cpp
+ExitStatus Migrate(const Arguments &arguments, Output &output);
 
 }  // namespace fileindexctl
 

@@ -10,7 +10,7 @@
 
 namespace {
 
-using fileindexctl::ExitStatus;
+using namespace fileindexctl;
 
 // At this level the library also records events that it dropped, which its results do not tell.
 constexpr int kLogDroppedEvents = 7;
@@ -25,30 +25,38 @@ bool AsksForJson(int argc, const char *const argv[]) {
     return false;
 }
 
-ExitStatus Run(const fileindexctl::Invocation &invocation, fileindexctl::Output &output) {
+ExitStatus Run(const Invocation &invocation, Output &output) {
     if (invocation.command == nullptr) {
         std::fputs(invocation.help.c_str(), stdout);
         return ExitStatus::Done;
     }
-    return invocation.command->run(invocation.arguments, output);
+    try {
+        return invocation.command->run(invocation.arguments, output);
+    } catch (const Failure &failure) {
+        output.Error(failure.Status(), failure.what());
+        return failure.Status();
+    }
+}
+
+ExitStatus ParseAndRun(int argc, const char *const argv[]) {
+    Invocation invocation;
+    try {
+        invocation = Parse(argc, argv);
+    } catch (const Failure &failure) {
+        Output output(AsksForJson(argc, argv));
+        output.Error(failure.Status(), failure.what());
+        return output.Finish(failure.Status());
+    }
+    Output output(invocation.json);
+    return output.Finish(Run(invocation, output));
 }
 
 }  // namespace
 
 int main(int argc, char *argv[]) {
-    using namespace fileindexctl;
     VORK::FILEINDEX::LOG_LEVEL = kLogDroppedEvents;
     try {
-        Output output(AsksForJson(argc, argv));
-        ExitStatus status = ExitStatus::Done;
-        try {
-            const Invocation invocation = Parse(argc, argv);
-            status = Run(invocation, output);
-        } catch (const Failure &failure) {
-            status = failure.Status();
-            output.Error(status, failure.what());
-        }
-        return static_cast<int>(output.Finish(status));
+        return static_cast<int>(ParseAndRun(argc, argv));
     } catch (const std::exception &error) {
         std::fprintf(stderr, "fileindexctl: %s\n", error.what());
         return static_cast<int>(ExitStatus::Partly);

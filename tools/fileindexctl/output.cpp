@@ -38,7 +38,7 @@ void Complain(std::string_view kind, const std::string &text) {
 
 std::string Serialise(const Json::Value &document) {
     Json::StreamWriterBuilder builder;
-    builder["indentation"] = "  ";
+    builder["indentation"] = "";
     builder["emitUTF8"] = true;  // names are bytes and stay what they are
     return Json::writeString(builder, document) + "\n";
 }

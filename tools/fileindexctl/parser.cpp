@@ -30,11 +30,6 @@ public:
         app_.require_subcommand(1);
         app_.add_flag("--json", json_, "one JSON document on the standard output");
         app_.set_version_flag("--version", FILEINDEXCTL_VERSION, "show the version");
-        for (const auto &group : Groups()) {
-            CLI::App *app = app_.add_subcommand(std::string(group.name), std::string(group.help));
-            app->require_subcommand(1)->fallthrough();
-            groups_.emplace(group.name, app);
-        }
         for (const auto &command : Commands()) {
             AddCommand(command);
         }
@@ -51,7 +46,7 @@ public:
             invocation.help = std::string(FILEINDEXCTL_VERSION) + "\n";
             return invocation;
         } catch (const CLI::ParseError &error) {
-            throw Failure(ExitStatus::Usage, std::string(error.what()) + "; see \"fileindexctl --help\"");
+            throw Failure(ExitStatus::Usage, Explain(error) + "; see \"fileindexctl --help\"");
         }
         invocation.json = json_;
         for (const auto &[command, app] : commands_) {
@@ -64,8 +59,27 @@ public:
     }
 
 private:
+    // A word that is no command is not what the parser complains about first.
+    std::string Explain(const CLI::ParseError &error) const {
+        const auto words = app_.remaining(true);
+        const bool unknown = app_.get_subcommands().empty() && !words.empty() && !words.front().starts_with("-");
+        return unknown ? "there is no command \"" + words.front() + "\"" : error.what();
+    }
+
+    CLI::App &ParentOf(const Command &command) {
+        if (command.group.empty()) {
+            return app_;
+        }
+        CLI::App *&group = groups_[command.group];
+        if (group == nullptr) {
+            group = app_.add_subcommand(std::string(command.group), std::string(HelpOfGroup(command.group)));
+            group->require_subcommand(1)->fallthrough();
+        }
+        return *group;
+    }
+
     void AddCommand(const Command &command) {
-        CLI::App &parent = command.group.empty() ? app_ : *groups_.at(command.group);
+        CLI::App &parent = ParentOf(command);
         CLI::App *app = parent.add_subcommand(std::string(command.name), std::string(command.help));
         app->fallthrough();
         for (const auto &parameter : command.parameters) {
@@ -85,6 +99,7 @@ private:
         CLI::Option *option = app.add_option(name, CLI::callback_t([](const auto &) { return true; }), help);
         option->type_name(std::string(parameter.value))->required(parameter.IsRequired());
         option->expected(1, parameter.arity == Arity::Many ? CLI::detail::expected_max_vector_size : 1);
+        option->allow_extra_args(parameter.arity == Arity::Many);
         if (parameter.number) {
             option->check(CheckNumber);
         }

@@ -65,13 +65,6 @@ bool IsShareKnown(const std::string &share, const Folders &folders) {
            });
 }
 
-void RefuseFullPath(const Place &place) {
-    if (place.isFull && !place.sharePath.empty()) {
-        throw Failure(ExitStatus::Usage, "\"" + place.path + "\" is a full path; the share path is needed: \"" +
-                                             place.sharePath + "\"");
-    }
-}
-
 bool IsPlain(const std::string &path) {
     const std::string closed = path + "/";
     return closed.find("//") == std::string::npos && closed.find("/./") == std::string::npos &&
@@ -106,6 +99,7 @@ std::string RequireShare(const std::string &share) {
     }
     switch (VLIBCErrGet()) {
         case VORK_ERR_NO_SUCH_SHARE:
+        case VORK_ERR_BAD_PARAMETER:
             throw Failure(ExitStatus::NoSuchFolder, "there is no share \"" + share + "\"; " + kWhereSharesAre);
         case VORK_ERR_SHARE_DIRECTORY_NAME:
             throw Failure(ExitStatus::NotConfigured,
@@ -136,6 +130,13 @@ Place AsFullPath(const Place &place) {
     return place.fullPath.empty() ? place : Place{place.fullPath, true, place.sharePath, place.fullPath};
 }
 
+void RequireSharePath(const Place &place) {
+    if (place.isFull && !place.sharePath.empty()) {
+        throw Failure(ExitStatus::Usage, "\"" + place.path + "\" is a full path; the share path is needed: \"" +
+                                             place.sharePath + "\"");
+    }
+}
+
 const Folder &RequireFolder(const std::string &given, const Folders &folders) {
     if (const Folder *exact = Find(given, folders)) {
         return *exact;
@@ -144,7 +145,7 @@ const Folder &RequireFolder(const std::string &given, const Folders &folders) {
     if (const Folder *stripped = Find(place.path, folders)) {
         return *stripped;
     }
-    RefuseFullPath(place);
+    RequireSharePath(place);
     std::string message = "\"" + place.path + "\" is not an indexed folder";
     const auto covering = Covering(place, folders);
     if (!covering.empty()) {
@@ -155,7 +156,7 @@ const Folder &RequireFolder(const std::string &given, const Folders &folders) {
 
 std::string RequireNewPath(const std::string &given, const Folders &folders) {
     const Place place = Locate(given, folders);
-    RefuseFullPath(place);
+    RequireSharePath(place);
     if (place.path.empty() || !IsPlain(place.path)) {
         throw Failure(ExitStatus::Usage,
                       "\"" + given +

@@ -33,6 +33,9 @@ Place Locate(const std::string &given, const Folders &folders);
 /// what the user may have meant, when there is none.
 const VORK::FILEINDEX::Folder &RequireFolder(const std::string &given, const Folders &folders);
 
+/// Throws Failure, which names the share path, for a full path.
+void RequireSharePath(const Place &place);
+
 /// The share path for a new folder: on a share that exists, without trailing slashes, spelt plainly. Throws
 /// Failure.
 std::string RequireNewPath(const std::string &given, const Folders &folders);

@@ -1,4 +1,4 @@
-#include "failure.h"
+#include "folder_text.h"
 #include "handlers.h"
 #include "paths.h"
 #include "text.h"
@@ -48,6 +48,34 @@ ExitStatus CheckPath(const Arguments &arguments, Output &output) {
     output.Data()["covered_by"] = Array(covering);
     Say(place, indexed ? "indexed, covered by " + Enumerate(covering) : "not indexed", output);
     return Answer(indexed);
+}
+
+ExitStatus ContainsFolder(const Arguments &arguments, Output &output) {
+    const Folders folders = ReadFolders();
+    const Place place = Asked(arguments, folders, output);
+    const auto contained = Contained(place, folders);
+    const bool any = place.isFull ? !contained.empty() : IndexMgr::IsPathContainIndexed(place.path, folders);
+    output.Data()["contains"] = any;
+    output.Data()["folders"] = Array(contained);
+    Say(place, any ? "contains " + Enumerate(contained) : "contains no indexed folder", output);
+    return Answer(any);
+}
+
+ExitStatus GoverningFolder(const Arguments &arguments, Output &output) {
+    const Folders folders = ReadFolders();
+    const Place place = Asked(arguments, folders, output);
+    if (place.fullPath.empty() && !place.isFull) {
+        RequireShare(ShareOf(place.path));
+    }
+    const Json::Value record = VORK::FILEINDEX::GetMostSuitableCfg(folders, place.fullPath);
+    const bool governed = !record.empty();
+    output.Data()["governed"] = governed;
+    output.Data()["folder"] = governed ? record : Json::Value();
+    Say(place,
+        governed ? "governed by " + record["path"].asString() + ": " + MediaText(record)
+                 : "governed by no indexed folder",
+        output);
+    return Answer(governed);
 }
 
 }  // namespace fileindexctl

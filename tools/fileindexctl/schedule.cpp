@@ -1,5 +1,6 @@
 #include "schedule.h"
 
+#include "config_lock.h"
 #include "failure.h"
 #include "handlers.h"
 #include "steps.h"
@@ -27,16 +28,8 @@ constexpr long long kSecondsPerHour = 3600;
 // The library and the daemon reckon pauses in 32 bits: a later end would wrap and end the pause at once.
 constexpr long long kLatest = std::numeric_limits<int>::max();
 
-const std::vector<PlannedStep> &Plan(int line) {
-    static const std::vector<PlannedStep> pause = {
-        {"saved", "status.conf could not be saved", {}},
-        {"daemon told", "fileindexd cannot be reached", {{"status_mgr.cpp", 198}}},
-    };
-    static const std::vector<PlannedStep> resume = {
-        pause[0],
-        {"daemon told", "fileindexd cannot be reached", {{"status_mgr.cpp", 221}}},
-    };
-    return line == 198 ? pause : resume;
+std::vector<PlannedStep> Plan(int line) {
+    return {SaveStep(), {"daemon told", "fileindexd cannot be reached", {{"status_mgr.cpp", line}}}};
 }
 
 std::string LocalTime(long long seconds) {
@@ -97,25 +90,10 @@ long long ParseUntil(const std::string &text) {
     throw Failure(ExitStatus::Usage, "the clock does not show " + text + " within a day");
 }
 
-class StatusLock {
-public:
-    explicit StatusLock(Status &status) : status_(status), locked_(status.Lock(true)) {}
-    ~StatusLock() { status_.Unlock(); }
-
-    StatusLock(const StatusLock &) = delete;
-    StatusLock &operator=(const StatusLock &) = delete;
-
-    bool IsHeld() const { return locked_; }
-
-private:
-    Status &status_;
-    bool locked_;
-};
-
 // StatusMgr::Pause counts in whole hours from now; for a time of day its steps are taken one by one.
 StepReport PauseUntil(long long resumeTime) {
     Status status;
-    const StatusLock lock(status);
+    const ConfigLock lock(status);
     if (!lock.IsHeld() || !status.Load() || !status.Pause(resumeTime) || !status.Save()) {
         throw FailureOf(status);
     }
@@ -127,13 +105,6 @@ StepReport PauseUntil(long long resumeTime) {
     report.Add("daemon told", told ? StepResult::Done : StepResult::Failed,
                told ? "" : "fileindexd cannot be reached");
     return report;
-}
-
-StepReport Trace(const std::vector<PlannedStep> &plan, bool succeeded) {
-    if (!succeeded && !HasFatalRecord(plan)) {
-        throw FailureOf(Status());
-    }
-    return StepReport::Trace(plan, succeeded);
 }
 
 ExitStatus Report(const StepReport &report, Output &output) {
@@ -159,6 +130,9 @@ std::string PauseText(long long resumeTime) {
     if (resumeTime == kNotPaused) {
         return "indexing is not paused";
     }
+    if (resumeTime <= std::time(nullptr)) {
+        return "indexing is not paused; a pause ended at " + LocalTime(resumeTime);
+    }
     return "indexing is paused until " + LocalTime(resumeTime);
 }
 
@@ -172,15 +146,11 @@ ExitStatus PauseIndexing(const Arguments &arguments, Output &output) {
         return Report(PauseUntil(resumeTime), output);
     }
     const int hours = arguments.Has("HOURS") ? ParseHours(arguments.One("HOURS")) : 0;
-    ForgetErrors();
-    const bool succeeded = StatusMgr::Pause(hours);
-    return Report(Trace(Plan(198), succeeded), output);
+    return Report(StepReport::Perform(Plan(198), Status(), [&] { return StatusMgr::Pause(hours); }), output);
 }
 
 ExitStatus ResumeIndexing(const Arguments & /*arguments*/, Output &output) {
-    ForgetErrors();
-    const bool succeeded = StatusMgr::Resume();
-    return Report(Trace(Plan(221), succeeded), output);
+    return Report(StepReport::Perform(Plan(221), Status(), [] { return StatusMgr::Resume(); }), output);
 }
 
 }  // namespace fileindexctl

@@ -1,6 +1,10 @@
 #include "steps.h"
 
+#include "failure.h"
+#include "platform_error.h"
 #include "text.h"
+
+#include <fileindex/error.h>
 
 #include <algorithm>
 
@@ -18,7 +22,11 @@ const std::string *FirstOf(const std::vector<Mark> &marks) {
 }
 
 std::string Explain(const PlannedStep &step, const std::string *message) {
-    return message == nullptr ? step.trouble : step.trouble + " (" + *message + ")";
+    if (message == nullptr) {
+        return step.trouble;
+    }
+    const std::string cause = PlatformErrorOf(*message);
+    return step.trouble + (cause.empty() ? "" : ": " + cause) + " (" + *message + ")";
 }
 
 struct Wording {
@@ -46,21 +54,21 @@ Wording WordingOf(StepResult result) {
 
 }  // namespace
 
-bool HasFatalRecord(const std::vector<PlannedStep> &plan) {
-    return std::any_of(plan.begin(), plan.end(),
-                       [](const PlannedStep &step) { return FirstOf(step.fatal) != nullptr; });
+PlannedStep SaveStep(const std::string &name) {
+    return {name, "the configuration could not be saved", {}, {}, Evidence::ErrorCode};
 }
 
 StepReport StepReport::Trace(const std::vector<PlannedStep> &plan, bool succeeded) {
     StepReport report;
-    const bool marked = HasFatalRecord(plan);
+    const bool marked = std::any_of(plan.begin(), plan.end(),
+                                    [](const PlannedStep &step) { return FirstOf(step.fatal) != nullptr; });
     bool stopped = false;
     for (const auto &step : plan) {
         const std::string *fatal = FirstOf(step.fatal);
         const std::string *tolerated = FirstOf(step.tolerated);
         if (stopped) {
             report.Add(step.name, StepResult::NotReached);
-        } else if (!succeeded && (fatal != nullptr || !marked)) {
+        } else if (!succeeded && (fatal != nullptr || (!marked && step.evidence != Evidence::Record))) {
             report.Add(step.name, StepResult::Failed, Explain(step, fatal));
             stopped = true;
         } else if (tolerated != nullptr) {
@@ -68,6 +76,19 @@ StepReport StepReport::Trace(const std::vector<PlannedStep> &plan, bool succeede
         } else {
             report.Add(step.name, StepResult::Done);
         }
+    }
+    return report;
+}
+
+StepReport StepReport::Perform(const std::vector<PlannedStep> &plan, const VORK::FILEINDEX::Config &config,
+                               const std::function<bool()> &call) {
+    ForgetErrors();
+    const bool succeeded = call();
+    StepReport report = Trace(plan, succeeded);
+    const bool firstFailed = !report.steps_.empty() && report.steps_.front().result == StepResult::Failed;
+    const bool coded = VORK::FILEINDEX::ErrorHandler::GetError() != VORK::FILEINDEX::FILEINDEX_ERR_NONE;
+    if (firstFailed && (coded || plan.front().evidence == Evidence::ErrorCode)) {
+        throw FailureOf(config);
     }
     return report;
 }
@@ -92,6 +113,19 @@ void StepReport::Correct(const std::string &name, StepResult result, const std::
             step.detail = detail;
         }
     }
+}
+
+void StepReport::Excuse(const std::string &reason) {
+    for (auto &step : steps_) {
+        if (step.result == StepResult::Failed || step.result == StepResult::NotReached) {
+            step.result = StepResult::Skipped;
+            step.detail = reason;
+        }
+    }
+}
+
+void StepReport::Append(const StepReport &more) {
+    steps_.insert(steps_.end(), more.steps_.begin(), more.steps_.end());
 }
 
 bool StepReport::Has(StepResult result) const {

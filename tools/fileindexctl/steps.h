@@ -12,6 +12,9 @@
 #include "output.h"
 #include "records.h"
 
+#include <fileindex/config.h>
+
+#include <functional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -27,24 +30,44 @@ enum class StepResult {
     Skipped,
 };
 
+/// What a step's failure leaves behind.
+enum class Evidence {
+    Record,     ///< one of the step's fatal records
+    ErrorCode,  ///< none of them, but an error code: the step saves the configuration
+    None,       ///< nothing
+};
+
 /// A step as the library will take it, with the records that tell of its failure.
 struct PlannedStep {
     std::string name;
     std::string trouble;            ///< what a failure means, in words
     std::vector<Mark> fatal;        ///< records after which the library stops
     std::vector<Mark> tolerated{};  ///< records after which it goes on
+    Evidence evidence = Evidence::Record;
 };
+
+/// The step that locks, reads, changes and saves the file of a configuration.
+PlannedStep SaveStep(const std::string &name = "saved");
 
 class StepReport {
 public:
     /// What became of the planned steps in a call that answered `succeeded`. The step that failed is the first
-    /// with a fatal record; if none has one, the first step.
+    /// with a fatal record; if none has one, the one that leaves none.
     static StepReport Trace(const std::vector<PlannedStep> &plan, bool succeeded);
+
+    /// Makes the call and traces it. Throws Failure when nothing was done because of the file of `config`.
+    static StepReport Perform(const std::vector<PlannedStep> &plan, const VORK::FILEINDEX::Config &config,
+                              const std::function<bool()> &call);
 
     void Add(const std::string &name, StepResult result, const std::string &detail = std::string());
 
     /// Changes the result of a step that Trace saw done; another stays.
     void Correct(const std::string &name, StepResult result, const std::string &detail = std::string());
+
+    /// Steps that failed or were not reached are put down as skipped, with this reason.
+    void Excuse(const std::string &reason);
+
+    void Append(const StepReport &more);
 
     bool Has(StepResult result) const;
 
@@ -66,9 +89,6 @@ private:
 /// Turns "events queued" into a failure when the library dropped an event: a queue that stays locked, or takes
 /// only part of a line, counts as success there and leaves only a record.
 void MarkDroppedEvents(StepReport &report);
-
-/// Is there a record that stopped one of the steps?
-bool HasFatalRecord(const std::vector<PlannedStep> &plan);
 
 }  // namespace fileindexctl
 

@@ -5,9 +5,11 @@
 
 #include <algorithm>
 #include <array>
+#include <cctype>
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
+#include <cstring>
 
 namespace fileindexctl {
 
@@ -87,6 +89,20 @@ std::string ShortenFront(const std::string &text, unsigned width) {
         rest.erase(0, static_cast<std::size_t>(std::max(length, 1)));
     }
     return "..." + rest;
+}
+
+std::string ShellWord(const std::string &text) {
+    const auto isPlain = [](unsigned char byte) {
+        return std::isalnum(byte) != 0 || byte >= 0x80 || std::strchr("/._-+@:", byte) != nullptr;
+    };
+    if (!text.empty() && std::all_of(text.begin(), text.end(), isPlain)) {
+        return text;
+    }
+    std::string word = "'";
+    for (const char character : text) {
+        word += character == '\'' ? std::string("'\\''") : std::string(1, character);
+    }
+    return word + "'";
 }
 
 std::string Enumerate(const std::vector<std::string> &items) {

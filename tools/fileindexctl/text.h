@@ -18,6 +18,9 @@ unsigned DisplayWidth(const std::string &text);
 /// The end of the text, with "..." in front, so that it takes at most `width` columns.
 std::string ShortenFront(const std::string &text, unsigned width);
 
+/// The text as one word of a shell command.
+std::string ShellWord(const std::string &text);
+
 /// "a, b and c".
 std::string Enumerate(const std::vector<std::string> &items);
 

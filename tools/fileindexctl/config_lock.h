@@ -1,0 +1,27 @@
+/// \file
+/// A lock on a configuration file for the length of a scope.
+#ifndef FILEINDEXCTL_CONFIG_LOCK_H
+#define FILEINDEXCTL_CONFIG_LOCK_H
+
+#include <fileindex/config.h>
+
+namespace fileindexctl {
+
+class ConfigLock {
+public:
+    explicit ConfigLock(VORK::FILEINDEX::Config &config) : config_(config), held_(config.Lock(true)) {}
+    ~ConfigLock() { config_.Unlock(); }
+
+    ConfigLock(const ConfigLock &) = delete;
+    ConfigLock &operator=(const ConfigLock &) = delete;
+
+    bool IsHeld() const { return held_; }
+
+private:
+    VORK::FILEINDEX::Config &config_;
+    bool held_;
+};
+
+}  // namespace fileindexctl
+
+#endif

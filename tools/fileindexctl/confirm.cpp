@@ -1,0 +1,28 @@
+#include "confirm.h"
+
+#include "failure.h"
+#include "text.h"
+
+#include <unistd.h>
+
+#include <cstdio>
+#include <iostream>
+
+namespace fileindexctl {
+
+void RequireConsent(const Arguments &arguments, const std::string &consequence) {
+    if (arguments.Has("--yes")) {
+        return;
+    }
+    if (isatty(STDIN_FILENO) == 0 || isatty(STDERR_FILENO) == 0) {
+        throw Failure(ExitStatus::Usage, consequence + "; without a terminal to ask on, --yes is needed");
+    }
+    std::fprintf(stderr, "%s. Go on? [y/N] ", Printable(consequence).c_str());
+    std::string answer;
+    std::getline(std::cin, answer);
+    if (answer != "y" && answer != "Y" && answer != "yes") {
+        throw Failure(ExitStatus::No, "nothing was changed");
+    }
+}
+
+}  // namespace fileindexctl

@@ -1,0 +1,178 @@
+#include "confirm.h"
+#include "failure.h"
+#include "handlers.h"
+#include "paths.h"
+#include "steps.h"
+#include "text.h"
+
+#include <fileindex/folders.h>
+#include <fileindex/index_mgr.h>
+
+#include <vork/search.h>
+
+#include <algorithm>
+#include <set>
+
+namespace fileindexctl {
+
+namespace {
+
+using VORK::FILEINDEX::Folder;
+using VORK::FILEINDEX::IndexMgr;
+
+constexpr std::string_view kIndexMgr = "index_mgr.cpp";
+
+using Paths = std::vector<std::string>;
+
+struct Removal {
+    Paths present;  // on shares that are there
+    Paths away;     // on shares that are not: their queues and monitors cannot be reached
+};
+
+bool Contains(const Paths &paths, const std::string &path) {
+    return std::find(paths.begin(), paths.end(), path) != paths.end();
+}
+
+std::set<std::string> SharesOf(const Paths &paths) {
+    std::set<std::string> shares;
+    for (const auto &path : paths) {
+        shares.insert(ShareOf(path));
+    }
+    return shares;
+}
+
+Paths Without(const Folders &folders, const Paths &removed) {
+    Paths rest;
+    for (const auto &folder : folders) {
+        if (!Contains(removed, folder.path)) {
+            rest.push_back(folder.path);
+        }
+    }
+    return rest;
+}
+
+Removal Requested(const Arguments &arguments, const Folders &folders, Output &output) {
+    Removal removal;
+    for (const auto &given : arguments.All("PATH")) {
+        const std::string path = RequireFolder(given, folders).path;
+        Paths &paths = IsSharePresent(ShareOf(path)) ? removal.present : removal.away;
+        if (Contains(paths, path)) {
+            output.Warn("\"" + path + "\" is given twice");
+            continue;
+        }
+        paths.push_back(path);
+    }
+    if (!removal.away.empty() && !arguments.Has("--force")) {
+        throw Failure(ExitStatus::Usage, "the share of \"" + removal.away.front() +
+                                             "\" is away, so its monitor and its index data would be left behind; "
+                                             "--force removes the folder all the same");
+    }
+    return removal;
+}
+
+void Ask(const Arguments &arguments, const Removal &removal, const Folders &folders) {
+    Paths all = removal.present;
+    all.insert(all.end(), removal.away.begin(), removal.away.end());
+    std::string consequence = "this removes " + Enumerate(all) + " from the index";
+    const std::set<std::string> left = SharesOf(Without(folders, all));
+    Paths emptied;
+    for (const auto &share : SharesOf(removal.present)) {
+        if (left.count(share) == 0) {
+            emptied.push_back(share);
+        }
+    }
+    if (!emptied.empty()) {
+        consequence += " and deletes the index data of the share " + Enumerate(emptied);
+    }
+    RequireConsent(arguments, consequence);
+}
+
+// The last folder of all stops the service; then nobody is told anything.
+std::vector<PlannedStep> Plan(const std::string &saved, const Paths &removed, const Paths &rest) {
+    std::vector<PlannedStep> plan = {SaveStep(saved)};
+    if (rest.empty()) {
+        plan.push_back({"service", "fileindexd could not be stopped", {}, {{kIndexMgr, 89}}});
+        plan.push_back({"search setting",
+                        "the search setting could not be switched off",
+                        {},
+                        {{kIndexMgr, 94}, {kIndexMgr, 96}}});
+    } else {
+        plan.push_back({"daemon told", "fileindexd cannot be reached", {{kIndexMgr, 104}}});
+        plan.push_back({"events queued", "the event could not be queued", {{kIndexMgr, 111}}});
+    }
+    const std::set<std::string> left = SharesOf(rest);
+    for (const auto &share : SharesOf(removed)) {
+        const std::string ending = "share=" + share;
+        const std::string monitor = "monitor of " + share;
+        if (left.count(share) > 0) {
+            plan.push_back({monitor, "the monitor could not be registered", {{kIndexMgr, 121, ending}}});
+            continue;
+        }
+        plan.push_back({"index data of " + share, "it could not be deleted", {{kIndexMgr, 126, ending}}});
+        plan.push_back({monitor, "the monitor could not be withdrawn", {{kIndexMgr, 130, ending}}});
+    }
+    return plan;
+}
+
+StepReport Remove(const std::string &saved, const Paths &removed, const Folders &folders) {
+    Json::Value request(Json::arrayValue);
+    for (const auto &path : removed) {
+        request.append(path);
+    }
+    const bool searchWasOn = VORKSMBIsEnableSpotlight() != 0;
+    StepReport report = StepReport::Perform(Plan(saved, removed, Without(folders, removed)),
+                                            VORK::FILEINDEX::Folders(), [&] { return IndexMgr::Delete(request); });
+    if (!searchWasOn) {
+        report.Correct("search setting", StepResult::Already);
+    }
+    MarkDroppedEvents(report);
+    return report;
+}
+
+void StateRest(const Paths &removed, Output &output) {
+    Folders folders;
+    IndexMgr::List(folders);
+    auto &data = output.Data();
+    data["removed"] = Json::Value(Json::arrayValue);
+    for (const auto &path : removed) {
+        const auto covering = Covering(Locate(path, folders), folders);
+        if (!Contains(covering, path)) {
+            data["removed"].append(path);
+        }
+        output.Line(
+            Printable(path + (covering.empty() ? " is not indexed" : " still lies in " + Enumerate(covering))));
+    }
+    data["total"] = static_cast<Json::UInt64>(folders.size());
+    output.Line(std::to_string(folders.size()) +
+                (folders.size() == 1 ? " folder is indexed" : " folders are indexed"));
+}
+
+}  // namespace
+
+ExitStatus RemoveFolders(const Arguments &arguments, Output &output) {
+    const Folders folders = ReadFolders();
+    const Removal removal = Requested(arguments, folders, output);
+    Ask(arguments, removal, folders);
+
+    // Two requests: the library stops at the first folder whose share is away, and must not leave the others
+    // undone.
+    StepReport report;
+    Paths removed = removal.present;
+    if (!removal.present.empty()) {
+        report = Remove("saved", removal.present, folders);
+    }
+    if (!removal.away.empty() && report.Status() == ExitStatus::Done) {
+        StepReport away = Remove("saved (share away)", removal.away, ReadFolders());
+        away.Excuse("the share is away");
+        report.Append(away);
+        removed.insert(removed.end(), removal.away.begin(), removal.away.end());
+    }
+    report.Show(output);
+    StateRest(removed, output);
+    if (report.Status() != ExitStatus::Done) {
+        output.Error(report.Status(), "the folders are removed, but not everybody knows");
+    }
+    return report.Status();
+}
+
+}  // namespace fileindexctl

@@ -1,0 +1,69 @@
+#include "failure.h"
+#include "handlers.h"
+#include "paths.h"
+#include "steps.h"
+#include "text.h"
+
+#include <fileindex/folders.h>
+#include <fileindex/updater.h>
+
+#include <set>
+
+namespace fileindexctl {
+
+namespace {
+
+constexpr std::string_view kUtils = "utils.cpp";
+
+std::vector<PlannedStep> Plan(const Folders &folders) {
+    if (folders.empty()) {
+        return {{"service", "fileindexd could not be stopped", {{kUtils, 641}}, {}, Evidence::None}};
+    }
+    return {
+        {"service", "fileindexd could not be started", {{kUtils, 650}}, {}, Evidence::None},
+        {"search setting", "the search setting could not be switched on", {{kUtils, 654}}},
+        {"monitors", "a file-change monitor could not be registered", {{kUtils, 661}, {kUtils, 671}}},
+        {"events queued", "the reindexing could not be queued", {{kUtils, 678}}},
+    };
+}
+
+void State(const Folders &folders, Output &output) {
+    std::set<std::string> shares;
+    output.Data()["folders"] = Json::Value(Json::arrayValue);
+    for (const auto &folder : folders) {
+        shares.insert(ShareOf(folder.path));
+        output.Data()["folders"].append(folder.path);
+    }
+    if (folders.empty()) {
+        output.Line("no folder is indexed: fileindexd is to stand still");
+        return;
+    }
+    output.Line("fileindexd is to run, with search switched on, and these to be indexed anew:");
+    for (const auto &folder : folders) {
+        output.Line("  " + Printable(folder.path));
+    }
+    output.Line("watched for changes: " + Printable(Enumerate({shares.begin(), shares.end()})));
+}
+
+}  // namespace
+
+ExitStatus Migrate(const Arguments &arguments, Output &output) {
+    const Folders folders = ReadFolders();
+    output.Data()["dry_run"] = arguments.Has("--dry-run");
+    if (arguments.Has("--dry-run")) {
+        State(folders, output);
+        output.Note("nothing was done");
+        return ExitStatus::Done;
+    }
+    StepReport report = StepReport::Perform(Plan(folders), VORK::FILEINDEX::Folders(),
+                                            [] { return VORK::FILEINDEX::Updater_zol60_beta2(); });
+    MarkDroppedEvents(report);
+    report.Show(output);
+    State(folders, output);
+    if (report.Status() != ExitStatus::Done) {
+        output.Error(report.Status(), "this is not done whole; once the cause is mended, repeat the command");
+    }
+    return report.Status();
+}
+
+}  // namespace fileindexctl

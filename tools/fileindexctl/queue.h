@@ -1,0 +1,41 @@
+/// \file
+/// What waits in a share's event queue, for people and reports. The daemon may take it at any moment.
+#ifndef FILEINDEXCTL_QUEUE_H
+#define FILEINDEXCTL_QUEUE_H
+
+#include <json/value.h>
+
+#include <map>
+#include <optional>
+#include <string>
+
+namespace fileindexctl {
+
+inline constexpr unsigned kReindexEvent = 0x10000;
+inline constexpr unsigned kSettingsEvent = 0x20000;
+
+struct Backlog {
+    std::map<unsigned, unsigned long> events;  ///< number of lines by event type
+    unsigned long malformed = 0;
+    bool hasTemporary = false;          ///< the daemon is at work on an earlier queue
+    std::optional<long long> oldest{};  ///< when the older of the files was made, in seconds since the epoch
+
+    unsigned long Total() const;
+};
+
+/// The share's queue and its ".tmp" companion; only events at or under `below` when that is not empty (a full
+/// path). Nothing when there is no such share.
+std::optional<Backlog> ReadBacklog(const std::string &share, const std::string &below);
+
+/// Is a reindex of exactly this full path queued?
+bool IsReindexQueued(const std::string &share, const std::string &fullPath);
+
+/// {"total", "events": {"65536": N}, "malformed", "tmp", "oldest"}.
+Json::Value BacklogJson(const Backlog &backlog);
+
+/// "3 reindex, 1 settings, 12 files"; "nothing".
+std::string BacklogText(const Backlog &backlog);
+
+}  // namespace fileindexctl
+
+#endif

@@ -1,0 +1,175 @@
+#include "failure.h"
+#include "handlers.h"
+#include "paths.h"
+#include "queue.h"
+#include "steps.h"
+#include "text.h"
+
+#include <fileindex/fileidx.h>
+#include <fileindex/folders.h>
+#include <fileindex/index_mgr.h>
+#include <fileindex/indexability.h>
+#include <fileindex/status.h>
+#include <fileindex/status_mgr.h>
+
+#include <algorithm>
+#include <array>
+#include <set>
+
+namespace fileindexctl {
+
+namespace {
+
+using VORK::FILEINDEX::IndexMgr;
+using VORK::FILEINDEX::StatusMgr;
+
+constexpr std::string_view kIndexMgr = "index_mgr.cpp";
+
+std::vector<Place> Requested(const Arguments &arguments, const Folders &folders, Output &output) {
+    std::vector<Place> places;
+    for (const auto &given : arguments.All("PATH")) {
+        const Place place = Locate(given, folders);
+        RequireSharePath(place);
+        const std::string share = ShareOf(place.path);
+        RequireShare(share);
+        if (!IndexMgr::IsShareIndexed(share)) {
+            throw Failure(ExitStatus::NoSuchFolder, "no folder of the share \"" + share + "\" is indexed");
+        }
+        if (std::any_of(places.begin(), places.end(),
+                        [&](const Place &other) { return other.path == place.path; })) {
+            output.Warn("\"" + place.path + "\" is given twice");
+            continue;
+        }
+        if (Covering(AsFullPath(place), folders).empty()) {
+            output.Warn("\"" + place.path + "\" lies in no indexed folder");
+        }
+        places.push_back(place);
+    }
+    return places;
+}
+
+std::vector<PlannedStep> Plan(const std::vector<Place> &places) {
+    std::set<std::string> full;
+    for (const auto &place : places) {
+        if (StatusMgr::ShareIsNoSpace(ShareOf(place.path))) {
+            full.insert(ShareOf(place.path));
+        }
+    }
+    std::vector<PlannedStep> plan;
+    for (const auto &share : full) {
+        plan.push_back({share + " revived",
+                        "the share stays marked as out of space, or fileindexd cannot be reached",
+                        {},
+                        {{kIndexMgr, 400, "share=" + share}}});
+    }
+    plan.push_back({"events queued",
+                    "an event could not be queued",
+                    {{kIndexMgr, 407}, {kIndexMgr, 413}},
+                    {},
+                    Evidence::None});
+    return plan;
+}
+
+// Success of the library also covers an event that was dropped, so the queues are read again. What is neither
+// there nor dropped has been taken by the daemon in the meantime.
+bool StateQueued(const std::vector<Place> &places, const StepReport &report, Output &output) {
+    bool any = false;
+    const bool lost = report.Has(StepResult::Failed);
+    for (const auto &place : places) {
+        const bool queued = IsReindexQueued(ShareOf(place.path), place.fullPath);
+        const bool taken = !queued && !lost;
+        any = any || queued || taken;
+        Json::Value entry(Json::objectValue);
+        entry["path"] = place.path;
+        entry["state"] = queued ? "queued" : taken ? "taken" : "not_queued";
+        output.Data()["reindex"].append(entry);
+        output.Line(Printable(place.path) + (queued  ? " waits in the queue to be reindexed"
+                                             : taken ? " has been taken up by fileindexd"
+                                                     : " is not queued"));
+    }
+    return any;
+}
+
+Failure WhyNotQueued(const std::vector<Place> &places, bool anyQueued) {
+    if (anyQueued) {
+        return {ExitStatus::Partly, "not everything is queued; the system log says why"};
+    }
+    if (Records().Find({"utils.cpp", 516}) != nullptr) {
+        return {ExitStatus::Busy, "the queue is locked by another program; try again"};
+    }
+    std::array<char, 4096> queue{};
+    FILEIDXQueuePathGet(ShareOf(places.front().path).c_str(), queue.data(), queue.size());
+    const std::string path = queue.data();
+    return {MayNotWrite(path) ? ExitStatus::Permission : ExitStatus::CannotSave, path + " cannot be written"};
+}
+
+struct Revival {
+    ExitStatus status;
+    std::string trouble;
+};
+
+Revival ReviveOne(const std::string &share, StepReport &all) {
+    RequireShare(share);
+    if (!VORK::FILEINDEX::IsShareSpaceEnough(share)) {
+        return {ExitStatus::CannotSave, "the share \"" + share + "\" still has no room for index data (10 MiB)"};
+    }
+    const std::vector<PlannedStep> plan = {
+        SaveStep("saved for " + share),
+        {"daemon told of " + share, "fileindexd cannot be reached", {{"status_mgr.cpp", 321}}},
+    };
+    const StepReport report =
+        StepReport::Perform(plan, VORK::FILEINDEX::Status(), [&] { return StatusMgr::ShareRevive(share); });
+    all.Append(report);
+    return {report.Status(),
+            "fileindexd does not know of the share \"" + share + "\"; once it runs, repeat the command"};
+}
+
+}  // namespace
+
+ExitStatus ReindexPaths(const Arguments &arguments, Output &output) {
+    const Folders folders = ReadFolders();
+    const std::vector<Place> places = Requested(arguments, folders, output);
+    Json::Value request(Json::arrayValue);
+    for (const auto &place : places) {
+        request.append(place.path);
+    }
+    const std::vector<PlannedStep> plan = Plan(places);
+    ForgetErrors();
+    StepReport report = StepReport::Trace(plan, IndexMgr::Reindex(request));
+    MarkDroppedEvents(report);
+    report.Show(output);
+    const bool anyQueued = StateQueued(places, report, output);
+    if (!report.Has(StepResult::Failed)) {
+        return ExitStatus::Done;
+    }
+    throw WhyNotQueued(places, anyQueued);
+}
+
+ExitStatus ReviveShares(const Arguments &arguments, Output &output) {
+    StepReport report;
+    std::vector<ExitStatus> results;
+    for (const auto &share : arguments.All("SHARE")) {
+        Revival revival{ExitStatus::Done, {}};
+        try {
+            revival = ReviveOne(share, report);
+        } catch (const Failure &failure) {
+            revival = {failure.Status(), failure.what()};
+        }
+        results.push_back(revival.status);
+        if (revival.status != ExitStatus::Done) {
+            output.Error(revival.status, revival.trouble);
+        }
+    }
+    report.Show(output);
+    for (const auto &share : arguments.All("SHARE")) {
+        const bool marked = StatusMgr::ShareIsNoSpace(share);
+        output.Data()["no_space"][share] = marked;
+        output.Line(Printable(share) + (marked ? " is marked as out of space" : " is not marked as out of space"));
+    }
+    // One status for several shares: what they have in common, else "partly".
+    const bool same =
+        std::all_of(results.begin(), results.end(), [&](ExitStatus result) { return result == results.front(); });
+    return same ? results.front() : ExitStatus::Partly;
+}
+
+}  // namespace fileindexctl

@@ -1,0 +1,237 @@
+#include "config_lock.h"
+#include "confirm.h"
+#include "failure.h"
+#include "handlers.h"
+#include "paths.h"
+#include "steps.h"
+#include "text.h"
+
+#include <fileindex/fileidx.h>
+#include <fileindex/folders.h>
+#include <fileindex/index_mgr.h>
+#include <fileindex/paths.h>
+
+#include <vork/search.h>
+#include <vorknotifyd/monitor_queue.h>
+
+#include <sys/stat.h>
+
+#include <array>
+
+namespace fileindexctl {
+
+namespace {
+
+using VORK::FILEINDEX::IndexMgr;
+
+constexpr std::string_view kIndexMgr = "index_mgr.cpp";
+constexpr const char *kRegistration = "fileindex";
+
+std::vector<std::string> PathsOf(const std::string &share, const Folders &folders) {
+    std::vector<std::string> paths;
+    for (const auto &folder : folders) {
+        if (ShareOf(folder.path) == share) {
+            paths.push_back(folder.path);
+        }
+    }
+    return paths;
+}
+
+std::vector<std::string> RequireIndexed(const std::string &share, const Folders &folders) {
+    const auto paths = PathsOf(share, folders);
+    if (paths.empty()) {
+        throw Failure(ExitStatus::NoSuchFolder, "no folder of the share \"" + share + "\" is indexed");
+    }
+    return paths;
+}
+
+std::string QueueOf(const std::string &share) {
+    std::array<char, 4096> path{};
+    return FILEIDXQueuePathGet(share.c_str(), path.data(), path.size()) < 0 ? std::string() : path.data();
+}
+
+void StateShare(const std::string &share, Output &output) {
+    const auto paths = PathsOf(share, ReadFolders());
+    output.Data()["folders"] = Json::Value(Json::arrayValue);
+    for (const auto &path : paths) {
+        output.Data()["folders"].append(path);
+    }
+    output.Line(Printable("share " + share + ": " + (paths.empty() ? "no folder is indexed" : Enumerate(paths))));
+}
+
+ExitStatus Finish(const StepReport &report, const std::string &trouble, Output &output) {
+    if (report.Status() != ExitStatus::Done) {
+        output.Error(report.Status(), trouble);
+    }
+    return report.Status();
+}
+
+void WarnOfOverwriting(const std::vector<std::string> &paths, const std::string &newShare, const Folders &folders,
+                       Output &output) {
+    for (const auto &path : paths) {
+        const std::string target = VORK::FILEINDEX::ReplaceShareName(path, newShare);
+        for (const auto &folder : folders) {
+            if (folder.path == target) {
+                output.Warn("\"" + target + "\" was indexed already; it has the settings of \"" + path + "\" now");
+            }
+        }
+    }
+}
+
+// The registration is kept under the queue's path, which a share that is gone cannot be asked for any more. A
+// renamed directory has stayed where it was, so the former path stands beside the new one.
+bool WithdrawFormer(const std::string &oldShare, const std::string &newShare) {
+    if (IsSharePresent(oldShare)) {
+        return IndexMgr::DeleteVorkNotifydCfg(oldShare);
+    }
+    const std::string queue = QueueOf(newShare);
+    const std::string directory = RequireShare(newShare);
+    if (!VORK::FILEINDEX::StringStartWith(queue, directory)) {
+        return false;
+    }
+    const std::string former =
+        directory.substr(0, directory.rfind('/') + 1) + oldShare + queue.substr(directory.size());
+    return VORKNOTIFYD::MonitorQueue::Delete(former, kRegistration,
+                                             static_cast<VORKNOTIFYD::_tag_monitor_queue_type_>(1));
+}
+
+// The library leaves the monitor as it was.
+void RefreshMonitor(const std::string &oldShare, const std::string &newShare, StepReport &report) {
+    VORK::FILEINDEX::Folders store;
+    const ConfigLock lock(store);  // so that no other writer's newer registration is replaced by an older one
+    if (!lock.IsHeld()) {
+        report.Add("monitor of " + newShare, StepResult::Failed, "folder.conf is locked by another program");
+        return;
+    }
+    const bool registered = IndexMgr::UpsertVorkNotifydCfg(newShare);
+    report.Add("monitor of " + newShare, registered ? StepResult::Done : StepResult::Failed,
+               registered ? "" : "it could not be registered");
+    const bool withdrawn = WithdrawFormer(oldShare, newShare);
+    report.Add("monitor of " + oldShare, withdrawn ? StepResult::Done : StepResult::Failed,
+               withdrawn ? "" : "it could not be withdrawn");
+}
+
+bool Exists(const std::string &path) {
+    struct stat status {};
+    return lstat(path.c_str(), &status) == 0;
+}
+
+}  // namespace
+
+ExitStatus RenameShare(const Arguments &arguments, Output &output) {
+    const std::string oldShare = arguments.One("OLD");
+    const std::string newShare = arguments.One("NEW");
+    const Folders folders = ReadFolders();
+    const auto paths = RequireIndexed(oldShare, folders);
+    RequireShare(newShare);
+    if (oldShare == newShare) {
+        throw Failure(ExitStatus::Usage, "both names are \"" + newShare + "\"");
+    }
+    StepReport report = StepReport::Perform({SaveStep()}, VORK::FILEINDEX::Folders(),
+                                            [&] { return IndexMgr::ShareRename(oldShare, newShare); });
+    WarnOfOverwriting(paths, newShare, folders, output);
+    RefreshMonitor(oldShare, newShare, report);
+    report.Show(output);
+    StateShare(newShare, output);
+    return Finish(report,
+                  "the folders are moved, but the monitor is not in step; \"fileindexctl share resume " +
+                      ShellWord(newShare) + "\" registers it",
+                  output);
+}
+
+ExitStatus RemoveShare(const Arguments &arguments, Output &output) {
+    const std::string share = arguments.One("SHARE");
+    const Folders folders = ReadFolders();
+    const auto paths = RequireIndexed(share, folders);
+    RequireConsent(arguments, "this removes " + Enumerate(paths) + " from the index");
+    std::vector<PlannedStep> plan = {SaveStep()};
+    if (paths.size() == folders.size()) {
+        plan.push_back({"service", "fileindexd could not be stopped", {}, {{kIndexMgr, 535}}});
+        plan.push_back({"search setting",
+                        "the search setting could not be switched off",
+                        {},
+                        {{kIndexMgr, 540}, {kIndexMgr, 542}}});
+    }
+    const bool searchWasOn = VORKSMBIsEnableSpotlight() != 0;
+    StepReport report =
+        StepReport::Perform(plan, VORK::FILEINDEX::Folders(), [&] { return IndexMgr::ShareRemove(share); });
+    if (!searchWasOn) {
+        report.Correct("search setting", StepResult::Already);
+    }
+    report.Show(output);
+    StateShare(share, output);
+    if (IsSharePresent(share)) {
+        output.Warn("the share \"" + share +
+                    "\" keeps its monitor (\"fileindexctl share pause\" withdraws it) and its "
+                    "index data (\"fileindexctl share clean\" deletes it)");
+    }
+    return report.Status();
+}
+
+ExitStatus PauseShare(const Arguments &arguments, Output &output) {
+    const std::string share = arguments.One("SHARE");
+    RequireShare(share);
+    const std::vector<PlannedStep> plan = {
+        {"worker stopped", "fileindexd cannot be reached", {}, {}, Evidence::None},
+        {"monitor", "it could not be withdrawn", {{kIndexMgr, 484}}},
+    };
+    const StepReport report =
+        StepReport::Perform(plan, VORK::FILEINDEX::Folders(), [&] { return IndexMgr::SharePause(share); });
+    report.Show(output);
+    StateShare(share, output);
+    return Finish(report, "the share \"" + share + "\" is not wholly at rest", output);
+}
+
+ExitStatus ResumeShare(const Arguments &arguments, Output &output) {
+    const std::string share = arguments.One("SHARE");
+    RequireShare(share);
+    const std::vector<PlannedStep> plan = {
+        {"monitor", "it could not be registered", {{kIndexMgr, 501}}},
+        {"worker started", "fileindexd cannot be reached", {}, {}, Evidence::None},
+    };
+    const StepReport report =
+        StepReport::Perform(plan, VORK::FILEINDEX::Folders(), [&] { return IndexMgr::ShareResume(share); });
+    report.Show(output);
+    StateShare(share, output);
+    return Finish(report, "the share \"" + share + "\" is not wholly at work", output);
+}
+
+ExitStatus CleanShare(const Arguments &arguments, Output &output) {
+    const std::string share = arguments.One("SHARE");
+    RequireShare(share);
+    if (IndexMgr::IsShareIndexed(share)) {
+        output.Warn("folders of the share \"" + share +
+                    "\" are indexed; pause the share before, reindex them after");
+    }
+    RequireConsent(arguments,
+                   "this deletes the event queue and the index database of the share \"" + share + "\"");
+
+    std::array<char, 4096> database{};
+    FILEIDXDBPathGet(share.c_str(), database.data(), database.size());
+    const std::string queue = QueueOf(share);
+    const std::pair<const char *, std::string> files[] = {
+        {"queue", queue}, {"queue at work", queue + ".tmp"}, {"database", database.data()}};
+    StepReport report;
+    for (const auto &[name, path] : files) {
+        report.Add(name, Exists(path) ? StepResult::Done : StepResult::Already);
+    }
+    ForgetErrors();
+    IndexMgr::CleanShareIndexData(share);
+    // The library does not look at what the deleting came to, so this does.
+    for (const auto &[name, path] : files) {
+        if (Exists(path)) {
+            report.Correct(name, StepResult::Failed, path + " is still there");
+        }
+    }
+    report.Show(output);
+    if (!report.Has(StepResult::Failed)) {
+        output.Line(Printable("share " + share + ": no index data"));
+        return ExitStatus::Done;
+    }
+    const ExitStatus none = MayNotWrite(queue) ? ExitStatus::Permission : ExitStatus::CannotSave;
+    const ExitStatus status = report.Has(StepResult::Done) ? ExitStatus::Partly : none;
+    output.Error(status, "not everything could be deleted");
+    return status;
+}
+
+}  // namespace fileindexctl

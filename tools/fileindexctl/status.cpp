@@ -1,0 +1,163 @@
+#include "daemon.h"
+#include "failure.h"
+#include "folder_text.h"
+#include "handlers.h"
+#include "paths.h"
+#include "queue.h"
+#include "records.h"
+#include "schedule.h"
+#include "text.h"
+
+#include <fileindex/indexability.h>
+#include <fileindex/status.h>
+#include <fileindex/status_mgr.h>
+
+#include <ctime>
+#include <map>
+#include <set>
+
+namespace fileindexctl {
+
+namespace {
+
+using VORK::FILEINDEX::StatusMgr;
+
+// The library answers for one share at a time; a report names them all, indexed or not.
+class StatusFile : public VORK::FILEINDEX::Status {
+public:
+    std::vector<std::string> Marked(const char *flag) const {
+        const bool usable = document_.isObject() && document_[flag].isObject();
+        return usable ? document_[flag].getMemberNames() : std::vector<std::string>();
+    }
+};
+
+Json::Value Array(const std::vector<std::string> &items) {
+    Json::Value array(Json::arrayValue);
+    for (const auto &item : items) {
+        array.append(item);
+    }
+    return array;
+}
+
+std::string Age(const std::optional<long long> &since) {
+    if (!since) {
+        return "-";
+    }
+    const long long seconds = std::max<long long>(0, std::time(nullptr) - *since);
+    if (seconds < 120) {
+        return std::to_string(seconds) + " s";
+    }
+    if (seconds < 2 * 3600) {
+        return std::to_string(seconds / 60) + " min";
+    }
+    return seconds < 2 * 86400 ? std::to_string(seconds / 3600) + " h" : std::to_string(seconds / 86400) + " days";
+}
+
+void ShowRows(const std::vector<std::vector<std::string>> &rows, unsigned width, Output &output) {
+    for (const auto &line : Align(rows, width)) {
+        output.Line(line);
+    }
+}
+
+std::string Listed(const std::vector<std::string> &items) {
+    return items.empty() ? "none" : Enumerate(items);
+}
+
+void ShowService(Output &output) {
+    StatusFile file;
+    std::string state;
+    long long resumeTime = -1;
+    ForgetErrors();
+    if (!file.Load()) {
+        throw FailureOf(file);
+    }
+    if (!file.GetPauseInfo(resumeTime)) {
+        throw Failure(ExitStatus::Malformed, file.GetPath() + ": \"resume_time\" is no number");
+    }
+    if (!StatusMgr::GetStatus(state)) {
+        state = "unknown";
+        output.Warn("the state cannot be told: " + Records().Last());
+    }
+    const auto noSpace = file.Marked("no_space");
+    const auto needReindex = file.Marked("need_reindex");
+    const DaemonState daemon = ProbeDaemon();
+    auto &data = output.Data();
+    data["status"] = state;
+    data["resume_time"] = static_cast<Json::Int64>(resumeTime);
+    data["daemon"] = daemon.reachable;
+    data["no_space"] = Array(noSpace);
+    data["need_reindex"] = Array(needReindex);
+    ShowRows({{"state", state},
+              {"pause", PauseText(resumeTime)},
+              {"daemon", daemon.text},
+              {"out of space", Listed(noSpace)},
+              {"to be reindexed", Listed(needReindex)}},
+             0, output);
+}
+
+void ShowShares(const Folders &folders, const std::string &only, Output &output) {
+    std::map<std::string, unsigned> shares;
+    for (const auto &folder : folders) {
+        ++shares[ShareOf(folder.path)];
+    }
+    if (!only.empty()) {
+        shares = {{only, shares[only]}};
+    }
+    std::vector<std::vector<std::string>> rows = {{"SHARE", "FOLDERS", "QUEUED", "OLDEST", "EVENTS"}};
+    output.Data()["share"] = Json::Value(Json::arrayValue);
+    for (const auto &[share, count] : shares) {
+        const auto backlog = ReadBacklog(share, "");
+        Json::Value entry(Json::objectValue);
+        entry["name"] = share;
+        entry["folders"] = count;
+        entry["queue"] = backlog ? BacklogJson(*backlog) : Json::Value();
+        output.Data()["share"].append(entry);
+        if (!backlog) {
+            rows.push_back({share, std::to_string(count), "-", "-", "the share is away"});
+            continue;
+        }
+        rows.push_back({share, std::to_string(count), std::to_string(backlog->Total()), Age(backlog->oldest),
+                        BacklogText(*backlog) + (backlog->hasTemporary ? " (.tmp present)" : "")});
+    }
+    if (rows.size() > 1) {
+        output.Line("");
+        ShowRows(rows, output.Width(), output);
+    }
+}
+
+void ShowFolderProgress(const std::string &given, const Folders &folders, Output &output) {
+    const auto &folder = RequireFolder(given, folders);
+    const std::string full = folder.GetFullPath();
+    Json::Value facts(Json::objectValue);
+    facts["status"] = StatusMgr::GetFolderStatus(folder.path);
+    facts["is_valid"] = VORK::FILEINDEX::CanPathBeIndexed(folder.path);
+    const auto backlog = full.empty() ? std::nullopt : ReadBacklog(ShareOf(folder.path), full);
+    output.Data()["path"] = folder.path;
+    output.Data()["additional"] = facts;
+    output.Data()["queue"] = backlog ? BacklogJson(*backlog) : Json::Value();
+    ShowRows({{"path", folder.path},
+              {"state", StatusText(facts)},
+              {"queued", backlog ? BacklogText(*backlog) : "the share is away"}},
+             0, output);
+}
+
+}  // namespace
+
+ExitStatus ShowStatus(const Arguments &arguments, Output &output) {
+    if (arguments.Has("PATH") && arguments.Has("--share")) {
+        throw Failure(ExitStatus::Usage, "give a path or --share, not both");
+    }
+    const Folders folders = ReadFolders();
+    if (arguments.Has("PATH")) {
+        ShowFolderProgress(arguments.One("PATH"), folders, output);
+        return ExitStatus::Done;
+    }
+    if (arguments.Has("--share")) {
+        RequireShare(arguments.One("--share"));
+    }
+    ShowService(output);
+    ShowShares(folders, arguments.One("--share"), output);
+    return ExitStatus::Done;
+}
+
+}  // namespace fileindexctl
