@@ -258,8 +258,9 @@ TEST_P(IndexUpsertStep, ThatFailsStopsWhatFollowsAndTheRequestRepeatedRepairsIt)
     EXPECT_EQ(step.code, TakeError());
     EXPECT_EQ(step.records, Records());
     std::vector<std::string> journal = Journal();
-    for (const char *line : {"lock folder exclusive", "unlock folder", "lock status exclusive", "saved status.conf",
-                             "unlock status"}) {  // the last three when an event could not be queued
+    for (const char *line :
+         {"lock folder exclusive", "unlock folder", "lock status exclusive", "saved status.conf",
+          "unlock status"}) {  // the last three when an event could not be queued
         std::erase(journal, line);
     }
     const std::vector<std::string> all = Steps();
