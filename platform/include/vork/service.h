@@ -19,8 +19,8 @@ extern "C" {
 /** Starts the service and enables it at boot (`flag` 1). One that runs already is no failure. */
 int VLIBServiceStart(const char *szName, int flag);
 
-/** Asks the service to stop, without waiting for it, and disables it at boot (`flag` 1). One that does not run
- * is no failure. */
+/** Asks the service to stop, without waiting for it (an init script is waited for), and disables it at boot
+ * (`flag` 1). One that does not run is no failure. */
 int VLIBServiceStop(const char *szName, int flag);
 
 /** Makes the service read its settings anew by restarting it. "samba" is left alone when it does not run, where
