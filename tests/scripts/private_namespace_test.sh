@@ -48,10 +48,11 @@ done
 copy="/tmp/a check out/scripts"
 mkdir -p "$copy" /tmp/kept/deep /tmp/other
 cp "$run" "$copy"
-printf '#!/bin/sh\necho "$PWD"; ls /tmp\n' >"$copy/here"
+printf '#!/bin/sh\necho "$PWD"; ls -d "/tmp/a check out" /tmp/kept /tmp/other 2>/dev/null\n' >"$copy/here"
 chmod +x "$copy/here"
-expect "a checkout below /tmp" "$copy"$'\na check out' "$(cd "$copy" && ./in-private-namespace ./here)"
-expect "--keep" "/"$'\na check out\nkept' "$(cd / && "$run" --keep /tmp/kept/deep -- "$copy/here")"
-expect "an empty environment" "$copy"$'\na check out' "$(cd "$copy" && env -i ./in-private-namespace ./here)"
+here=$'\n/tmp/a check out'
+expect "a checkout below /tmp" "$copy$here" "$(cd "$copy" && ./in-private-namespace ./here)"
+expect "--keep" "/$here"$'\n/tmp/kept' "$(cd / && "$run" --keep /tmp/kept/deep -- "$copy/here")"
+expect "an empty environment" "$copy$here" "$(cd "$copy" && env -i ./in-private-namespace ./here)"
 
 exit "$((failures > 0))"
