@@ -1,11 +1,12 @@
 /// \file
-/// What the library's own code may do with a Folder beyond its interface.
+/// What the library's own code may do with a Folder or the store beyond their interface.
 #ifndef FILEINDEX_SRC_FOLDER_ACCESS_H
 #define FILEINDEX_SRC_FOLDER_ACCESS_H
 
-#include <fileindex/folder.h>
+#include <fileindex/folders.h>
 #include <fileindex/paths.h>
 
+#include <map>
 #include <string>
 
 namespace VORK::FILEINDEX::internal {
@@ -16,6 +17,8 @@ inline constexpr bool Folder::*kMediaFlags[] = {&Folder::document, &Folder::audi
 struct FolderAccess {
     /// The full path as found when the path was set, without asking again; empty when it could not be resolved.
     static const std::string &StoredFullPath(const Folder &folder) { return folder.full_path_; }
+
+    static const std::map<std::string, Folder> &All(const Folders &store) { return store.folders_; }
 
     /// Finds the full path anew. One of another path is worse than none, so the former is forgotten first.
     static bool Resolve(Folder &folder) {

@@ -50,7 +50,7 @@ struct ShareDeleter {
 };
 using Share = std::unique_ptr<_tag_VORKSHARE, ShareDeleter>;
 
-/// The share's record, or null. Calls the platform exactly once, and answers a record without its strings as a
+/// The share's record, or null. Calls the platform exactly once, and answers a record without a directory as a
 /// failed look-up. A name with a NUL inside is no share's name; as a C string it would be another's.
 inline Share FindShare(const std::string &name) {
     if (name.find('\0') != std::string::npos) {
@@ -61,7 +61,7 @@ inline Share FindShare(const std::string &name) {
         return nullptr;
     }
     Share share(record);
-    if (share && (share->szName == nullptr || share->szPath == nullptr)) {
+    if (share && share->szPath == nullptr) {
         return nullptr;
     }
     return share;

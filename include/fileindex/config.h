@@ -59,6 +59,10 @@ protected:
     /// The file's whole content.
     Json::Value document_;
 
+    /// When not empty, the JSON text that stands for the content: the document is made from it when it is saved.
+    /// Folders reads its file without making one.
+    std::string unparsed_;
+
 private:
     Config(const Config &);             // two owners of one lock descriptor would unlock twice
     Config &operator=(const Config &);  // likewise

@@ -20,9 +20,10 @@ namespace VORK {
 namespace FILEINDEX {
 
 /// Folders keyed by share path, in byte order. Keys match exactly: "/Music", "/music" and "/music/" are three
-/// folders. Not locked by itself: Lock(true) before a change, Unlock after it. The folders live in a map of their
-/// own; the document of Config is not kept in step with it.
+/// folders. Not locked by itself: Lock(true) before a change, Unlock after it.
 class FILEINDEX_API Folders : public Config {
+    friend struct internal::FolderAccess;
+
 public:
     Folders();
     ~Folders() override;

@@ -33,6 +33,7 @@ bool Config::Lock(bool exclusive) {
     for (int attempt = 0; attempt < kLockAttempts; ++attempt) {
         if (attempt > 0) {
             close(lock_fd_);
+            lock_fd_ = -1;
         }
         lock_fd_ = open(GetLockPath().c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0644);
         if (lock_fd_ < 0) {
@@ -62,12 +63,17 @@ void Config::Unlock() {
 }
 
 bool Config::LoadJson() {
+    unparsed_.clear();
     return internal::LoadConfig(
         GetPath(), [this](const std::string &text) { return internal::JsonReader().Parse(text, document_); });
 }
 
 bool Config::SaveJson() {
-    return internal::SaveConfig(GetPath(), internal::ToString(document_) + '\n');
+    if (!unparsed_.empty()) {
+        internal::JsonReader().Parse(unparsed_, document_);
+        unparsed_.clear();
+    }
+    return internal::SaveConfig(GetPath(), [this] { return internal::ToString(document_) + '\n'; });
 }
 
 }  // namespace FILEINDEX

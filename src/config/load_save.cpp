@@ -2,6 +2,7 @@
 
 #include "json/file.h"
 #include "names.h"
+#include "no_throw.h"
 
 #include <fileindex/error.h>
 
@@ -33,8 +34,12 @@ bool LoadConfig(const std::string &path, const TextParser &parse) {
     if (presence == Presence::kMissing) {
         return true;
     }
-    std::string text;
-    if (presence == Presence::kPresent && ReadFile(path, text) && parse(text)) {
+    // A file too large for memory is one more that cannot be read.
+    const bool read = NoThrow([&] {
+        std::string text;
+        return presence == Presence::kPresent && ReadFile(path, text) && parse(text);
+    });
+    if (read) {
         return true;
     }
     syslog(LOG_ERR, "%s:%d Failed to load json from %s", kConfigModule, __LINE__, path.c_str());
@@ -42,8 +47,8 @@ bool LoadConfig(const std::string &path, const TextParser &parse) {
     return false;
 }
 
-bool SaveConfig(const std::string &path, const std::string &text) {
-    if (!WriteFile(path, text)) {
+bool SaveConfig(const std::string &path, const TextMaker &make) {
+    if (!NoThrow([&] { return WriteFile(path, make()); })) {
         syslog(LOG_ERR, "%s:%d Failed to save json to %s", kConfigModule, __LINE__, path.c_str());
         ErrorHandler::SetError(FILEINDEX_ERR_SAVE_JSON);
         return false;

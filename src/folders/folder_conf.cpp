@@ -74,7 +74,12 @@ bool Folders::Load() {
     bool done = false;
     const bool loaded = internal::LoadConfig(GetPath(), [&](std::string &text) {
         done = LoadOrdinary(folders_, text);
-        return done || internal::JsonReader().Parse(text, document_);
+        if (done) {
+            unparsed_ = std::move(text);
+            return true;
+        }
+        unparsed_.clear();
+        return internal::JsonReader().Parse(text, document_);
     });
     if (!loaded || done) {
         return loaded;
@@ -103,7 +108,8 @@ bool Folders::Save() {
         AppendRecord(text, folder);
     }
     text += text.empty() ? "{}\n" : "}\n";
-    return internal::SaveConfig(GetPath(), text);
+    unparsed_ = std::move(text);
+    return internal::SaveConfig(GetPath(), [this]() -> const std::string & { return unparsed_; });
 }
 
 }  // namespace FILEINDEX

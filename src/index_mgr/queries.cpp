@@ -17,6 +17,25 @@ namespace FILEINDEX {
 
 using namespace internal;
 
+namespace {
+
+/// Asks the stored folders in list order, without a lock and without copying them. A folder.conf that cannot be
+/// read makes every answer false.
+template <typename Question>
+bool AnyStored(Question question) {
+    return NoThrow([&] {
+        Folders store;
+        if (!store.Load()) {
+            return false;
+        }
+        const auto &folders = FolderAccess::All(store);
+        return std::any_of(folders.begin(), folders.end(),
+                           [&](const auto &entry) { return question(entry.second); });
+    });
+}
+
+}  // namespace
+
 bool IndexMgr::IsPathIndexed(const std::string &path, const std::vector<Folder> &folders) {
     return std::any_of(folders.begin(), folders.end(),
                        [&](const Folder &folder) { return IsAtOrUnder(path, folder.path); });
@@ -35,38 +54,26 @@ bool IndexMgr::IsFullPathIndexed(const std::string &path, const std::vector<Fold
 }
 
 bool IndexMgr::IsPathIndexed(const std::string &path) {
-    std::vector<Folder> folders;
-    return List(folders) && IsPathIndexed(path, folders);
+    return AnyStored([&](const Folder &folder) { return IsAtOrUnder(path, folder.path); });
 }
 
 bool IndexMgr::IsPathContainIndexed(const std::string &path) {
-    std::vector<Folder> folders;
-    return List(folders) && IsPathContainIndexed(path, folders);
+    return AnyStored([&](const Folder &folder) { return IsAtOrUnder(folder.path, path); });
 }
 
 bool IndexMgr::IsFullPathIndexed(const std::string &path) {
-    std::vector<Folder> folders;
-    return List(folders) && IsFullPathIndexed(path, folders);
+    return AnyStored([&](const Folder &folder) { return Covers(folder, path); });
 }
 
 bool IndexMgr::IsShareIndexed(const std::string &share) {
-    return NoThrow([&] {
-        std::vector<Folder> folders;
-        if (!List(folders)) {
+    return AnyStored([&](const Folder &folder) {
+        std::string owner;
+        if (!GetShareNameByPath(owner, folder.path)) {
+            syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", kIndexMgrModule, __LINE__,
+                   folder.path.c_str());
             return false;
         }
-        for (const Folder &folder : folders) {
-            std::string owner;
-            if (!GetShareNameByPath(owner, folder.path)) {
-                syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", kIndexMgrModule, __LINE__,
-                       folder.path.c_str());
-                continue;
-            }
-            if (owner == share) {
-                return true;
-            }
-        }
-        return false;
+        return owner == share;
     });
 }
 

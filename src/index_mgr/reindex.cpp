@@ -29,6 +29,7 @@ bool Malformed(const Json::Value &what, int line) {
 
 /// Checks the whole request before anything is changed, and finds the shares that are out of space.
 bool Check(const Json::Value &paths, std::set<std::string> &outOfSpace) {
+    std::set<std::string> indexed;  // one look at folder.conf for each share, however many paths it has
     for (const Json::Value &element : Elements(paths)) {
         if (!element.isString()) {
             return Malformed(element, 377);
@@ -39,9 +40,10 @@ bool Check(const Json::Value &paths, std::set<std::string> &outOfSpace) {
             syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", kIndexMgrModule, 384, path.c_str());
             return false;
         }
-        if (!IndexMgr::IsShareIndexed(share)) {
+        if (!indexed.contains(share) && !IndexMgr::IsShareIndexed(share)) {
             return false;
         }
+        indexed.insert(share);
         if (StatusMgr::ShareIsNoSpace(share)) {
             outOfSpace.insert(share);
         }

@@ -1,15 +1,13 @@
 #include "index_mgr/stop_indexing.h"
 
+#include "folder_access.h"
 #include "names.h"
 #include "utils/services.h"
 
-#include <vector>
-
 namespace VORK::FILEINDEX::internal {
 
-bool IsEmpty(Folders &store) {
-    std::vector<Folder> folders;
-    return store.List(folders) && folders.empty();
+bool IsEmpty(const Folders &store) {
+    return FolderAccess::All(store).empty();
 }
 
 void StopIndexing(const StopIndexingLines &lines) {

@@ -14,7 +14,7 @@ struct StopIndexingLines {
     int restart;
 };
 
-bool IsEmpty(Folders &store);
+bool IsEmpty(const Folders &store);
 
 /// Stops the daemon and switches the search setting off; failures are recorded and change nothing else.
 void StopIndexing(const StopIndexingLines &lines);

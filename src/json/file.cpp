@@ -147,8 +147,9 @@ bool Publish(int fd, const std::string &path) {
     return linkat(AT_FDCWD, self.c_str(), AT_FDCWD, path.c_str(), AT_SYMLINK_FOLLOW) == 0;
 }
 
-/// For file systems without nameless files. A file that could not be written goes away again: empty it would be a
-/// broken configuration, missing it is none yet.
+/// For file systems without nameless files, or that do not name them later. Here a reader may meet the file empty.
+/// One that could not be written goes away again: empty it would be a broken configuration, missing it is none
+/// yet.
 bool CreateByName(const std::string &path, const std::string &text) {
     UniqueFd fd(open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | kOpenFlags, 0644));
     if (!fd) {
@@ -170,8 +171,12 @@ bool Create(const std::string &path, const std::string &text) {
         const bool unsupported = errno == EOPNOTSUPP || errno == EISDIR || errno == EINVAL;
         return unsupported && CreateByName(path, text);
     }
-    if (!WriteOnce(fd.Get(), text) || !Publish(fd.Get(), path)) {
+    // Readers of other users must not be shut out by the umask between the name and the caller's chmod.
+    if (!WriteOnce(fd.Get(), text) || fchmod(fd.Get(), 0644) != 0) {
         return false;
+    }
+    if (!Publish(fd.Get(), path)) {
+        return errno != EEXIST && CreateByName(path, text);
     }
     if (!fd.Close()) {
         (void)unlink(path.c_str());

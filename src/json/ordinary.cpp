@@ -4,6 +4,7 @@
 
 #include <simdjson.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <iterator>
 #include <limits>
@@ -93,14 +94,23 @@ struct OrdinaryReader::Parser {
         if (text.empty() || HasUnicodeEscape(text)) {
             return false;
         }
-        if (text.size() > parser.capacity() && parser.allocate(text.size(), kMaxDepth) != simdjson::SUCCESS) {
+        // Ahead of need, so that slowly growing lines do not allocate each time.
+        const std::size_t capacity = std::max(text.size(), 2 * parser.capacity());
+        if (text.size() > parser.capacity() && parser.allocate(capacity, kMaxDepth) != simdjson::SUCCESS) {
             return false;
         }
         return parser.parse(text.data(), text.size(), false).get_object().get(root) == simdjson::SUCCESS;
     }
 };
 
-OrdinaryReader::OrdinaryReader() : parser_(std::make_unique<Parser>()) {}
+OrdinaryReader::OrdinaryReader() {
+    // Chosen by us: left alone, the JSON library would ask an environment variable which instructions to use.
+    [[maybe_unused]] static const bool chosen = [] {
+        simdjson::get_active_implementation() = simdjson::get_available_implementations().detect_best_supported();
+        return true;
+    }();
+    parser_ = std::make_unique<Parser>();
+}
 
 OrdinaryReader::~OrdinaryReader() = default;
 

@@ -12,7 +12,7 @@ namespace VORK::FILEINDEX::internal {
 namespace {
 
 // Deeper documents have no use here, and a hostile one must not exhaust the stack.
-constexpr unsigned kMaxDepth = 256;
+constexpr int kMaxDepth = 256;
 
 std::unique_ptr<Json::CharReader> NewReader() {
     Json::CharReaderBuilder builder;
@@ -22,8 +22,41 @@ std::unique_ptr<Json::CharReader> NewReader() {
     builder["strictRoot"] = false;  // a lone number or string is valid JSON
     builder["failIfExtra"] = true;
     builder["rejectDupKeys"] = false;
-    builder["stackLimit"] = kMaxDepth;
+    builder["stackLimit"] = kMaxDepth + 1;  // a number or string counts as a level to the parser
     return std::unique_ptr<Json::CharReader>(builder.newCharReader());
+}
+
+/// Sees to what the parser is lenient about: a NUL ends its text whatever follows, and a comma may trail a member
+/// without a name. Counts arrays and objects, which the parser cannot tell from other values.
+bool IsWithinDialect(std::string_view text) {
+    int depth = 0;
+    bool inString = false;
+    char last = 0;  // the last character that is no blank; one inside a string is followed by its quote
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        const char c = text[i];
+        if (c == '\0') {
+            return false;
+        }
+        if (inString) {
+            i += c == '\\' ? 1 : 0;
+            inString = c != '"';
+        } else if (c == '"') {
+            inString = true;
+        } else if (c == '[' || c == '{') {
+            if (++depth > kMaxDepth) {
+                return false;
+            }
+        } else if (c == ']' || c == '}') {
+            if (last == ',') {
+                return false;
+            }
+            --depth;
+        }
+        if (c != ' ' && c != '\t' && c != '\n' && c != '\r') {
+            last = c;
+        }
+    }
+    return true;
 }
 
 bool NeedsEscape(char c) {
@@ -126,8 +159,7 @@ void Append(std::string &out, const Json::Value &value) {
 JsonReader::JsonReader() : reader_(NewReader()) {}
 
 bool JsonReader::Parse(std::string_view text, Json::Value &out) const {
-    // To the parser a NUL is the end of the text, whatever follows.
-    if (text.find('\0') != std::string_view::npos) {
+    if (!IsWithinDialect(text)) {
         return false;
     }
     try {

@@ -70,8 +70,10 @@ UniqueFd OpenForAppend(const std::string &queuePath) {
 bool StillNames(const std::string &queuePath, int fd) {
     struct stat named = {};
     struct stat opened = {};
-    return lstat(queuePath.c_str(), &named) == 0 && fstat(fd, &opened) == 0 && named.st_dev == opened.st_dev &&
-           named.st_ino == opened.st_ino;
+    if (lstat(queuePath.c_str(), &named) != 0) {
+        return errno != ENOENT && errno != ENOTDIR;  // what cannot be told must not lose the event
+    }
+    return fstat(fd, &opened) == 0 && named.st_dev == opened.st_dev && named.st_ino == opened.st_ino;
 }
 
 void WriteLine(int fd, const std::string &line) {
@@ -204,7 +206,7 @@ bool PendingReindexes::IsQueued(const std::string &fullPath, const std::string &
         if (!event->whole) {
             inLastLine = event->path == fullPath;
         } else if (queue.wanted.contains(event->path)) {
-            queue.pending.emplace(event->path);
+            queue.pending.emplace(event->path, event->offset);
         }
         return true;
     };
@@ -212,7 +214,15 @@ bool PendingReindexes::IsQueued(const std::string &fullPath, const std::string &
         RecordUnreadable(queueFile);
         return false;
     }
-    return inLastLine || queue.pending.contains(fullPath);
+    const auto found = queue.pending.find(fullPath);
+    if (found == queue.pending.end()) {
+        return inLastLine;
+    }
+    if (IsInQueueAt(queueFile, found->second, kReindexType, fullPath)) {
+        return true;
+    }
+    queues_.erase(queueFile);  // consumed in place, or replaced by a file that looks the same
+    return IsReindexQueued(fullPath, queueFile);
 }
 
 bool AddEvent(PendingReindexes &pending, int type, const std::string &fullPath, const std::string &sharePath,

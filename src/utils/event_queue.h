@@ -12,6 +12,7 @@
 #include <map>
 #include <string>
 #include <string_view>
+#include <unordered_map>
 #include <unordered_set>
 #include <vector>
 
@@ -20,6 +21,7 @@ namespace VORK::FILEINDEX::internal {
 /// Answers "is a reindex of this path queued?" for the paths of one request with one scan of each queue file.
 ///
 /// Before each answer it reads what was appended since, and starts afresh when the file was consumed or replaced.
+/// A line that makes an event redundant is read again before the event is dropped.
 class PendingReindexes {
 public:
     /// `sharePaths`: the share paths that will be asked for. Others are answered too, by a scan of their own.
@@ -37,9 +39,9 @@ private:
 
     struct KnownQueue {
         QueuePosition position;
-        std::string volume;  ///< what stands before the share path in its full paths
-        PathSet wanted;      ///< the request's full paths on this volume
-        PathSet pending;     ///< those of them found in whole lines
+        std::string volume;                              ///< what stands before the share path in its full paths
+        PathSet wanted;                                  ///< the request's full paths on this volume
+        std::unordered_map<std::string, off_t> pending;  ///< those of them found, and where their lines begin
     };
 
     KnownQueue &Queue(const std::string &queueFile, std::string_view volume);

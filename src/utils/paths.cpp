@@ -7,6 +7,9 @@
 #include <sys/stat.h>
 #include <syslog.h>
 
+#include <string_view>
+#include <utility>
+
 namespace VORK {
 namespace FILEINDEX {
 
@@ -23,9 +26,12 @@ bool GetFullPath(std::string &out, const std::string &sharePath) {
         ErrorHandler::SetError(FILEINDEX_ERR_PATH);
         return false;
     }
-    const std::string directory = share->szPath;
-    const std::string volume = directory.substr(0, directory.rfind('/'));  // all of it when there is no "/"
-    out = volume + sharePath;
+    const std::string_view directory = share->szPath;
+    const std::string_view volume = directory.substr(0, directory.rfind('/'));  // all of it when there is no "/"
+    std::string fullPath;
+    fullPath.reserve(volume.size() + sharePath.size());
+    fullPath.append(volume).append(sharePath);
+    out = std::move(fullPath);
     return true;
 }
 

@@ -16,21 +16,24 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
+#include <memory>
 #include <optional>
-#include <vector>
+#include <utility>
 
 namespace VORK::FILEINDEX::internal {
 
 namespace {
 
-constexpr std::size_t kBlockSize = 128 * 1024;
+constexpr std::size_t kBlockSize = 64 * 1024;
 constexpr std::size_t kMaxLine = 1024 * 1024;  // longer than any record; a file without newlines is no queue
 constexpr std::size_t kShownOfLongLine = 256;
+constexpr std::size_t kRoomForMore = 1024;
 
 /// Some whole lines, newlines included; the file's last line may lack it.
 struct Lines {
     std::string_view text;
     bool tooLong = false;  ///< the beginning of one line that is passed over
+    off_t offset = 0;      ///< where the text begins in the file
 };
 
 /// Reads a queue file in blocks and cuts them between lines.
@@ -46,7 +49,8 @@ public:
             errno = EINVAL;
             return false;
         }
-        buffer_.resize(kBlockSize + OrdinaryReader::kPadding);
+        // Most queues are short: they get no more than they need.
+        Grow(std::min(kBlockSize, static_cast<std::size_t>(status.st_size) + kRoomForMore));
         return true;
     }
 
@@ -57,6 +61,9 @@ public:
 
     bool Next(Lines &lines) {
         DropDelivered();
+        if (at_end_) {
+            return false;  // what was appended since belongs to the line that was delivered without its newline
+        }
         for (;;) {
             const std::size_t end = EndOfLastLine();
             if (end > 0 && skipping_) {
@@ -68,32 +75,35 @@ public:
             }
             if (!skipping_ && filled_ > kMaxLine) {
                 skipping_ = true;
-                lines = {{buffer_.data(), kShownOfLongLine}, true};
+                lines = {{buffer_.get(), kShownOfLongLine}, true, 0};
                 return true;
             }
             if (skipping_) {
                 filled_ = 0;
             }
-            if (!Fill()) {
+            at_end_ = !Fill();
+            if (at_end_) {
                 break;
             }
         }
-        lines = {{buffer_.data(), filled_}, false};
+        lines = {{buffer_.get(), filled_}, false, read_ - static_cast<off_t>(filled_)};
         delivered_ = filled_;
+        Pad();
         return filled_ > 0;
     }
 
 private:
     std::size_t EndOfLastLine() const {
-        const void *newline = memrchr(buffer_.data(), '\n', filled_);
+        const void *newline = memrchr(buffer_.get(), '\n', filled_);
         return newline == nullptr
                    ? 0
-                   : static_cast<std::size_t>(static_cast<const char *>(newline) - buffer_.data()) + 1;
+                   : static_cast<std::size_t>(static_cast<const char *>(newline) - buffer_.get()) + 1;
     }
 
     bool Deliver(Lines &lines, std::size_t size) {
-        lines = {{buffer_.data(), size}, false};
+        lines = {{buffer_.get(), size}, false, read_ - static_cast<off_t>(filled_)};
         delivered_ = size;
+        Pad();
         behind_whole_ = read_ - static_cast<off_t>(filled_ - size);
         return true;
     }
@@ -101,27 +111,26 @@ private:
     void DropDelivered() { Drop(std::exchange(delivered_, 0)); }
 
     void Drop(std::size_t size) {
-        std::memmove(buffer_.data(), buffer_.data() + size, filled_ - size);
+        std::memmove(buffer_.get(), buffer_.get() + size, filled_ - size);
         filled_ -= size;
     }
 
     void SkipToNewline() {
-        const void *newline = std::memchr(buffer_.data(), '\n', filled_);
-        Drop(static_cast<std::size_t>(static_cast<const char *>(newline) - buffer_.data()) + 1);
+        const void *newline = std::memchr(buffer_.get(), '\n', filled_);
+        Drop(static_cast<std::size_t>(static_cast<const char *>(newline) - buffer_.get()) + 1);
         behind_whole_ = read_ - static_cast<off_t>(filled_);
         skipping_ = false;
     }
 
     /// False at the end of the file; a read error ends it too.
     bool Fill() {
-        if (filled_ + OrdinaryReader::kPadding == buffer_.size()) {
-            // A line longer than the block, and shorter than the longest allowed: grown for, never kept.
-            buffer_.resize(std::min(filled_ * 2, kMaxLine + kBlockSize) + OrdinaryReader::kPadding);
+        if (filled_ == capacity_) {
+            // A file that grew, or a line longer than the block and shorter than the longest allowed.
+            Grow(std::min(std::max(filled_ * 2, kBlockSize), kMaxLine + kBlockSize));
         }
-        const std::size_t room = buffer_.size() - OrdinaryReader::kPadding - filled_;
         ssize_t count = 0;
         do {
-            count = pread(fd_.Get(), buffer_.data() + filled_, room, read_);
+            count = pread(fd_.Get(), buffer_.get() + filled_, capacity_ - filled_, read_);
         } while (count < 0 && errno == EINTR);
         if (count <= 0) {
             return false;
@@ -131,20 +140,31 @@ private:
         return true;
     }
 
+    void Grow(std::size_t capacity) {
+        std::unique_ptr<char[]> larger(new char[capacity + OrdinaryReader::kPadding]);  // not cleared: read into
+        std::copy_n(buffer_.get(), filled_, larger.get());
+        buffer_ = std::move(larger);
+        capacity_ = capacity;
+    }
+
+    void Pad() { std::fill_n(buffer_.get() + filled_, OrdinaryReader::kPadding, '\0'); }
+
     UniqueFd fd_;
-    std::vector<char> buffer_;
+    std::unique_ptr<char[]> buffer_;
+    std::size_t capacity_ = 0;
     std::size_t filled_ = 0;
     std::size_t delivered_ = 0;
     off_t read_ = 0;
     off_t behind_whole_ = 0;
     bool skipping_ = false;
+    bool at_end_ = false;
 };
 
 /// Tells what one line says: the fast reader where it is sure, the exact one otherwise.
 class LineReader {
 public:
     /// Null when the line is malformed. Readable bytes have to follow the line (OrdinaryReader::kPadding).
-    const QueueEvent *Read(std::string_view line, bool whole) {
+    const QueueEvent *Read(std::string_view line, bool whole, off_t offset) {
         OrdinaryEvent event;
         if (ordinary_.ReadEvent(line, event)) {
             event_ = {event.type, event.path, event.oldPath};
@@ -155,6 +175,7 @@ public:
             event_.oldPath = {};
         }
         event_.whole = whole;
+        event_.offset = offset;
         return &event_;
     }
 
@@ -209,7 +230,8 @@ bool Visit(const Lines &lines, LineReader &reader, const QueueVisitor &visit, Wa
             continue;
         }
         const bool whole = line.data() + line.size() < lines.text.data() + lines.text.size();
-        if (wanted(line) && !visit(line, reader.Read(line, whole))) {
+        const off_t offset = lines.offset + (line.data() - lines.text.data());
+        if (wanted(line) && !visit(line, reader.Read(line, whole, offset))) {
             return false;
         }
     }
@@ -251,6 +273,28 @@ bool ScanQueueFrom(const std::string &queueFile, QueuePosition &position, const 
     }
     position.offset = blocks.BehindWholeLines();
     return true;
+}
+
+bool IsInQueueAt(const std::string &queueFile, off_t offset, unsigned type, const std::string &path) {
+    BlockReader blocks;
+    struct stat status = {};
+    if (!blocks.Open(queueFile, status)) {
+        return false;
+    }
+    blocks.StartAt(offset);
+    LineReader reader;
+    Lines lines;
+    bool found = false;
+    if (blocks.Next(lines)) {
+        Visit(
+            lines, reader,
+            [&](std::string_view, const QueueEvent *event) {
+                found = event != nullptr && event->type == type && event->path == path;
+                return false;
+            },
+            kEveryLine);
+    }
+    return found;
 }
 
 bool FindInQueue(const std::string &queueFile, unsigned type, const std::string &path, bool &found) {

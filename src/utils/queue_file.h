@@ -22,6 +22,7 @@ struct QueueEvent {
     std::string_view path;
     std::string_view oldPath;  ///< "path_old" of a rename event; empty when absent or not a string
     bool whole = true;         ///< false for a last line without its newline, which may yet grow
+    off_t offset = 0;          ///< where the line begins in the file
 };
 
 /// Gets each line without its newline (of one beyond 1 MiB only the beginning), and its event or null when it is
@@ -45,6 +46,9 @@ struct QueuePosition {
 /// `restarted` is called before the first line when the scan begins at the start.
 bool ScanQueueFrom(const std::string &queueFile, QueuePosition &position, const std::function<void()> &restarted,
                    const QueueVisitor &visit);
+
+/// Does a well-formed line of exactly that type and path begin at the offset?
+bool IsInQueueAt(const std::string &queueFile, off_t offset, unsigned type, const std::string &path);
 
 /// Is there a well-formed line of exactly that type and path? Result as ScanQueue; `found` is false when that is.
 ///

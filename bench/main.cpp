@@ -1,0 +1,231 @@
+// Measures every row of the table in one run and prints the ratios.
+//
+//   fileindex_bench [--check] [--smoke] [--json FILE] [--only TEXT]
+//
+// --check exits with 1 when a ratio is missed; --smoke only shows that every row runs. Needs the library's fixed
+// paths for itself: run it in a private namespace.
+
+#include "data.h"
+#include "rows.h"
+#include "utils/queue_file.h"
+
+#include <fileindex/index_mgr.h>
+
+#include <benchmark/benchmark.h>
+#include <json/value.h>
+#include <json/writer.h>
+
+#include <sys/resource.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstring>
+#include <fstream>
+#include <map>
+#include <string>
+#include <vector>
+
+namespace {
+
+struct Options {
+    bool check = false;
+    bool smoke = false;
+    std::string json;
+    std::string only;
+};
+
+/// Nanoseconds of one run by the name of the benchmark: the median of its repetitions.
+class Medians : public benchmark::BenchmarkReporter {
+public:
+    bool ReportContext(const Context &) override { return true; }
+    void ReportRuns(const std::vector<Run> &runs) override {
+        for (const Run &run : runs) {
+            if (run.error_occurred) {
+                std::fprintf(stderr, "%s: %s\n", run.run_name.str().c_str(), run.error_message.c_str());
+                failed_ = true;
+            } else if (run.run_type == Run::RT_Iteration) {
+                times_[run.run_name.function_name].push_back(run.GetAdjustedRealTime());
+            }
+        }
+    }
+    double Of(const std::string &name) {
+        std::vector<double> &times = times_[name];
+        if (times.empty()) {
+            return 0;
+        }
+        std::sort(times.begin(), times.end());
+        return times[times.size() / 2];
+    }
+    bool Failed() const { return failed_; }
+
+private:
+    std::map<std::string, std::vector<double>> times_;
+    bool failed_ = false;
+};
+
+void Register(const std::string &name, const bench::Variant &variant, const Options &options) {
+    if (!variant) {
+        return;
+    }
+    auto *registered = benchmark::RegisterBenchmark(name.c_str(), [variant](benchmark::State &state) {
+        try {
+            const std::function<void()> operation = variant();
+            for (auto _ : state) {
+                operation();
+            }
+        } catch (const std::exception &failure) {
+            state.SkipWithError(failure.what());
+        }
+    });
+    registered->Unit(benchmark::kNanosecond)->UseRealTime();
+    if (options.smoke) {
+        registered->Iterations(1);
+    } else {
+        registered->Repetitions(5)->MinTime(0.1);
+    }
+}
+
+/// The peak memory of a child that runs the operation, in KiB.
+template <typename Operation>
+long PeakMemory(Operation operation) {
+    const pid_t child = fork();
+    if (child == 0) {
+        operation();
+        _exit(0);
+    }
+    int status = 0;
+    rusage usage = {};
+    wait4(child, &status, 0, &usage);
+    return usage.ru_maxrss;
+}
+
+struct Verdict {
+    Json::Value rows{Json::arrayValue};
+    bool missed = false;
+
+    void Add(const bench::Row &row, Medians &medians) {
+        const double library = medians.Of(row.name + "|library");
+        const double baseline = medians.Of(row.name + "|baseline");
+        const double floor = medians.Of(row.name + "|floor");
+        const double ofFloor = floor > 0 ? library / floor : 0;
+        const double ofBaseline = baseline > 0 ? library / baseline : 0;
+        const bool slow = (row.mostOfFloor > 0 && ofFloor > row.mostOfFloor) ||
+                          (row.mostOfBaseline > 0 && ofBaseline > row.mostOfBaseline);
+        missed = missed || slow;
+        std::printf("%-62s %12.1f us", row.name.c_str(), library / 1e3);
+        Print(ofFloor, row.mostOfFloor, "of floor");
+        Print(ofBaseline, row.mostOfBaseline, "of baseline");
+        std::printf("%s\n", slow ? "  MISSED" : "");
+        Json::Value entry(Json::objectValue);
+        entry["row"] = row.name;
+        entry["library_ns"] = library;
+        entry["baseline_ns"] = baseline;
+        entry["floor_ns"] = floor;
+        entry["of_floor"] = ofFloor;
+        entry["of_baseline"] = ofBaseline;
+        entry["missed"] = slow;
+        rows.append(entry);
+    }
+
+    void AddMemory(const char *name, long kibibytes, long most) {
+        missed = missed || kibibytes > most;
+        std::printf("%-62s %12ld KiB above idle (at most %ld)%s\n", name, kibibytes, most,
+                    kibibytes > most ? "  MISSED" : "");
+        Json::Value entry(Json::objectValue);
+        entry["row"] = name;
+        entry["kib_above_idle"] = static_cast<Json::Int64>(kibibytes);
+        rows.append(entry);
+    }
+
+private:
+    static void Print(double ratio, double most, const char *what) {
+        if (ratio == 0) {
+            std::printf("  %28s", "");
+        } else if (most > 0) {
+            std::printf("  %6.4g %-11s (<=%5.3g)", ratio, what, most);
+        } else {
+            std::printf("  %6.4g %-11s %9s", ratio, what, "");
+        }
+    }
+};
+
+void MeasureMemory(Verdict &verdict, std::size_t scale) {
+    const std::string queue = bench::QueuePath("share0");
+    bench::WriteQueue(queue, 10);
+    bench::WriteFolderConf(bench::SharePaths(1, 1));
+    // The code of both has to be in memory in any case.
+    const long idle = PeakMemory([&] {
+        VORK::FILEINDEX::internal::ScanQueue(queue, [](auto, auto) { return true; });
+        VORK::FILEINDEX::IndexMgr::IsPathIndexed("/share0/absent");
+    });
+    bench::WriteQueue(queue, 1000000 / scale);
+    const long scan =
+        PeakMemory([&] { VORK::FILEINDEX::internal::ScanQueue(queue, [](auto, auto) { return true; }); });
+    verdict.AddMemory("memory: scan of a queue of 1000000", scan - idle, 512);
+    bench::WriteFolderConf(bench::SharePaths(1000, 10));
+    const long query = PeakMemory([] { VORK::FILEINDEX::IndexMgr::IsPathIndexed("/share0/absent"); });
+    verdict.AddMemory("memory: IsPathIndexed over 1000 folders", query - idle, 4096);
+}
+
+/// The pending check as a process of its own, to be compared with grep.
+int Find(const char *queue, const char *path) {
+    bool found = false;
+    return VORK::FILEINDEX::internal::FindInQueue(queue, 0x10000, path, found) && found ? 0 : 1;
+}
+
+Options Parse(int argc, char **argv) {
+    Options options;
+    for (int i = 1; i < argc; ++i) {
+        const std::string argument = argv[i];
+        if (argument == "--check") {
+            options.check = true;
+        } else if (argument == "--smoke") {
+            options.smoke = true;
+        } else if (argument == "--json" && i + 1 < argc) {
+            options.json = argv[++i];
+        } else if (argument == "--only" && i + 1 < argc) {
+            options.only = argv[++i];
+        } else {
+            std::fprintf(stderr, "fileindex_bench: unknown argument %s\n", argv[i]);
+            std::exit(64);
+        }
+    }
+    return options;
+}
+
+}  // namespace
+
+int main(int argc, char **argv) {
+    if (argc == 4 && std::strcmp(argv[1], "--find") == 0) {
+        return Find(argv[2], argv[3]);
+    }
+    const Options options = Parse(argc, argv);
+    const std::size_t scale = options.smoke ? 100 : 1;
+    std::vector<bench::Row> rows = bench::Rows(scale);
+    std::erase_if(rows, [&](const bench::Row &row) { return row.name.find(options.only) == std::string::npos; });
+
+    for (const bench::Row &row : rows) {
+        Register(row.name + "|library", row.library, options);
+        Register(row.name + "|floor", row.floor, options);
+        Register(row.name + "|baseline", row.baseline, options);
+    }
+    Medians medians;
+    benchmark::RunSpecifiedBenchmarks(&medians);
+
+    Verdict verdict;
+    for (const bench::Row &row : rows) {
+        verdict.Add(row, medians);
+    }
+    if (options.only.empty()) {
+        MeasureMemory(verdict, scale);
+    }
+    if (!options.json.empty()) {
+        std::ofstream(options.json) << verdict.rows << '\n';
+    }
+    if (medians.Failed()) {
+        return 1;
+    }
+    return options.check && verdict.missed ? 1 : 0;
+}
