@@ -17,7 +17,7 @@ void RequireConsent(const Arguments &arguments, const std::string &consequence) 
     if (isatty(STDIN_FILENO) == 0 || isatty(STDERR_FILENO) == 0) {
         throw Failure(ExitStatus::Usage, consequence + "; without a terminal to ask on, --yes is needed");
     }
-    std::fprintf(stderr, "%s. Go on? [y/N] ", Printable(consequence).c_str());
+    std::fprintf(stderr, "fileindexctl: %s. Go on? [y/N] ", Printable(consequence).c_str());
     std::string answer;
     std::getline(std::cin, answer);
     if (answer != "y" && answer != "Y" && answer != "yes") {

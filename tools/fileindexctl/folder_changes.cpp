@@ -27,10 +27,7 @@ std::vector<PlannedStep> UpsertPlan() {
         SaveStep(),
         {"monitor", "the file-change monitor could not be registered", {{kIndexMgr, 598}}},
         {"service", "fileindexd could not be started", {{kIndexMgr, 605}}},
-        {"search setting",
-         "the search setting could not be switched on",
-         {},
-         {{kIndexMgr, 611}, {kIndexMgr, 613}}},
+        {"search setting", "the search setting did not take effect", {}, {{kIndexMgr, 611}, {kIndexMgr, 613}}},
         {"daemon told", "fileindexd cannot be reached", {{kIndexMgr, 621}}},
         {"events queued", "the event could not be queued", {{kIndexMgr, 629}, {kIndexMgr, 634}}},
     };

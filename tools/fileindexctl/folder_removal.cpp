@@ -92,10 +92,8 @@ std::vector<PlannedStep> Plan(const std::string &saved, const Paths &removed, co
     std::vector<PlannedStep> plan = {SaveStep(saved)};
     if (rest.empty()) {
         plan.push_back({"service", "fileindexd could not be stopped", {}, {{kIndexMgr, 89}}});
-        plan.push_back({"search setting",
-                        "the search setting could not be switched off",
-                        {},
-                        {{kIndexMgr, 94}, {kIndexMgr, 96}}});
+        plan.push_back(
+            {"search setting", "the search setting did not take effect", {}, {{kIndexMgr, 94}, {kIndexMgr, 96}}});
     } else {
         plan.push_back({"daemon told", "fileindexd cannot be reached", {{kIndexMgr, 104}}});
         plan.push_back({"events queued", "the event could not be queued", {{kIndexMgr, 111}}});

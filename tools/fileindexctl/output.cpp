@@ -45,7 +45,7 @@ std::string Serialise(const Json::Value &document) {
 
 }  // namespace
 
-Output::Output(bool json) : json_(json), colour_(MayColour()), width_(TerminalWidth()) {}
+Output::Output(bool json) : json_(json), colour_(MayColour()), width_(TerminalWidth()), data_(Json::objectValue) {}
 
 void Output::Line(std::string_view text) {
     if (json_) {
@@ -67,9 +67,6 @@ void Output::Note(const std::string &text) {
 }
 
 void Output::Error(ExitStatus status, const std::string &text) {
-    if (!data_.isObject()) {
-        data_ = Json::Value(Json::objectValue);
-    }
     data_["error"]["status"] = static_cast<int>(status);
     data_["error"]["message"] = text;
     Complain("", text);
@@ -87,7 +84,7 @@ ExitStatus Output::Finish(ExitStatus status) {
     if (json_) {
         Json::Value document(Json::objectValue);
         document["schema"] = 1;
-        document["ok"] = status == ExitStatus::Done || (status == ExitStatus::No && !data_["error"]);
+        document["ok"] = status == ExitStatus::Done || (status == ExitStatus::No && !data_.isMember("error"));
         document["data"] = data_;
         document["warnings"] = Json::Value(Json::arrayValue);
         for (const auto &warning : warnings_) {

@@ -148,7 +148,7 @@ ExitStatus RemoveShare(const Arguments &arguments, Output &output) {
     if (paths.size() == folders.size()) {
         plan.push_back({"service", "fileindexd could not be stopped", {}, {{kIndexMgr, 535}}});
         plan.push_back({"search setting",
-                        "the search setting could not be switched off",
+                        "the search setting did not take effect",
                         {},
                         {{kIndexMgr, 540}, {kIndexMgr, 542}}});
     }

@@ -1,0 +1,49 @@
+#!/bin/bash
+# What only a terminal gets: questions, colour, shortened paths.
+set -uo pipefail
+
+export PATH="$BIN_DIR:$PATH"
+unset NO_COLOR
+failures=0
+
+# Runs a shell command on a terminal of 40 columns, with the given keys typed.
+on_terminal() {
+    local keys=$1 command=$2
+    printf '%s' "$keys" | script --quiet --return --command "stty cols 40; $command" /dev/null | tr -d '\r'
+}
+
+expect() {
+    local what=$1 expected=$2 found=$3
+    [[ $found == "$expected" ]] && return
+    printf '%s: "%s" instead of "%s"\n' "$what" "$found" "$expected"
+    failures=$((failures + 1))
+}
+
+folder=/photo/a-folder-with-a-name/that-goes-on/and-on
+mkdir -p /vol1/photo
+echo '{"shares": {"photo": {"path": "/vol1/photo"}}}' >/usr/vork/etc/platform.conf
+printf '#!/bin/sh\nexit 0\n' >/etc/init.d/fileindexd
+chmod +x /etc/init.d/fileindexd
+fileindexctl add "$folder" --name caffè --media photo &>/dev/null
+
+expect "a table on a terminal" \
+    $'PATH                        NAME   MEDIA\n...ame/that-goes-on/and-on  caffè  photo' \
+    "$(on_terminal '' 'fileindexctl list')"
+expect "a table in a pipe" 1 "$(on_terminal '' 'fileindexctl list | cat' | grep -c "^$folder  caffè  photo$")"
+
+escape=$'\033'
+expect "a failed step is red" 1 "$(on_terminal '' 'fileindexctl pause' | grep -c "^$escape\[31mdaemon told  FAILED")"
+expect "NO_COLOR" 0 "$(NO_COLOR=1 on_terminal '' 'fileindexctl pause' | grep -c "$escape")"
+expect "an empty NO_COLOR" 1 "$(NO_COLOR='' on_terminal '' 'fileindexctl pause' | grep -c "$escape\[31m")"
+expect "no colour in a pipe" 0 "$(on_terminal '' 'fileindexctl pause | cat' | grep -c "$escape")"
+
+for answer in '' n no maybe; do
+    on_terminal "$answer"$'\n' "fileindexctl remove $folder" >/tmp/refused
+    expect "status of the answer \"$answer\"" 1 $?
+    expect "the question" 1 "$(grep -c "^fileindexctl: this removes $folder .*Go on" /tmp/refused)"
+done
+expect "after the refusals" 1 "$(fileindexctl list | grep -c "$folder")"
+on_terminal $'y\n' "fileindexctl remove $folder" >/dev/null
+expect "after the consent" 0 "$(fileindexctl list 2>/dev/null | grep -c "$folder")"
+
+exit "$((failures > 0))"

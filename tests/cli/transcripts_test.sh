@@ -1,0 +1,84 @@
+#!/bin/bash
+# Runs the commands of each transcript and compares everything that they write and return.
+#
+#   $ COMMAND     is run by the shell; below it stands what it writes to stdout, then, each line behind "! ", what it
+#                 writes to stderr, then its exit status unless that is 0: "[66]"
+#   # TEXT        a remark, behind an empty line
+#
+# Points in time are shown as TIME, seconds since the epoch as EPOCH, lines of the platform's source as PLACE. Each transcript starts on a fresh machine with
+# the shares photo and music on /vol1, video on /vol2, and "odd", whose directory has another name. After a deliberate
+# change of an output, write the transcripts anew with
+#   BIN_DIR=... BUILD_DIR=... REWRITE=1 scripts/in-private-namespace tests/cli/transcripts_test.sh
+set -uo pipefail
+
+here=$(dirname "$(realpath "$0")")
+export PATH="$BIN_DIR:$PATH" TZ=UTC LC_ALL=C
+unset NO_COLOR
+
+fresh_machine() {
+    [[ ! -S /run/fileindexd.sock ]] || /etc/init.d/fileindexd stop
+    umount -n /vol2/video 2>/dev/null
+    rm -rf /vol1/* /vol2/* /usr/vork/etc/* /tmp/fileidx_cfg_*.lock /tmp/commands
+    mkdir -p /usr/vork/etc/fileindex /vol1/photo/2015/trip /vol1/music /vol2/video
+    cat >/usr/vork/etc/platform.conf <<'END'
+{"shares": {"photo": {"path": "/vol1/photo"}, "music": {"path": "/vol1/music"},
+            "video": {"path": "/vol2/video"}, "odd": {"path": "/vol1/even"}}, "search": false}
+END
+    cat >/etc/init.d/fileindexd <<END
+#!/bin/sh
+case \$1 in
+start) [ -S /run/fileindexd.sock ] || "$BUILD_DIR/demo/fileindex_demo_peer" /tmp/commands /run/peer.pid ;;
+stop) [ ! -S /run/fileindexd.sock ] || kill "\$(cat /run/peer.pid)"; rm -f /run/fileindexd.sock ;;
+esac
+END
+    printf '#!/bin/sh\nexit 0\n' >/etc/init.d/smbd
+    chmod 755 /etc/init.d/fileindexd /etc/init.d/smbd
+}
+
+without_accidents() {
+    sed -E 's/[0-9]{4}-[0-9]{2}-[0-9]{2} [0-9]{2}:[0-9]{2} UTC/TIME/g
+            s/(err=\[0x[0-9A-F]{4}) [a-z_]+\.cpp:[0-9]+\]/\1 PLACE]/
+            s/"(oldest|resume_time)":[0-9]{10}/"\1":EPOCH/g'
+}
+
+# What the daemon received, once it has read that many commands; those that say nothing are probes.
+# shellcheck disable=SC2317  # the transcripts call it
+received() {
+    until [[ $(grep -c '^[0-9]' /tmp/commands) -ge $1 ]]; do sleep 0.01; done
+    grep '^[0-9]' /tmp/commands
+}
+
+# The commands of a transcript share one shell, so that one can build on another.
+play() {
+    local line status first=yes
+    while IFS= read -r line; do
+        case $line in
+        '$ '*)
+            printf '%s\n' "$line"
+            eval "${line#\$ }" >/tmp/stdout 2>/tmp/stderr </dev/null
+            status=$?
+            without_accidents </tmp/stdout
+            without_accidents </tmp/stderr | sed 's/^/! /'
+            [[ $status -eq 0 ]] || printf '[%s]\n' "$status"
+            ;;
+        '#'*)
+            [[ $first == yes ]] || echo
+            printf '%s\n' "$line"
+            ;;
+        *) continue ;;
+        esac
+        first=no
+    done <"$1"
+}
+
+failures=0
+for transcript in "$here"/transcripts/*.txt; do
+    fresh_machine
+    play "$transcript" >/tmp/played
+    if [[ -n ${REWRITE-} ]]; then
+        cat /tmp/played >"$transcript"
+    else
+        diff -u --label "expected ${transcript##*/}" --label played "$transcript" /tmp/played || failures=1
+    fi
+done
+exit "$failures"
