@@ -1,0 +1,185 @@
+// What strangers leave in the places that the library opens, and lock files that another user holds.
+#include "harness.h"
+#include "scenarios.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <sys/sysmacros.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <filesystem>
+
+namespace reliability {
+
+namespace {
+
+using namespace VORK::FILEINDEX;
+namespace fs = std::filesystem;
+
+constexpr uid_t kStranger = 65534;
+constexpr char kVictim[] = "/vol2/victim";
+constexpr char kVictimDir[] = "/vol2/victims";
+constexpr char kNowhere[] = "/vol2/nowhere";
+
+struct Object {
+    const char *name;
+    void (*plant)(const char *path);
+};
+
+constexpr Object kObjects[] = {
+    {"link to a file", [](const char *path) { fs::create_symlink(kVictim, path); }},
+    {"link to a directory", [](const char *path) { fs::create_symlink(kVictimDir, path); }},
+    {"dangling link", [](const char *path) { fs::create_symlink(kNowhere, path); }},
+    {"FIFO", [](const char *path) { Check(::mkfifo(path, 0666) == 0, "mkfifo"); }},
+    {"directory", [](const char *path) { fs::create_directory(path); }},
+    {"device", [](const char *path) { Check(::mknod(path, S_IFCHR | 0666, makedev(1, 5)) == 0, "mknod"); }},
+};
+
+bool ChangeFolders() {
+    Folders folders;
+    Json::Value report;
+    const bool changed = folders.Lock(true) && folders.Load() &&
+                         folders.Upsert(report, FolderRequest("/photo/a", "a")) && folders.Save();
+    folders.Unlock();
+    return changed;
+}
+
+bool ReadFolders() {
+    std::vector<Folder> folders;
+    return IndexMgr::List(folders);
+}
+
+bool ChangeStatus() {
+    return StatusMgr::SetUpdated("marker");
+}
+
+bool ReadStatus() {
+    long long resumeTime = 0;
+    return StatusMgr::GetPauseInfo(resumeTime);
+}
+
+bool QueueEvent() {
+    return AddCustomEvent(0x20000, "/vol1/photo/a", Json::Value());
+}
+
+bool SendCommand() {
+    return SendCammandToDaemon("resume", Json::Value(Json::objectValue));
+}
+
+/// One letter for each object, in their order: does the call succeed? The code is that of its failures.
+struct Place {
+    std::string path;
+    const char *operation;
+    bool (*call)();
+    const char *results;
+    int code;
+};
+
+const Place kPlaces[] = {
+    {kFolderConf, "change", ChangeFolders, "ffffff", FILEINDEX_ERR_SAVE_JSON},
+    {kFolderConf, "read", ReadFolders, "tttttt", 0},  // whatever is no regular file is no configuration yet
+    {kStatusConf, "change", ChangeStatus, "ffffff", FILEINDEX_ERR_SAVE_JSON},
+    {kStatusConf, "read", ReadStatus, "tttttt", 0},
+    {kFolderLock, "change", ChangeFolders, "ffftft", FILEINDEX_ERR_LOCK},  // a FIFO can be locked as well
+    {kStatusLock, "change", ChangeStatus, "ffftft", FILEINDEX_ERR_LOCK},
+    {kQueue, "append", QueueEvent, "ffffff", 0},
+    {std::string(kQueue) + ".tmp", "append to its queue", QueueEvent, "tttttt", 0},
+    {kSocket, "send", SendCommand, "ffffff", 0},
+};
+
+/// What the objects are and lead to, before and after.
+std::string Describe(const std::string &path) {
+    struct stat status {};
+    Check(::lstat(path.c_str(), &status) == 0, "the planted object is gone: " + path);
+    return std::to_string(status.st_ino) + " " + std::to_string(status.st_mode) + " " +
+           ReadFile(kVictim).value_or("(gone)") + (fs::is_empty(kVictimDir) ? "" : " a file appeared") +
+           (fs::exists(kNowhere) ? " a file was made" : "");
+}
+
+double Try(const Place &place, const Object &object, bool succeeds) {
+    const std::string what = std::string(object.name) + " at " + place.path + ", " + place.operation;
+    MakeMachine();
+    WriteFile(kVictim, "{}");
+    fs::remove_all(place.path);
+    object.plant(place.path.c_str());
+    const std::string before = Describe(place.path);
+    const SameDescriptors sameDescriptors;
+    ::alarm(30);  // a call that hangs ends the run
+    const Stopwatch stopwatch;
+    Check(succeeds ? place.call() : Fails(place.call, place.code), what + ": the result");
+    const double duration = stopwatch.Milliseconds();
+    ::alarm(0);
+    Check(Describe(place.path) == before, what + ": something was changed");
+    Check(place.path != kQueue || StatusMgr::ShareIsNeedReindex("photo"), what + ": the share is not marked");
+    fs::remove_all(place.path);
+    return duration;
+}
+
+/// Takes both lock files, as a user without any privilege, and keeps them.
+pid_t StartStranger() {
+    auto &ready = Shared<volatile bool>();
+    const pid_t stranger = Start([&ready] {
+        Check(::setgid(kStranger) == 0 && ::setuid(kStranger) == 0, "setuid");
+        for (const char *path : {kFolderLock, kStatusLock}) {
+            // Reading is enough to lock a file that the library made.
+            const int fd = ::open(path, O_RDONLY | O_CREAT | O_CLOEXEC, 0600);
+            Check(fd >= 0 && ::flock(fd, LOCK_EX) == 0, "lock as a stranger");
+        }
+        ready = true;
+        ::pause();
+    });
+    while (!ready) {
+        ::usleep(1000);
+    }
+    return stranger;
+}
+
+void CallWhileLocked(const std::string &whose, int calls) {
+    double sum = 0;
+    double longest = 0;
+    const SameDescriptors sameDescriptors;
+    for (int i = 0; i < calls; ++i) {
+        const Stopwatch stopwatch;
+        Check(Fails(i % 2 == 0 ? ChangeFolders : ChangeStatus, FILEINDEX_ERR_LOCK), "a held lock: code 9");
+        sum += stopwatch.Milliseconds();
+        longest = std::max(longest, stopwatch.Milliseconds());
+        Check(ReadFolders() && ReadStatus(), "a reader failed while the lock was held");
+    }
+    Figure("another user holds " + whose + " lock files",
+           std::to_string(calls) + " calls: code 9, readers fine; " + std::to_string(sum / calls) +
+               " ms on average, " + std::to_string(longest) + " ms at most");
+}
+
+}  // namespace
+
+void Planted() {
+    fs::create_directories(kVictimDir);
+    double longest = 0;
+    int cases = 0;
+    for (const Place &place : kPlaces) {
+        for (const Object &object : kObjects) {
+            const bool succeeds = place.results[&object - kObjects] == 't';
+            longest = std::max(longest, Try(place, object, succeeds));
+            ++cases;
+        }
+    }
+    Figure("planted links, FIFOs, directories, devices",
+           std::to_string(cases) + " cases: victims unchanged, " + std::to_string(longest) + " ms at most");
+}
+
+void ForeignLocks() {
+    const int calls = Rounds(100, 1000);
+    for (const bool ours : {true, false}) {
+        MakeMachine();
+        Check(!ours || (ChangeFolders() && ChangeStatus()), "make the lock files");
+        const pid_t stranger = StartStranger();
+        CallWhileLocked(ours ? "the library's" : "their own", calls);
+        Kill(stranger);
+        // A lock file of a stranger may stay out of reach for good (fs.protected_regular): no demand on those.
+        Check(!ours || (ChangeFolders() && ChangeStatus()), "a released lock");
+    }
+}
+
+}  // namespace reliability
