@@ -137,12 +137,13 @@ TEST_F(FileSystemTest, DoesNotHangOnADeadServer) {
     if (server < 0) {
         GTEST_SKIP() << "no /dev/fuse";
     }
-    std::filesystem::create_directories("/mnt/dead");
+    std::filesystem::create_directories("/mnt/dead server");
     const std::string options = "fd=" + std::to_string(server) + ",rootmode=40000,user_id=0,group_id=0";
-    ASSERT_EQ(mount("server:/", "/mnt/dead", "fuse.sshfs", 0, options.c_str()), 0) << std::strerror(errno);
-    std::filesystem::create_symlink("/mnt/dead/x", "/vol1/photo/to-dead");
+    ASSERT_EQ(mount("server:/", "/mnt/dead server", "fuse.sshfs", 0, options.c_str()), 0) << std::strerror(errno);
+    std::filesystem::create_symlink("/mnt/dead server/x", "/vol1/photo/to-dead");
     alarm(60);
-    for (const char *path : {"/mnt/dead", "/mnt/dead/a/b", "/vol1/photo/to-dead/y", "/mnt/dead/../dead/x"}) {
+    for (const char *path : {"/mnt/dead server", "/mnt/dead server/a/b", "/vol1/photo/to-dead/y",
+                             "/mnt/dead server/../dead server/x"}) {
         EXPECT_EQ(KindOf(path), Kind::kRemote) << path;
         EXPECT_EQ(InSnapshot(path), 0) << path;
         EXPECT_EQ(ReadOnly(path), 0) << path;
@@ -150,11 +151,11 @@ TEST_F(FileSystemTest, DoesNotHangOnADeadServer) {
         EXPECT_EQ(VORKQuotaIsEnough(0, path, 1), 0) << path;
         EXPECT_EQ(VLIBCErrGet(), VORK_ERR_IO) << path;
     }
-    EXPECT_EQ(VORKFSDirIsMntPoint("/mnt/dead"), 1);
-    EXPECT_EQ(VORKFSDirIsMntPoint("/mnt/dead/a"), 0);
-    EXPECT_EQ(KindOf("/mnt/dead/../.."), Kind::kLocal);
+    EXPECT_EQ(VORKFSDirIsMntPoint("/mnt/dead server"), 1);
+    EXPECT_EQ(VORKFSDirIsMntPoint("/mnt/dead server/a"), 0);
+    EXPECT_EQ(KindOf("/mnt/dead server/../.."), Kind::kLocal);
     alarm(0);
-    umount2("/mnt/dead", MNT_DETACH | MNT_FORCE);
+    umount2("/mnt/dead server", MNT_DETACH | MNT_FORCE);
     close(server);
 }
 
