@@ -2,13 +2,12 @@
 /// The front door: which folders are indexed, adding, changing, removing and reindexing them, and keeping the
 /// index in step with shares. Pausing and progress are in status_mgr.h.
 ///
-/// Success means that the configuration is saved and every party has been told, but for what an operation says is
-/// only logged; the daemon acts later. Changes
-/// are serialised between processes by /tmp/fileidx_cfg_folder.lock, held from the load to the last
-/// notification; a call that finds it busy fails with FILEINDEX_ERR_LOCK after at most 27 ms of sleep. Nothing is
-/// rolled back: folder.conf is saved before anyone is told, and after a failure the same call repeated tells
-/// everyone again (its events then report no change against what was saved: Reindex has the folders read anew).
-/// Nothing here throws.
+/// Success means that the configuration is saved and every party has been told, except for what an operation says
+/// is only logged; the daemon acts later. Changes are serialised between processes by
+/// /tmp/fileidx_cfg_folder.lock, held from the load to the last notification; a call that finds it busy fails with
+/// FILEINDEX_ERR_LOCK after at most 27 ms of sleep. Nothing is rolled back: folder.conf is saved before anyone is
+/// told, and after a failure the same call repeated tells everyone again (its events then report no change against
+/// what was saved: Reindex has the folders read anew). Nothing here throws.
 #ifndef FILEINDEX_INDEX_MGR_H
 #define FILEINDEX_INDEX_MGR_H
 

@@ -106,7 +106,7 @@ bool IndexMgr::Upsert(const Json::Value &folders) {
             return false;
         }
         // Saved before anyone is told, and never taken back: the daemons read the file when they hear of it, and
-        // the same call repeated completes what a failure from here on leaves undone.
+        // the same call repeated tells everyone again.
         if (!RegisterMonitors(changes.shares) || !StartDaemon({kIndexMgrModule, 605})) {
             return false;
         }
