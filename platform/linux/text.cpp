@@ -4,6 +4,7 @@
 #include <unicase.h>
 #include <unistr.h>
 
+#include <algorithm>
 #include <cstdlib>
 #include <memory>
 #include <string>
@@ -14,28 +15,12 @@ namespace {
 // Never a byte of UTF-8, so a key shows what was text and what was not.
 constexpr char kStrayByteMark = '\xFF';
 
-bool IsAscii(std::string_view text) {
-    for (const char c : text) {
-        if (static_cast<unsigned char>(c) >= 0x80) {
-            return false;
-        }
-    }
-    return true;
+bool IsAscii(char c) {
+    return static_cast<unsigned char>(c) < 0x80;
 }
 
 unsigned char FoldAscii(char c) {
     return static_cast<unsigned char>(c >= 'A' && c <= 'Z' ? c - 'A' + 'a' : c);
-}
-
-int CompareAscii(std::string_view a, std::string_view b) {
-    const size_t common = a.size() < b.size() ? a.size() : b.size();
-    for (size_t i = 0; i < common; ++i) {
-        const int difference = FoldAscii(a[i]) - FoldAscii(b[i]);
-        if (difference != 0) {
-            return difference;
-        }
-    }
-    return a.size() < b.size() ? -1 : static_cast<int>(a.size() > b.size());
 }
 
 // The length of the UTF-8 at the start of the text.
@@ -86,9 +71,24 @@ std::string_view ViewOf(const char *text) {
 int VLIBCUnicodeUTF8StrCaseCmp(const char *a, const char *b) {
     const std::string_view left = ViewOf(a);
     const std::string_view right = ViewOf(b);
-    if (IsAscii(left) && IsAscii(right)) {
-        return CompareAscii(left, right);
+    // Keys are made of what stands behind the last ASCII character that both names share: whatever came before it
+    // has the same key in both, and where two ASCII characters differ they decide. So most pairs need no key.
+    const size_t common = std::min(left.size(), right.size());
+    size_t decided = 0;
+    for (size_t i = 0; i < common; ++i) {
+        if (IsAscii(left[i]) && IsAscii(right[i])) {
+            const int difference = FoldAscii(left[i]) - FoldAscii(right[i]);
+            if (difference != 0) {
+                return difference;
+            }
+            decided = i + 1;
+        } else if (left[i] != right[i]) {
+            break;
+        }
+    }
+    if (decided == left.size() || decided == right.size()) {
+        return static_cast<int>(decided < left.size()) - static_cast<int>(decided < right.size());
     }
     // std::string compares bytes as unsigned.
-    return KeyOf(left).compare(KeyOf(right));
+    return KeyOf(left.substr(decided)).compare(KeyOf(right.substr(decided)));
 }

@@ -1,3 +1,4 @@
+#include "folder_access.h"
 #include "names.h"
 
 #include <fileindex/folders.h>
@@ -5,54 +6,51 @@
 #include <vork/text.h>
 
 #include <algorithm>
-#include <functional>
+#include <cstddef>
+#include <iterator>
+#include <string>
+#include <vector>
 
 namespace VORK {
 namespace FILEINDEX {
 
 namespace {
 
-using Order = std::function<bool(const Folder *, const Folder *)>;
+using Sorted = std::vector<const Folder *>;
 
-Order ByText(std::string Folder::*field) {
-    return [field](const Folder *a, const Folder *b) {
+/// Stable, so that pages of folders with equal flags fit together, and safe whatever the platform's comparison
+/// answers.
+void SortByText(Sorted &folders, std::string Folder::*field) {
+    std::stable_sort(folders.begin(), folders.end(), [field](const Folder *a, const Folder *b) {
         return VLIBCUnicodeUTF8StrCaseCmp((a->*field).c_str(), (b->*field).c_str()) < 0;
-    };
+    });
 }
 
-Order ByFlag(bool Folder::*field) {
-    return [field](const Folder *a, const Folder *b) { return !(a->*field) && b->*field; };
+void SortByFlag(Sorted &folders, bool Folder::*field) {
+    std::stable_sort(folders.begin(), folders.end(),
+                     [field](const Folder *a, const Folder *b) { return !(a->*field) && b->*field; });
 }
 
-Order OrderOf(const std::string &sortBy) {
-    const struct {
-        const char *key;
-        Order order;
-    } orders[] = {
-        {"name", ByText(&Folder::name)},   {"document", ByFlag(&Folder::document)},
-        {"audio", ByFlag(&Folder::audio)}, {"video", ByFlag(&Folder::video)},
-        {"photo", ByFlag(&Folder::photo)},
-    };
-    for (const auto &known : orders) {
-        if (sortBy == known.key) {
-            return known.order;
+void Sort(Sorted &folders, const std::string &sortBy) {
+    for (std::size_t kind = 0; kind < std::size(internal::kMediaKeys); ++kind) {
+        if (sortBy == internal::kMediaKeys[kind]) {
+            SortByFlag(folders, internal::kMediaFlags[kind]);
+            return;
         }
     }
-    return ByText(&Folder::path);
+    SortByText(folders, sortBy == internal::kNameKey ? &Folder::name : &Folder::path);
 }
 
 }  // namespace
 
 bool Folders::List(Json::Value &out, unsigned long offset, unsigned long limit, const std::string &sort_by,
                    const std::string &sort_direction, const Json::Value &additional) {
-    std::vector<const Folder *> sorted;
+    Sorted sorted;
     sorted.reserve(folders_.size());
     for (const auto &[path, folder] : folders_) {
         sorted.push_back(&folder);
     }
-    // Stable, so that pages of folders with equal flags fit together, and safe whatever the platform's
-    // comparison answers.
-    std::stable_sort(sorted.begin(), sorted.end(), OrderOf(sort_by));
+    Sort(sorted, sort_by);
 
     const unsigned long total = sorted.size();
     const unsigned long count = offset > total ? 0 : std::min(total - offset, limit);

@@ -14,8 +14,10 @@
 #include <cerrno>
 #include <chrono>
 #include <csignal>
+#include <cstddef>
 #include <cstdint>
 #include <cstring>
+#include <string>
 
 namespace VORK {
 namespace FILEINDEX {
@@ -26,7 +28,7 @@ namespace {
 
 constexpr std::size_t kChunkSize = 1024;
 constexpr int kEmptyWriteRetries = 3;
-constexpr std::size_t kBackwardRoom = 64 * 1024;
+constexpr std::ptrdiff_t kBackwardRoom = 64 * 1024;
 constexpr timeval kSendTimeout = {1, 0};
 constexpr std::chrono::seconds kWholeSendLimit(10);
 
@@ -34,35 +36,43 @@ constexpr std::chrono::seconds kWholeSendLimit(10);
 /// the length. In front of it lie zeros that belong to the same buffer; see WriteAll.
 class Frame {
 public:
-    explicit Frame(const std::string &text) : buffer_(kBackwardRoom, '\0') {
+    explicit Frame(const std::string &text) {
         const auto length = static_cast<std::uint32_t>(text.size() + 1);
-        buffer_.append(reinterpret_cast<const char *>(&length), sizeof(length));
-        buffer_.append(text.c_str(), text.size() + 1);
+        bytes_.reserve(sizeof(length) + length);
+        bytes_.append(reinterpret_cast<const char *>(&length), sizeof(length));
+        bytes_.append(text.c_str(), length);
     }
 
-    const char *Floor() const { return buffer_.data(); }
-    const char *Length() const { return buffer_.data() + kBackwardRoom; }
-    const char *Body() const { return Length() + kLengthSize; }
-    std::size_t BodySize() const { return buffer_.size() - kBackwardRoom - kLengthSize; }
-
     static constexpr std::size_t kLengthSize = sizeof(std::uint32_t);
+    std::size_t Size() const { return bytes_.size() - zeros_; }
+
+    /// The bytes from an offset to the end; a negative one lies among the zeros. They are made when they are first
+    /// reached, which is hardly ever.
+    const char *At(std::ptrdiff_t offset) {
+        if (offset < 0 && zeros_ == 0) {
+            bytes_.insert(0, kBackwardRoom, '\0');
+            zeros_ = kBackwardRoom;
+        }
+        return bytes_.data() + static_cast<std::ptrdiff_t>(zeros_) + offset;
+    }
 
 private:
-    std::string buffer_;
+    std::string bytes_;
+    std::size_t zeros_ = 0;
 };
 
 using Clock = std::chrono::steady_clock;
 
-/// Writes in chunks. A result of -1 counts like any other: the position moves back by a byte and one more is to
-/// be written. The daemon has always been spoken to like this, and frames that it resynchronises on must not
-/// change. The step back may go down to `floor`; beyond it the frame is given up, which soon ends the loop when
-/// the peer is gone. A peer that is there and does not read costs a timeout for each step, hence the deadline.
-bool WriteAll(int fd, std::size_t size, const char *buffer, const char *floor, Clock::time_point deadline) {
-    const char *position = buffer;
+/// Writes the frame's bytes [offset, offset + size) in chunks. A result of -1 counts like any other: the position
+/// moves back by a byte and one more is to be written. The daemon has always been spoken to like this, and frames
+/// that it resynchronises on must not change. Where a step would leave the zeros in front the frame is given up,
+/// which soon ends the loop when the peer is gone. A peer that is there and does not read costs a timeout for each
+/// step, hence the deadline.
+bool WriteAll(int fd, std::size_t size, Frame &frame, std::ptrdiff_t offset, Clock::time_point deadline) {
     std::size_t remaining = size;
     int retries = kEmptyWriteRetries;
     while (remaining > 0) {
-        const ssize_t count = write(fd, position, std::min(remaining, kChunkSize));
+        const ssize_t count = write(fd, frame.At(offset), std::min(remaining, kChunkSize));
         if (count == 0) {
             if (errno != EINTR || retries == 0) {
                 return false;
@@ -70,11 +80,11 @@ bool WriteAll(int fd, std::size_t size, const char *buffer, const char *floor, C
             --retries;
             continue;
         }
-        if (count < 0 && (position == floor || (errno == EAGAIN && Clock::now() >= deadline))) {
+        if (count < 0 && (offset == -kBackwardRoom || (errno == EAGAIN && Clock::now() >= deadline))) {
             return false;
         }
         remaining -= static_cast<std::size_t>(count);
-        position += count;
+        offset += count;
     }
     return true;
 }
@@ -105,13 +115,13 @@ bool SendCammandToDaemon(const std::string &command, const Json::Value &data) {
         if (!Connect(fd.Get()) || !LimitSends(fd.Get())) {
             return false;
         }
-        Json::Value message(Json::objectValue);
-        message["type"] = command;
-        message[kDataKey] = data;
-        const Frame frame(ToString(message));
+        // As ToString writes {"type": command, "data": data}, without a copy of the data.
+        std::string text = "{\"data\":" + ToString(data) + ",\"type\":";
+        AppendQuoted(text, command);
+        Frame frame(text + "}");
         const Clock::time_point deadline = Clock::now() + kWholeSendLimit;
-        return WriteAll(fd.Get(), Frame::kLengthSize, frame.Length(), frame.Floor(), deadline) &&
-               WriteAll(fd.Get(), frame.BodySize(), frame.Body(), frame.Floor(), deadline);
+        return WriteAll(fd.Get(), Frame::kLengthSize, frame, 0, deadline) &&
+               WriteAll(fd.Get(), frame.Size() - Frame::kLengthSize, frame, Frame::kLengthSize, deadline);
     });
 }
 
