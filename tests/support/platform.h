@@ -10,7 +10,7 @@
 namespace fileindex_test {
 
 struct FakeShare {
-    std::string path;
+    std::string path = {};
     bool encrypted = false;
     bool encryptionKind = false;
     bool readOnly = false;

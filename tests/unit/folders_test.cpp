@@ -142,20 +142,6 @@ TEST_F(FoldersStore, KeepsEscapedNames) {
     EXPECT_EQ(conf, FolderConf());
 }
 
-TEST_F(FoldersStore, HoldsTheDocumentForItsSubclasses) {
-    class Document : public Folders {
-    public:
-        [[nodiscard]] std::string Text() const { return Print(document_); }
-    };
-    GivenFolderConf(R"({"/photo/a":{"audio":true,"later":1}})");
-    Document store;
-    EXPECT_EQ("{}", store.Text());
-    ASSERT_TRUE(store.Load());
-    EXPECT_EQ(R"({"/photo/a":{"audio":true,"later":1}})", store.Text());
-    ASSERT_TRUE(store.Save());
-    EXPECT_EQ("{" + FolderRecord("/photo/a", "", "a") + "}", store.Text());
-}
-
 TEST_F(FoldersStore, RefusesADocumentThatIsNoObject) {
     for (const char *text : {"[]", R"("text")", "5", "null", "true"}) {
         Forget();
