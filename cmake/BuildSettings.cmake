@@ -3,6 +3,7 @@
 # A packager's compiler may know warnings that ours does not, so only the presets make them fatal.
 option(FILEINDEX_WERROR "Treat warnings as errors" OFF)
 option(FILEINDEX_COVERAGE "Instrument for gcov" OFF)
+option(FILEINDEX_FUZZ "Build the fuzz targets; needs Clang" OFF)
 set(FILEINDEX_SANITIZE "" CACHE STRING "Sanitizers to build with: \"address,undefined\" or \"thread\"")
 
 if(NOT CMAKE_BUILD_TYPE AND NOT CMAKE_CONFIGURATION_TYPES)
@@ -38,6 +39,12 @@ target_compile_options(project_warnings INTERFACE
 if(FILEINDEX_SANITIZE)
     add_compile_options(-fsanitize=${FILEINDEX_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)
     add_link_options(-fsanitize=${FILEINDEX_SANITIZE})
+endif()
+
+if(FILEINDEX_FUZZ)
+    set(instrumentation -fsanitize=address,undefined,fuzzer-no-link)
+    add_compile_options(${instrumentation} -fno-sanitize-recover=all -fno-omit-frame-pointer)
+    add_link_options(${instrumentation})
 endif()
 
 if(FILEINDEX_COVERAGE)
