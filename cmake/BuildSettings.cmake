@@ -41,12 +41,6 @@ if(FILEINDEX_SANITIZE)
     add_link_options(-fsanitize=${FILEINDEX_SANITIZE})
 endif()
 
-if(FILEINDEX_FUZZ)
-    set(instrumentation -fsanitize=address,undefined,fuzzer-no-link)
-    add_compile_options(${instrumentation} -fno-sanitize-recover=all -fno-omit-frame-pointer)
-    add_link_options(${instrumentation})
-endif()
-
 if(FILEINDEX_COVERAGE)
     add_compile_options(--coverage)
     add_link_options(--coverage)
