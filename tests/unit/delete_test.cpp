@@ -287,6 +287,43 @@ TEST_F(IndexReindex, RevivesSharesAndQueuesOneEventForEachPath) {
     EXPECT_THAT(Records(), IsEmpty());
 }
 
+/// Between the first and the second event of one request the queue's consumer or another writer does something.
+TEST_F(IndexReindex, SeesTheQueueAsItIsAtEachEvent) {
+    const std::string queue = "/vol1/photo/@eaDir/VORK@file_index_queue";
+    const auto lineOf = [](const std::string &name) {
+        return R"({"data":null,"event":65536,"path":"/vol1/photo/)" + name + "\"}";
+    };
+    const std::string a = lineOf("a");
+    const std::string b = lineOf("b");
+    const std::string c = lineOf("c");
+    const struct {
+        const char *name;
+        std::function<void()> between;
+        std::vector<std::string> lines;
+    } rows[] = {
+        {"nothing", [] {}, {a, b}},
+        {"taken and worked off", [&] { fs::remove(queue); }, {b, a}},
+        {"taken", [&] { fs::rename(queue, queue + ".tmp"); }, {b}},
+        {"emptied in place", [&] { WriteFile(queue, ""); }, {b, a}},
+        {"written anew in place, of the same size", [&] { WriteFile(queue, c + "\n"); }, {c, b, a}},
+        {"replaced by a longer one",
+         [&] {
+             fs::rename(queue, queue + ".old");
+             WriteFile(queue, c + "\n" + c + "\n");
+         },
+         {c, c, b, a}},
+        {"appended to", [&] { WriteFile(queue, a + "\n" + c + "\n"); }, {a, c, b}},
+    };
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        fs::remove_all("/vol1/photo/@eaDir");
+        Fail({.call = "flock", .about = queue, .nth = 2, .action = row.between});
+        EXPECT_TRUE(Reindex(R"(["/photo/a","/photo/b","/photo/a","/photo/b"])"));
+        EXPECT_EQ(row.lines, Queue("photo"));
+        Script::Current().Finish();
+    }
+}
+
 TEST_F(IndexReindex, GoesOnWhenAShareCannotBeRevived) {
     daemon_.Stop();
     GivenStatusConf(R"({"no_space":{"photo":true}})");

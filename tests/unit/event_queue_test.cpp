@@ -74,6 +74,22 @@ TEST_F(EventQueue, DropsWhatAQueuedReindexOfThePathCovers) {
          R"({"event":65536.0,"path":"/vol1/photo/a"})"
          "\n",
          "", "/vol1/photo/a", true},
+        {"escaped path",
+         R"({"path":"\/vol1\/photo\/\u0061","event":65536})"
+         "\n",
+         "", "/vol1/photo/a", true},
+        {"event written as 6.5536e4",
+         R"({"path":"/vol1/photo/a","event":6.5536e4})"
+         "\n",
+         "", "/vol1/photo/a", true},
+        {"the last of two paths",
+         R"({"path":"/vol1/photo/a","event":65536,"path":"/b"})"
+         "\n",
+         "", "/vol1/photo/a", false},
+        {"the path inside the data",
+         R"({"data":{"path":"/vol1/photo/a"},"event":65536,"path":"/b"})"
+         "\n",
+         "", "/vol1/photo/a", false},
         {"in a line beyond 1 MiB", endless + "\n", "", "/vol1/photo/a", false},
         {"behind a line beyond 1 MiB", endless + "\n" + kReindexLine + "\n", "", "/vol1/photo/a", true},
     };
