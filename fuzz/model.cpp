@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <iterator>
 #include <set>
+#include <utility>
 
 namespace fileindex_fuzz {
 
@@ -147,13 +148,14 @@ bool Model::Delete(const Json::Value &paths) {
 }
 
 bool Model::Reindex(const Json::Value &paths) {
+    const Json::Value &marked = std::as_const(status)["no_space"];  // not made by asking
     std::set<std::string> outOfSpace;
     for (const Json::Value &path : paths) {
         const std::string share = ShareOf(path.asString());
         if (!HasFolderOf(share)) {
             return false;
         }
-        if (status["no_space"].isMember(share)) {
+        if (marked.isMember(share)) {
             outOfSpace.insert(share);
         }
     }

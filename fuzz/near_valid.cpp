@@ -29,7 +29,7 @@ constexpr std::string_view kNames[] = {"a", "b", "photo", "ro", "away", "upgrade
 constexpr std::string_view kRecordKeys[] = {"name", "document", "audio", "video", "photo"};
 constexpr std::string_view kTails[] = {",",  "}",    "]", "x",  " 1",
                                        "//", "/**/", "#", "\n", std::string_view("\0", 1)};
-constexpr std::size_t kSizes[] = {64 * 1024, 128 * 1024, 1024 * 1024, 1024 * 1024 + 64 * 1024};
+constexpr std::size_t kSizes[] = {64UL * 1024, 128UL * 1024, 1024UL * 1024, 1088UL * 1024};
 
 }  // namespace
 

@@ -20,7 +20,7 @@ namespace {
 using namespace VORK::FILEINDEX::internal;  // NOLINT(google-build-using-namespace): the subject of every check
 
 constexpr char kFile[] = "/tmp/queue";
-constexpr std::size_t kLongest = 1024 * 1024;
+constexpr std::size_t kLongest = 1024UL * 1024;
 constexpr std::size_t kShown = 256;
 constexpr unsigned kRename = 256;
 

@@ -17,7 +17,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     constexpr std::uint8_t kBlock = 225;  // most inputs stay small: a large one costs as much as a thousand
     constexpr std::uint8_t kLongest = 254;
     if (kind >= kBlock) {
-        const std::size_t filler = (kind >= kLongest ? 1024 : 64) * 1024 + excess - 500;
+        const std::size_t filler = (kind >= kLongest ? 1024UL : 64UL) * 1024 + excess - 500;
         text.insert(place % (text.size() + 1), std::string(filler, kind % 2 == 0 ? 'x' : ' '));
     }
     fileindex_fuzz::CheckQueue(text,
