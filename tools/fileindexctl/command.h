@@ -12,19 +12,19 @@
 
 namespace fileindexctl {
 
-enum class Arity { Flag, Optional, One, Many };
+/// What comes behind a parameter's name; for a positional argument, how often it may stand.
+enum class Takes { Nothing, One, Number, Optional, Many };
 
 /// A positional argument ("PATH") or an option ("--share").
 struct Parameter {
     std::string_view name;
-    Arity arity;
+    Takes takes;
     std::string_view value;  ///< what an option takes, for the help; empty for flags and positional arguments
     std::string_view help;
-    bool number = false;                          ///< takes a number of 0 or more
     std::span<const std::string_view> choices{};  ///< the only values allowed; none given: any
 
     constexpr bool IsOption() const { return name.starts_with("--"); }
-    constexpr bool IsRequired() const { return !IsOption() && (arity == Arity::One || arity == Arity::Many); }
+    constexpr bool IsRequired() const { return !IsOption() && (takes == Takes::One || takes == Takes::Many); }
 };
 
 struct Command {

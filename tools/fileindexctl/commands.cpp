@@ -7,50 +7,50 @@ namespace {
 
 constexpr std::string_view kSortFields[] = {"path", "name", "document", "audio", "video", "photo"};
 
-constexpr Parameter kMedia = {"--media", Arity::One, "KINDS",
+constexpr Parameter kMedia = {"--media", Takes::One, "KINDS",
                               "what to index: document, audio, video and photo, with commas between; all; none"};
-constexpr Parameter kName = {"--name", Arity::One, "NAME", "the name that people are shown"};
+constexpr Parameter kName = {"--name", Takes::One, "NAME", "the name that people are shown"};
 
 constexpr Parameter kList[] = {
-    {"--share", Arity::One, "SHARE", "only the folders of this share"},
-    {"--sort", Arity::One, "FIELD", "order by path (if not given), name or a kind of file", false, kSortFields},
-    {"--desc", Arity::Flag, "", "in descending order"},
-    {"--offset", Arity::One, "N", "leave out the first N", true},
-    {"--limit", Arity::One, "N", "show at most N", true},
-    {"--status", Arity::Flag, "", "add how far indexing is; reads the queues"},
+    {"--share", Takes::One, "SHARE", "only the folders of this share"},
+    {"--sort", Takes::One, "FIELD", "order by path (if not given), name or a kind of file", kSortFields},
+    {"--desc", Takes::Nothing, "", "in descending order"},
+    {"--offset", Takes::Number, "N", "leave out the first N"},
+    {"--limit", Takes::Number, "N", "show at most N"},
+    {"--status", Takes::Nothing, "", "add how far indexing is; reads the queues"},
 };
-constexpr Parameter kFolder[] = {{"PATH", Arity::One, "", "the indexed folder: /SHARE/..."}};
+constexpr Parameter kFolder[] = {{"PATH", Takes::One, "", "the indexed folder: /SHARE/..."}};
 constexpr Parameter kAdd[] = {
-    {"PATH", Arity::One, "", "the folder: /SHARE/..."},
-    {"--name", Arity::One, "NAME", "the name that people are shown; if not given, the last part of the path"},
-    {"--media", Arity::One, "KINDS",
+    {"PATH", Takes::One, "", "the folder: /SHARE/..."},
+    {"--name", Takes::One, "NAME", "the name that people are shown; if not given, the last part of the path"},
+    {"--media", Takes::One, "KINDS",
      "what to index: document, audio, video and photo, with commas between; all (if not given); none"},
 };
-constexpr Parameter kSet[] = {{"PATH", Arity::One, "", "the indexed folder: /SHARE/..."}, kName, kMedia};
-constexpr Parameter kYes = {"--yes", Arity::Flag, "", "delete without asking"};
+constexpr Parameter kSet[] = {{"PATH", Takes::One, "", "the indexed folder: /SHARE/..."}, kName, kMedia};
+constexpr Parameter kYes = {"--yes", Takes::Nothing, "", "delete without asking"};
 constexpr Parameter kRemove[] = {
-    {"PATH", Arity::Many, "", "indexed folders"},
-    {"--force", Arity::Flag, "", "also folders whose share is away"},
+    {"PATH", Takes::Many, "", "indexed folders"},
+    {"--force", Takes::Nothing, "", "also folders whose share is away"},
     kYes,
 };
-constexpr Parameter kQuestion[] = {{"PATH", Arity::One, "", "a share path (/SHARE/...) or a full path"}};
+constexpr Parameter kQuestion[] = {{"PATH", Takes::One, "", "a share path (/SHARE/...) or a full path"}};
 constexpr Parameter kPause[] = {
-    {"HOURS", Arity::Optional, "", "for how long: 8h or 8; 0 or nothing: without an end"},
-    {"--until", Arity::One, "HH:MM", "until this local time comes next"},
+    {"HOURS", Takes::Optional, "", "for how long: 8h or 8; 0 or nothing: without an end"},
+    {"--until", Takes::One, "HH:MM", "until this local time comes next"},
 };
 constexpr Parameter kStatus[] = {
-    {"PATH", Arity::Optional, "", "only this indexed folder"},
-    {"--share", Arity::One, "SHARE", "only this share"},
+    {"PATH", Takes::Optional, "", "only this indexed folder"},
+    {"--share", Takes::One, "SHARE", "only this share"},
 };
-constexpr Parameter kReindex[] = {{"PATH", Arity::Many, "", "share paths in or of indexed folders"}};
-constexpr Parameter kRevive[] = {{"SHARE", Arity::Many, "", "names of shares"}};
-constexpr Parameter kShare[] = {{"SHARE", Arity::One, "", "the name of the share"}};
+constexpr Parameter kReindex[] = {{"PATH", Takes::Many, "", "share paths in or of indexed folders"}};
+constexpr Parameter kRevive[] = {{"SHARE", Takes::Many, "", "names of shares"}};
+constexpr Parameter kShare[] = {{"SHARE", Takes::One, "", "the name of the share"}};
 constexpr Parameter kShareRename[] = {
-    {"OLD", Arity::One, "", "the name that the share had"},
-    {"NEW", Arity::One, "", "the name that the share has now"},
+    {"OLD", Takes::One, "", "the name that the share had"},
+    {"NEW", Takes::One, "", "the name that the share has now"},
 };
-constexpr Parameter kShareDelete[] = {{"SHARE", Arity::One, "", "the name of the share"}, kYes};
-constexpr Parameter kMigrate[] = {{"--dry-run", Arity::Flag, "", "only say what would be done"}};
+constexpr Parameter kShareDelete[] = {{"SHARE", Takes::One, "", "the name of the share"}, kYes};
+constexpr Parameter kMigrate[] = {{"--dry-run", Takes::Nothing, "", "only say what would be done"}};
 
 constexpr struct {
     std::string_view name;

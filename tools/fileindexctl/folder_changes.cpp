@@ -76,10 +76,10 @@ ExitStatus Upsert(const Json::Value &record, Output &output) {
 void WarnOfNesting(const std::string &path, const Folders &folders, Output &output) {
     const Place place = AsFullPath(Locate(path, folders));
     for (const auto &other : Covering(place, folders)) {
-        output.Warn("\"" + path + "\" lies in the indexed folder \"" + other + "\" already");
+        output.Warn(Quoted(path) + " lies in the indexed folder " + Quoted(other) + " already");
     }
     for (const auto &other : Contained(place, folders)) {
-        output.Warn("\"" + path + "\" covers the indexed folder \"" + other + "\"");
+        output.Warn(Quoted(path) + " covers the indexed folder " + Quoted(other));
     }
 }
 

@@ -17,7 +17,6 @@ namespace fileindexctl {
 
 namespace {
 
-using VORK::FILEINDEX::Folder;
 using VORK::FILEINDEX::IndexMgr;
 
 constexpr std::string_view kIndexMgr = "index_mgr.cpp";

@@ -4,6 +4,9 @@
 
 #include <fileindex/error.h>
 
+#include <fcntl.h>
+#include <unistd.h>
+
 #include <cstdio>
 #include <exception>
 #include <string_view>
@@ -14,6 +17,15 @@ using namespace fileindexctl;
 
 // At this level the library also records events that it dropped, which its results do not tell.
 constexpr int kLogDroppedEvents = 7;
+
+// With one of them closed, a configuration file would be opened under its number and take what is printed.
+void OpenStandardStreams() {
+    int descriptor = -1;
+    do {
+        descriptor = open("/dev/null", O_RDWR);
+    } while (descriptor >= 0 && descriptor <= STDERR_FILENO);
+    close(descriptor);
+}
 
 // A command line that does not parse is reported as JSON too, when it asks for that anywhere.
 bool AsksForJson(int argc, const char *const argv[]) {
@@ -54,6 +66,7 @@ ExitStatus ParseAndRun(int argc, const char *const argv[]) {
 }  // namespace
 
 int main(int argc, char *argv[]) {
+    OpenStandardStreams();
     VORK::FILEINDEX::LOG_LEVEL = kLogDroppedEvents;
     try {
         return static_cast<int>(ParseAndRun(argc, argv));

@@ -17,7 +17,7 @@ constexpr const char *kFooter =
     "69 daemon or service unreachable, 70 partly done, 73 cannot save, 75 lock busy, 77 permission,\n"
     "78 platform not configured.";
 
-// The lowest value a user can type that CLI11 would take for an option is left alone: numbers are checked as text.
+// Checked as text, so that what is read later is digits only and fits.
 std::string CheckNumber(const std::string &text) {
     const bool digits = !text.empty() && text.find_first_not_of("0123456789") == std::string::npos;
     return digits && text.size() <= 18 ? std::string() : "a number of 0 or more is expected, not \"" + text + "\"";
@@ -91,16 +91,16 @@ private:
     static void AddParameter(CLI::App &app, const Parameter &parameter) {
         const std::string name(parameter.name);
         const std::string help(parameter.help);
-        if (parameter.arity == Arity::Flag) {
+        if (parameter.takes == Takes::Nothing) {
             app.add_flag_callback(
                 name, [] {}, help);
             return;
         }
         CLI::Option *option = app.add_option(name, CLI::callback_t([](const auto &) { return true; }), help);
         option->type_name(std::string(parameter.value))->required(parameter.IsRequired());
-        option->expected(1, parameter.arity == Arity::Many ? CLI::detail::expected_max_vector_size : 1);
-        option->allow_extra_args(parameter.arity == Arity::Many);
-        if (parameter.number) {
+        option->expected(1, parameter.takes == Takes::Many ? CLI::detail::expected_max_vector_size : 1);
+        option->allow_extra_args(parameter.takes == Takes::Many);
+        if (parameter.takes == Takes::Number) {
             option->check(CheckNumber);
         }
         if (!parameter.choices.empty()) {
@@ -116,7 +116,7 @@ private:
             if (option->count() == 0) {
                 continue;
             }
-            const bool flag = parameter.arity == Arity::Flag;
+            const bool flag = parameter.takes == Takes::Nothing;
             arguments.Set(parameter.name, flag ? std::vector<std::string>() : option->results());
         }
         return arguments;

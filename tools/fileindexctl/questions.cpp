@@ -26,7 +26,7 @@ ExitStatus Answer(bool yes) {
 
 // Every answer says which kind of path the question was taken to be about.
 Place Asked(const Arguments &arguments, const Folders &folders, Output &output) {
-    const Place place = Locate(arguments.One("PATH"), folders);
+    Place place = Locate(arguments.One("PATH"), folders);
     output.Data()["path"] = place.path;
     output.Data()["taken_as"] = place.TakenAs();
     return place;
@@ -46,6 +46,11 @@ ExitStatus CheckPath(const Arguments &arguments, Output &output) {
     const auto covering = Covering(place, folders);
     output.Data()["indexed"] = indexed;
     output.Data()["covered_by"] = Array(covering);
+    const auto alsoCovering = Covering(AsFullPath(place), folders);
+    if (!indexed && !alsoCovering.empty()) {
+        output.Warn("as a full path, \"" + place.fullPath + "\" lies in " + Enumerate(alsoCovering) +
+                    ": one share is inside another");
+    }
     Say(place, indexed ? "indexed, covered by " + Enumerate(covering) : "not indexed", output);
     return Answer(indexed);
 }

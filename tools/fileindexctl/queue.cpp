@@ -22,7 +22,7 @@ namespace fileindexctl {
 
 namespace {
 
-constexpr std::size_t kLongestLine = 1024 * 1024;
+constexpr std::size_t kLongestLine = std::size_t{1} << 20;
 constexpr unsigned kRenameEvent = 256;
 constexpr int kDeepest = 256;
 

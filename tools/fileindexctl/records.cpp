@@ -2,8 +2,10 @@
 
 #include <algorithm>
 #include <array>
+#include <cerrno>
 #include <cstdarg>
 #include <cstdio>
+#include <exception>
 
 // <syslog.h> is left out: a fortified build would make its `syslog` an inline function that clashes with the
 // definition below.
@@ -13,14 +15,17 @@ namespace fileindexctl {
 
 namespace {
 
-// A call of `syslog` must not throw, and this one comes from foreign code.
+// Must not throw, as its callers know it, and must leave errno alone: the message may name it ("%m") once more.
 void Keep(const char *format, va_list arguments) noexcept {
+    const int error = errno;
     std::array<char, 4096> text{};
+    std::vsnprintf(text.data(), text.size(), format, arguments);
     try {
-        std::vsnprintf(text.data(), text.size(), format, arguments);
         Records().Add(text.data());
-    } catch (...) {  // NOLINT(bugprone-empty-catch): the record still reaches the system log
+    } catch (const std::exception &) {
+        Records().Clear();  // the record still reaches the system log
     }
+    errno = error;
 }
 
 }  // namespace
@@ -70,7 +75,7 @@ __attribute__((visibility("default"), format(printf, 2, 3))) void syslog(int pri
     va_end(arguments);
 }
 
-// What a fortified library calls in its place.
+// What a fortified library calls in its place. NOLINTNEXTLINE(bugprone-reserved-identifier)
 __attribute__((visibility("default"), format(printf, 3, 4))) void __syslog_chk(int priority, int /*flag*/,
                                                                                const char *format, ...) {
     va_list arguments;

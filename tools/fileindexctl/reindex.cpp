@@ -56,6 +56,7 @@ std::vector<PlannedStep> Plan(const std::vector<Place> &places) {
         }
     }
     std::vector<PlannedStep> plan;
+    plan.reserve(full.size() + 1);
     for (const auto &share : full) {
         plan.push_back({share + " revived",
                         "the share stays marked as out of space, or fileindexd cannot be reached",

@@ -38,7 +38,7 @@ std::vector<std::string> PathsOf(const std::string &share, const Folders &folder
 }
 
 std::vector<std::string> RequireIndexed(const std::string &share, const Folders &folders) {
-    const auto paths = PathsOf(share, folders);
+    auto paths = PathsOf(share, folders);
     if (paths.empty()) {
         throw Failure(ExitStatus::NoSuchFolder, "no folder of the share \"" + share + "\" is indexed");
     }
@@ -72,7 +72,8 @@ void WarnOfOverwriting(const std::vector<std::string> &paths, const std::string 
         const std::string target = VORK::FILEINDEX::ReplaceShareName(path, newShare);
         for (const auto &folder : folders) {
             if (folder.path == target) {
-                output.Warn("\"" + target + "\" was indexed already; it has the settings of \"" + path + "\" now");
+                output.Warn(Quoted(target) + " was indexed already; it has the settings of " + Quoted(path) +
+                            " now");
             }
         }
     }

@@ -44,13 +44,16 @@ std::string Age(const std::optional<long long> &since) {
         return "-";
     }
     const long long seconds = std::max<long long>(0, std::time(nullptr) - *since);
-    if (seconds < 120) {
+    constexpr long long minute = 60;
+    constexpr long long hour = 60 * minute;
+    constexpr long long day = 24 * hour;
+    if (seconds < 2 * minute) {
         return std::to_string(seconds) + " s";
     }
-    if (seconds < 2 * 3600) {
-        return std::to_string(seconds / 60) + " min";
+    if (seconds < 2 * hour) {
+        return std::to_string(seconds / minute) + " min";
     }
-    return seconds < 2 * 86400 ? std::to_string(seconds / 3600) + " h" : std::to_string(seconds / 86400) + " days";
+    return seconds < 2 * day ? std::to_string(seconds / hour) + " h" : std::to_string(seconds / day) + " days";
 }
 
 void ShowRows(const std::vector<std::vector<std::string>> &rows, unsigned width, Output &output) {

@@ -62,12 +62,17 @@ unsigned FirstColumnWidth(const std::vector<unsigned> &widths, unsigned width) {
 
 std::string Printable(const std::string &text) {
     std::string result;
-    for (const char character : text) {
-        const auto byte = static_cast<unsigned char>(character);
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        const auto byte = static_cast<unsigned char>(text[i]);
+        const auto next = static_cast<unsigned char>(i + 1 < text.size() ? text[i + 1] : 0);
         if (byte < 0x20 || byte == 0x7F) {
             result += Escape(byte);
+        } else if (byte == 0xC2 && next >= 0x80 &&
+                   next < 0xA0) {  // terminals obey the upper control characters too
+            result += Escape(byte) + Escape(next);
+            ++i;
         } else {
-            result += character;
+            result += text[i];
         }
     }
     return result;
@@ -89,6 +94,10 @@ std::string ShortenFront(const std::string &text, unsigned width) {
         rest.erase(0, static_cast<std::size_t>(std::max(length, 1)));
     }
     return "..." + rest;
+}
+
+std::string Quoted(const std::string &text) {
+    return "\"" + text + "\"";
 }
 
 std::string ShellWord(const std::string &text) {

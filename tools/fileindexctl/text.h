@@ -18,6 +18,9 @@ unsigned DisplayWidth(const std::string &text);
 /// The end of the text, with "..." in front, so that it takes at most `width` columns.
 std::string ShortenFront(const std::string &text, unsigned width);
 
+/// The text in double quotes.
+std::string Quoted(const std::string &text);
+
 /// The text as one word of a shell command.
 std::string ShellWord(const std::string &text);
 
