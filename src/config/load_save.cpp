@@ -27,6 +27,23 @@ Presence PresenceOf(const std::string &path) {
     return errno == ENOENT || errno == ENOTDIR ? Presence::kMissing : Presence::kUnknown;
 }
 
+/// A text that is no JSON, or was read while a writer was at work, is read again: the writer may have been starved
+/// of the file's lock, or hold it while it is not running. What is really broken stays so.
+bool ReadAndParse(const std::string &path, const TextParser &parse) {
+    constexpr int kAttempts = 3;
+    for (int attempt = 1; attempt <= kAttempts; ++attempt) {
+        std::string text;
+        bool undisturbed = false;
+        if (!ReadFile(path, text, undisturbed)) {
+            return false;
+        }
+        if ((undisturbed || attempt == kAttempts) && parse(text)) {
+            return true;
+        }
+    }
+    return false;
+}
+
 }  // namespace
 
 bool LoadConfig(const std::string &path, const TextParser &parse) {
@@ -35,11 +52,7 @@ bool LoadConfig(const std::string &path, const TextParser &parse) {
         return true;
     }
     // A file too large for memory is one more that cannot be read.
-    const bool read = NoThrow([&] {
-        std::string text;
-        return presence == Presence::kPresent && ReadFile(path, text) && parse(text);
-    });
-    if (read) {
+    if (presence == Presence::kPresent && NoThrow([&] { return ReadAndParse(path, parse); })) {
         return true;
     }
     syslog(LOG_ERR, "%s:%d Failed to load json from %s", kConfigModule, __LINE__, path.c_str());

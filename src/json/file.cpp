@@ -28,17 +28,18 @@ bool IsRegular(int fd, struct stat &status) {
 ///
 /// Only a courtesy between well-behaved processes: a stranger who sits on the lock delays a call by 50 ms and
 /// stops nobody.
-void AwaitDataLock(int fd, int operation) {
+bool AwaitDataLock(int fd, int operation) {
     constexpr auto kPatience = std::chrono::milliseconds(50);
-    constexpr auto kPause = std::chrono::microseconds(200);
+    constexpr auto kPause = std::chrono::microseconds(50);
     const auto deadline = std::chrono::steady_clock::now() + kPatience;
     while (flock(fd, operation | LOCK_NB) != 0) {
         const bool busy = errno == EWOULDBLOCK || errno == EINTR;
         if (!busy || std::chrono::steady_clock::now() >= deadline) {
-            return;
+            return false;
         }
         std::this_thread::sleep_for(kPause);
     }
+    return true;
 }
 
 bool ReadAll(int fd, off_t sizeHint, std::string &out) {
@@ -106,7 +107,7 @@ bool Replace(UniqueFd fd, const std::string &path, const std::string &text) {
     if (!IsRegular(fd.Get(), status)) {
         return false;
     }
-    AwaitDataLock(fd.Get(), LOCK_EX);
+    (void)AwaitDataLock(fd.Get(), LOCK_EX);
     std::string old;
     if (!ReadAll(fd.Get(), status.st_size, old)) {
         return false;
@@ -155,7 +156,7 @@ bool CreateByName(const std::string &path, const std::string &text) {
     if (!fd) {
         return false;
     }
-    AwaitDataLock(fd.Get(), LOCK_EX);
+    (void)AwaitDataLock(fd.Get(), LOCK_EX);
     if (WriteOnce(fd.Get(), text) && fd.Close()) {
         return true;
     }
@@ -187,14 +188,21 @@ bool Create(const std::string &path, const std::string &text) {
 
 }  // namespace
 
-bool ReadFile(const std::string &path, std::string &text) {
+bool ReadFile(const std::string &path, std::string &text, bool &undisturbed) {
     const UniqueFd fd(open(path.c_str(), O_RDONLY | kOpenFlags));
     struct stat status = {};
     if (!fd || !IsRegular(fd.Get(), status)) {
         return false;
     }
-    AwaitDataLock(fd.Get(), LOCK_SH);
-    return ReadAll(fd.Get(), status.st_size, text);
+    undisturbed = AwaitDataLock(fd.Get(), LOCK_SH);
+    if (!ReadAll(fd.Get(), status.st_size, text)) {
+        return false;
+    }
+    if (!undisturbed) {
+        std::string again;
+        undisturbed = ReadAll(fd.Get(), status.st_size, again) && again == text;
+    }
+    return true;
 }
 
 bool WriteFile(const std::string &path, const std::string &text) {

@@ -9,7 +9,10 @@ namespace VORK::FILEINDEX::internal {
 
 /// Reads one whole text, the old or the new one whatever a writer is doing. False when the path is not a regular
 /// file or cannot be read. Does not follow a link at the path and never blocks.
-bool ReadFile(const std::string &path, std::string &text);
+///
+/// `undisturbed` is false when the file's lock stayed busy and two reads without it differed: a writer is at work,
+/// and the text may be part old and part new.
+bool ReadFile(const std::string &path, std::string &text, bool &undisturbed);
 
 /// Writes the text over the file's old content, or creates the file. False when that fails; the old content is
 /// then back in place, and a file that did not exist does not exist.
