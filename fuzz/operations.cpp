@@ -152,7 +152,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     FuzzedDataProvider input(data, size);
     Model model;
     const LeakCheck leaks;
-    constexpr int kMaxSteps = 40;
+    constexpr int kMaxSteps = 16;
     for (int step = 0; step < kMaxSteps && input.remaining_bytes() > 0; ++step) {
         const int operation = input.ConsumeIntegralInRange(0, 11);
         constexpr int kFolderOperations = 5;

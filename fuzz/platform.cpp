@@ -233,8 +233,13 @@ int VLIBCUnicodeUTF8StrCaseCmp(const char *a, const char *b) {
 
 namespace VORKNOTIFYD {
 
-MonitorQueue::MonitorQueue(const Json::Value &) : description_(nullptr) {}
-MonitorQueue::~MonitorQueue() = default;
+struct MonitorQueue::Description {};
+
+// Something to lose, so that a queue that is not given back shows.
+MonitorQueue::MonitorQueue(const Json::Value &) : description_(new Description()) {}
+MonitorQueue::~MonitorQueue() {
+    delete description_;
+}
 bool MonitorQueue::Upsert(const MonitorQueue &, const std::string &, _tag_monitor_queue_type_) {
     return true;
 }
