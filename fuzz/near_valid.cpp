@@ -62,7 +62,9 @@ std::string NearValid::Value(int depth) {
         case 4: {
             std::string array = "[";
             for (std::size_t left = Below(4); left > 0; --left) {
-                array += Blank() + Value(depth - 1) + (left > 1 ? "," : "");
+                array += Blank();
+                array += Value(depth - 1);
+                array += left > 1 ? "," : "";
             }
             return array + ']';
         }
@@ -78,7 +80,11 @@ template <typename Key, typename Content>
 std::string NearValid::Object(std::size_t members, Key key, Content content) {
     std::string object = "{";
     for (; members > 0; --members) {
-        object += Blank() + key() + Blank() + ':' + Blank() + content() + Blank() + (members > 1 ? "," : "");
+        // One by one: the order in which the operands of "+" are made is the compiler's choice.
+        for (const std::string &part : {Blank(), key(), Blank(), std::string(":"), Blank(), content(), Blank()}) {
+            object += part;
+        }
+        object += members > 1 ? "," : "";
     }
     return object + '}';
 }
@@ -131,7 +137,8 @@ std::string NearValid::FolderConf() {
     return Spoil(Object(
         Below(6),
         [&] {
-            next = static_cast<char>(next + Below(3) + (OneIn(10) ? 0 : 1));
+            next = static_cast<char>(next + Below(3));
+            next = static_cast<char>(next + (OneIn(10) ? 0 : 1));
             return Quoted(OneIn(8) ? OneOf(kPaths) : std::string("/photo/") + next);
         },
         [&] { return OneIn(15) ? Value(2) : Record(OneIn(2)); }));
@@ -197,7 +204,8 @@ std::string NearValid::Spoil(std::string text) {
 }
 
 std::string NearValid::LongLine() {
-    const std::size_t size = kSizes[Below(std::size(kSizes))] + Below(7) - 3;
+    std::size_t size = kSizes[Below(std::size(kSizes))] - 3;
+    size += Below(7);
     if (OneIn(4)) {
         return std::string(size, 'x');
     }
@@ -210,7 +218,7 @@ std::string NearValid::Queue() {
     for (std::size_t left = Below(8); left > 0; --left) {
         text += (OneIn(2000) ? LongLine() : QueueLine()) + '\n';
     }
-    return text.substr(0, text.size() - (OneIn(3) && !text.empty() ? 1 : 0));
+    return text.substr(0, text.size() - (!text.empty() && OneIn(3) ? 1 : 0));
 }
 
 }  // namespace fileindex_fuzz
