@@ -93,45 +93,17 @@ void AddFirst(int count) {
     Check(count == 0 || IndexMgr::Add(request), "the first folders");
 }
 
-/// A worker, each time it is killed another in its place.
-class Team {
-public:
-    Team(Board &board, int firstFolder, int markers)
-        : start_([&board, firstFolder, markers](int worker) {
-              return Start([=, &board] { Work(board, worker, firstFolder, markers); });
-          }),
-          board_(board) {
-        for (int worker = 0; worker < kWorkers; ++worker) {
-            members_[worker] = start_(worker);
-        }
-    }
+using Team = std::array<pid_t, kWorkers>;
 
-    /// False when the worker had finished already.
-    bool KillOne(int worker) {
-        {
-            const Spinlock guard(board_.noKill[worker]);
-            ::kill(members_[worker], SIGKILL);
-            if (const int status = Wait(members_[worker]); status != 128 + SIGKILL) {
-                Check(status == 0, "a worker failed");
-                members_[worker] = 0;
-                return false;
-            }
-        }
-        members_[worker] = start_(worker);
-        return true;
-    }
-
-    void Finish() {
-        for (const pid_t member : members_) {
-            Check(member == 0 || Wait(member) == 0, "a worker failed");
-        }
-    }
-
-private:
-    std::function<pid_t(int)> start_;
-    Board &board_;
-    std::array<pid_t, kWorkers> members_{};
-};
+/// False when the worker had finished already.
+bool KillWorker(Board &board, Team &team, int worker) {
+    const Spinlock guard(board.noKill[worker]);
+    ::kill(team[worker], SIGKILL);
+    const int status = Wait(team[worker]);
+    Check(status == 0 || status == 128 + SIGKILL, "a worker failed");
+    team[worker] = 0;
+    return status != 0;
+}
 
 void CheckBoard(const Board &board, int firstFolder, int markers) {
     Folders folders;
@@ -168,16 +140,25 @@ void Adders() {
     std::mt19937 random(1);
     AddFirst(firstFolder);
     auto &board = Shared<Board>();
-    Team team(board, firstFolder, markers);
+    const auto start = [&](int worker) {
+        return Start([&board, worker, firstFolder, markers] { Work(board, worker, firstFolder, markers); });
+    };
+    Team team{};
+    for (int worker = 0; worker < kWorkers; ++worker) {
+        team[worker] = start(worker);
+    }
     int kills = 0;
-    while (kills < wanted) {
+    for (; kills < wanted; ++kills) {
         ::usleep(random() % 100000);  // the instant to kill at, not a wait
-        if (!team.KillOne(static_cast<int>(random() % kWorkers))) {
+        const int worker = static_cast<int>(random() % kWorkers);
+        if (!KillWorker(board, team, worker)) {
             break;
         }
-        ++kills;
+        team[worker] = start(worker);
     }
-    team.Finish();
+    for (const pid_t member : team) {
+        Check(member == 0 || Wait(member) == 0, "a worker failed");
+    }
     CheckBoard(board, firstFolder, markers);
     RefuseOneMore();
     Kill(daemon);

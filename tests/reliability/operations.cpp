@@ -60,13 +60,11 @@ const Row kOperations[] = {
 
 /// Larger than a page, so that the reading and writing of a long file is in it.
 std::string FoldersBefore() {
-    const std::string record =
-        R"("name": "before", "document": true, "audio": false, "video": false, "photo": true})";
-    std::string text = "{";
-    for (const std::string path : {"/photo/a", "/photo/b", "/music/c"}) {
-        text += (text == "{" ? "" : ",") + ('"' + path + R"(": {"path": ")" + path + "\", ") + record;
+    Json::Value folders;
+    for (const char *path : {"/photo/a", "/photo/b", "/music/c"}) {
+        folders[path] = FolderRequest(path, "before");
     }
-    return text + std::string(5000, ' ') + "}\n";
+    return folders.toStyledString() + std::string(5000, ' ');
 }
 
 void Prepare(const Row &row) {

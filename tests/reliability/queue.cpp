@@ -162,6 +162,7 @@ void QueueWriters() {
     const int count = Rounds(4000, kMaxEvents);
     auto &board = Shared<Board>();
     std::vector<pid_t> writers;
+    writers.reserve(kWriters);
     for (int writer = 0; writer < kWriters; ++writer) {
         writers.push_back(Start([&board, writer, count] { WriteEvents(board, writer, count); }));
     }

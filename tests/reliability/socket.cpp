@@ -111,7 +111,7 @@ struct Mood {
 };
 
 constexpr size_t kShort = 10;
-constexpr size_t kLong = 4 * 1024 * 1024;
+constexpr size_t kLong = 4194304;  // 4 MiB
 
 constexpr Mood kMoods[] = {
     {"reads, short frame", Collect, kShort, true, Bytes::kWhole},
@@ -235,7 +235,7 @@ bool ModelWriteAll(const std::string &tape, size_t head, size_t size, Dice &dice
 }
 
 Transcript Model(unsigned seed, size_t bodySize) {
-    constexpr size_t kZeros = 64 * 1024;
+    constexpr size_t kZeros = 65536;
     const std::string frame = FrameOf(bodySize);
     const std::string tape = std::string(kZeros, '\0') + frame;
     Dice dice(seed);
