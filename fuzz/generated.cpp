@@ -1,7 +1,7 @@
 // Generates texts that are JSON or nearly so: to check them at once, or as the seeds of the fuzz targets.
 //
-//   fuzz_generated check COUNT [SEED]    COUNT texts: a third each of lines, folder files and documents, and
-//   queues fuzz_generated seeds DIR             files below DIR/TARGET, and the dictionary DIR/dictionary
+//   fuzz_generated check COUNT [SEED]    COUNT lines, folder files and documents, and some queues
+//   fuzz_generated seeds DIR             files below DIR/TARGET, and the dictionary DIR/dictionary
 
 #include "json_checks.h"
 #include "near_valid.h"
@@ -18,9 +18,24 @@ namespace {
 
 using namespace fileindex_fuzz;  // NOLINT(google-build-using-namespace): this is their program
 
+/// Queues with a line of just about the sizes at which the reader's buffer ends, and the longest line.
+void CheckLongLines() {
+    const std::string around = "{\"event\":256,\"path\":\"/a\"}\n";
+    for (const std::size_t about : {64UL * 1024, 128UL * 1024, 1024UL * 1024, 1088UL * 1024}) {
+        for (const std::size_t size : {about - 1, about, about + 1}) {
+            const std::string head = R"({"event":65536,"path":"/vol1/a/d","data":")";
+            const std::string line = head + std::string(size - head.size() - 2, 'x') + "\"}";
+            CheckQueue(line, about / 2);
+            CheckQueue(line + '\n', about);
+            CheckQueue(around + line + '\n' + around, around.size() + about / 2);
+        }
+    }
+}
+
 int Check(unsigned long count, unsigned long seed) {
     constexpr unsigned kTextsOfARound = 3;
     const unsigned long rounds = count / kTextsOfARound;
+    CheckLongLines();
     unsigned long events = 0;
     unsigned long folders = 0;
     unsigned long documents = 0;

@@ -29,7 +29,6 @@ constexpr std::string_view kNames[] = {"a", "b", "photo", "ro", "away", "upgrade
 constexpr std::string_view kRecordKeys[] = {"name", "document", "audio", "video", "photo"};
 constexpr std::string_view kTails[] = {",",  "}",    "]", "x",  " 1",
                                        "//", "/**/", "#", "\n", std::string_view("\0", 1)};
-constexpr std::size_t kSizes[] = {64UL * 1024, 128UL * 1024, 1024UL * 1024, 1088UL * 1024};
 
 }  // namespace
 
@@ -203,20 +202,10 @@ std::string NearValid::Spoil(std::string text) {
     }
 }
 
-std::string NearValid::LongLine() {
-    std::size_t size = kSizes[Below(std::size(kSizes))] - 3;
-    size += Below(7);
-    if (OneIn(4)) {
-        return std::string(size, 'x');
-    }
-    const std::string_view head = R"({"event":65536,"path":"/vol1/a/d","data":")";
-    return std::string(head) + std::string(size - head.size() - 2, OneIn(2) ? 'x' : '/') + "\"}";
-}
-
 std::string NearValid::Queue() {
     std::string text;
     for (std::size_t left = Below(8); left > 0; --left) {
-        text += (OneIn(2000) ? LongLine() : QueueLine()) + '\n';
+        text += QueueLine() + '\n';
     }
     return text.substr(0, text.size() - (!text.empty() && OneIn(3) ? 1 : 0));
 }

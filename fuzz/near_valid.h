@@ -22,7 +22,7 @@ public:
     std::string StatusConf();
     std::string Request();  ///< what IndexMgr's changes are given
 
-    /// Some lines; now and then one of just about a size at which the reader's buffer ends.
+    /// Some lines.
     std::string Queue();
 
     std::size_t Below(std::size_t bound) { return random_() % bound; }
@@ -43,7 +43,6 @@ private:
     std::string Record(bool withPath);
     std::string Flags();
     std::string Spoil(std::string text);
-    std::string LongLine();
 
     std::mt19937_64 random_;
 };
