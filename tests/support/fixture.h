@@ -14,6 +14,7 @@
 #include <gtest/gtest.h>
 #include <json/value.h>
 
+#include <functional>
 #include <set>
 #include <string>
 #include <vector>
@@ -30,6 +31,13 @@ constexpr char kStatusConf[] = "/usr/vork/etc/fileindex/status.conf";
 constexpr char kFolderLock[] = "/tmp/fileidx_cfg_folder.lock";
 constexpr char kStatusLock[] = "/tmp/fileidx_cfg_status.lock";
 
+// What FileIndexTest::Left() says when nothing else went wrong.
+const std::string kBusy = "9 config.cpp Failed to lock folder";
+const std::string kFolderConfUnreadable = std::string("6 config.cpp Failed to load json from ") + kFolderConf;
+const std::string kFolderConfUnwritable = std::string("7 config.cpp Failed to save json to ") + kFolderConf;
+const std::string kStatusConfUnreadable = std::string("6 config.cpp Failed to load json from ") + kStatusConf;
+const std::string kStatusConfUnwritable = std::string("7 config.cpp Failed to save json to ") + kStatusConf;
+
 Json::Value Parse(const std::string &text);  ///< strict; a text that is no JSON ends the test program
 std::string Print(const Json::Value &value);
 std::string Canonical(const std::string &text);  ///< Print(Parse(text)): one spelling for each document
@@ -39,6 +47,18 @@ void WriteFile(const std::string &path, const std::string &text);
 
 /// {path: {record}} with the flags named by letters of "davp", for putting documents together.
 std::string FolderRecord(const std::string &path, const std::string &name, const std::string &flags);
+
+/// A step of an operation that is made to fail, and what is left of the operation.
+struct FailingStep {
+    const char *name;
+    std::function<void()> arrange;
+    size_t done;       ///< steps before it, which stay done
+    std::string left;  ///< as FileIndexTest::Left()
+};
+
+inline std::function<void()> WillFail(const Fault &fault) {
+    return [fault] { Script::Current().Fail(fault); };
+}
 
 class FileIndexTest : public testing::Test {
 protected:
@@ -63,12 +83,16 @@ protected:
     std::vector<std::string> SentCommands() { return daemon_.Commands(); }
     static std::vector<std::string> Journal() { return Script::Current().Journal(); }
 
-    /// "file:line message" for each record; without the line for the modules that give none for good.
-    static std::vector<std::string> Records();
-    /// The error code, and back to none.
-    static _tag_fileindex_err_ TakeError();
-    /// Forgets what was recorded, logged and left as error code so far.
+    /// The error code and the records since the last look, "2 utils.cpp:418 message | utils.cpp:239 message";
+    /// empty when there are neither. The line is left out for the modules that do not fix it. Forgets both.
+    static std::string Left();
+    /// The code alone.
+    static int LeftCode();
     static void Forget();
+
+    /// The journal without locks, and without the mark that a lost event leaves in status.conf.
+    static std::vector<std::string> Doings();
+    static void ExpectOnlyTheFirst(size_t count, const std::vector<std::string> &steps);
 
     static std::string FolderConf() { return Canonical(ReadFile(kFolderConf)); }
     static std::string StatusConf() { return Canonical(ReadFile(kStatusConf)); }

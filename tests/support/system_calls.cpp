@@ -9,9 +9,9 @@
 #include <sys/file.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
-#include <sys/syscall.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstdarg>
@@ -21,14 +21,14 @@
 #include <set>
 #include <string>
 
-using fileindex_test::Fault;
 using fileindex_test::Script;
 
 namespace {
 
-template <typename Function>
-Function *Next(const char *name) {
-    return reinterpret_cast<Function *>(::dlsym(RTLD_NEXT, name));
+template <typename Result, typename... Arguments>
+Result CallNext(const char *name, Arguments... arguments) {
+    using Function = Result (*)(Arguments...);
+    return reinterpret_cast<Function>(::dlsym(RTLD_NEXT, name))(arguments...);
 }
 
 std::string PathOf(int fd) {
@@ -38,10 +38,14 @@ std::string PathOf(int fd) {
     return length < 0 ? "" : std::string(target.data(), static_cast<size_t>(length));
 }
 
-template <typename Result>
-Result Fail(const Fault &fault) {
-    errno = fault.error;
-    return static_cast<Result>(fault.result);
+/// Counts the call and fails it if the test says so; else the C library's function is called.
+template <typename Result, typename... Arguments>
+Result Call(const char *name, const std::string &about, Arguments... arguments) {
+    if (const auto fault = Script::Current().Take(name, about)) {
+        errno = fault->error;
+        return static_cast<Result>(fault->result);
+    }
+    return CallNext<Result>(name, arguments...);
 }
 
 /// What is appended to a queue is a line of the journal.
@@ -88,16 +92,18 @@ Connections &OpenConnections() {
     return connections;
 }
 
-template <typename Write>
-ssize_t WriteOr(int fd, const void *data, size_t size, Write real) {
+/// `position`: the offset, for pwrite.
+template <typename... Position>
+ssize_t Write(const char *name, int fd, const void *data, size_t size, Position... position) {
     const std::string path = PathOf(fd);
     if (const auto fault = Script::Current().Take("write", path + " " + std::to_string(size))) {
         if (fault->result <= 0) {
-            return Fail<ssize_t>(*fault);
+            errno = fault->error;
+            return fault->result;
         }
         size = std::min(size, static_cast<size_t>(fault->result));  // a short write is a real one
     }
-    const ssize_t written = real(data, size);
+    const auto written = CallNext<ssize_t>(name, fd, data, size, position...);
     const int error = errno;
     RecordWrite(path, data, written);
     errno = error;
@@ -109,24 +115,16 @@ ssize_t WriteOr(int fd, const void *data, size_t size, Write real) {
 extern "C" {
 
 int open(const char *path, int flags, ...) {
-    mode_t mode = 0;
-    if ((flags & (O_CREAT | O_TMPFILE)) != 0) {
-        va_list arguments;
-        va_start(arguments, flags);
-        mode = va_arg(arguments, mode_t);
-        va_end(arguments);
-    }
-    if (const auto fault = Script::Current().Take("open", path)) {
-        return Fail<int>(*fault);
-    }
-    static auto *const real = Next<int(const char *, int, ...)>("open");
-    return real(path, flags, mode);
+    va_list arguments;
+    va_start(arguments, flags);
+    const mode_t mode = (flags & (O_CREAT | O_TMPFILE)) != 0 ? va_arg(arguments, mode_t) : 0;
+    va_end(arguments);
+    return Call<int>("open", path, path, flags, mode);
 }
 
 int close(int fd) {
     const bool connection = OpenConnections().Remove(fd);
-    static auto *const real = Next<int(int)>("close");
-    const int result = real(fd);
+    const int result = CallNext<int>("close", fd);
     if (connection) {
         Script::Current().HungUp();
     }
@@ -134,23 +132,16 @@ int close(int fd) {
 }
 
 ssize_t write(int fd, const void *data, size_t size) {
-    static auto *const real = Next<ssize_t(int, const void *, size_t)>("write");
-    return WriteOr(fd, data, size, [fd](const void *from, size_t count) { return real(fd, from, count); });
+    return Write("write", fd, data, size);
 }
 
 ssize_t pwrite(int fd, const void *data, size_t size, off_t offset) {
-    static auto *const real = Next<ssize_t(int, const void *, size_t, off_t)>("pwrite");
-    return WriteOr(fd, data, size,
-                   [fd, offset](const void *from, size_t count) { return real(fd, from, count, offset); });
+    return Write("pwrite", fd, data, size, offset);
 }
 
 int flock(int fd, int operation) noexcept {
     const std::string path = PathOf(fd);
-    if (const auto fault = Script::Current().Take("flock", path)) {
-        return Fail<int>(*fault);
-    }
-    static auto *const real = Next<int(int, int)>("flock");
-    const int result = real(fd, operation);
+    const int result = Call<int>("flock", path, fd, operation);
     const int error = errno;
     if (result == 0) {
         RecordLock(path, operation);
@@ -160,19 +151,11 @@ int flock(int fd, int operation) noexcept {
 }
 
 int lstat(const char *path, struct stat *buffer) noexcept {
-    if (const auto fault = Script::Current().Take("lstat", path)) {
-        return Fail<int>(*fault);
-    }
-    static auto *const real = Next<int(const char *, struct stat *)>("lstat");
-    return real(path, buffer);
+    return Call<int>("lstat", path, path, buffer);
 }
 
 int chmod(const char *path, mode_t mode) noexcept {
-    if (const auto fault = Script::Current().Take("chmod", path)) {
-        return Fail<int>(*fault);
-    }
-    static auto *const real = Next<int(const char *, mode_t)>("chmod");
-    const int result = real(path, mode);
+    const int result = Call<int>("chmod", path, path, mode);
     const std::string_view name(path);
     if (result == 0 && name.ends_with(".conf")) {
         Script::Current().Record("saved " + std::string(name.substr(name.rfind('/') + 1)));  // a save ends so
@@ -181,43 +164,23 @@ int chmod(const char *path, mode_t mode) noexcept {
 }
 
 int mkdir(const char *path, mode_t mode) noexcept {
-    if (const auto fault = Script::Current().Take("mkdir", path)) {
-        return Fail<int>(*fault);
-    }
-    static auto *const real = Next<int(const char *, mode_t)>("mkdir");
-    return real(path, mode);
+    return Call<int>("mkdir", path, path, mode);
 }
 
 int ftruncate(int fd, off_t length) noexcept {
-    if (const auto fault = Script::Current().Take("ftruncate", PathOf(fd))) {
-        return Fail<int>(*fault);
-    }
-    static auto *const real = Next<int(int, off_t)>("ftruncate");
-    return real(fd, length);
+    return Call<int>("ftruncate", PathOf(fd), fd, length);
 }
 
 int fallocate(int fd, int mode, off_t offset, off_t length) {
-    if (const auto fault = Script::Current().Take("fallocate", PathOf(fd))) {
-        return Fail<int>(*fault);
-    }
-    static auto *const real = Next<int(int, int, off_t, off_t)>("fallocate");
-    return real(fd, mode, offset, length);
+    return Call<int>("fallocate", PathOf(fd), fd, mode, offset, length);
 }
 
 int socket(int domain, int type, int protocol) noexcept {
-    if (const auto fault = Script::Current().Take("socket")) {
-        return Fail<int>(*fault);
-    }
-    static auto *const real = Next<int(int, int, int)>("socket");
-    return real(domain, type, protocol);
+    return Call<int>("socket", "", domain, type, protocol);
 }
 
 int connect(int fd, const struct sockaddr *address, socklen_t length) {
-    if (const auto fault = Script::Current().Take("connect", std::to_string(length))) {
-        return Fail<int>(*fault);
-    }
-    static auto *const real = Next<int(int, const struct sockaddr *, socklen_t)>("connect");
-    const int result = real(fd, address, length);
+    const int result = Call<int>("connect", std::to_string(length), fd, address, length);
     if (result == 0) {
         OpenConnections().Add(fd);
     }
@@ -225,27 +188,19 @@ int connect(int fd, const struct sockaddr *address, socklen_t length) {
 }
 
 int setsockopt(int fd, int level, int option, const void *value, socklen_t length) noexcept {
-    if (const auto fault = Script::Current().Take("setsockopt", std::to_string(option))) {
-        return Fail<int>(*fault);
-    }
-    static auto *const real = Next<int(int, int, int, const void *, socklen_t)>("setsockopt");
-    return real(fd, level, option, value, length);
+    return Call<int>("setsockopt", std::to_string(option), fd, level, option, value, length);
 }
 
 int usleep(useconds_t microseconds) {
-    Script::Current().Take("usleep", std::to_string(microseconds));
-    static auto *const real = Next<int(useconds_t)>("usleep");
-    return real(microseconds);
+    return Call<int>("usleep", std::to_string(microseconds), microseconds);
 }
 
 int rand(void) noexcept {
-    static auto *const real = Next<int()>("rand");
-    return Script::Current().random.value_or(real());
+    return Script::Current().random ? *Script::Current().random : CallNext<int>("rand");
 }
 
 time_t time(time_t *out) noexcept {
-    static auto *const real = Next<time_t(time_t *)>("time");
-    const time_t now = Script::Current().now.value_or(real(nullptr));
+    const time_t now = Script::Current().now ? *Script::Current().now : CallNext<time_t>("time", nullptr);
     if (out != nullptr) {
         *out = now;
     }

@@ -67,7 +67,7 @@ TEST_F(IndexDelete, SavesTellsTheDaemonAndThenTheMonitors) {
     EXPECT_TRUE(Delete(kRequest));
     EXPECT_EQ(Locked(Steps()), Journal());
     EXPECT_EQ("{" + FolderRecord("/photo/b", "", "p") + "}", FolderConf());
-    EXPECT_THAT(Records(), IsEmpty());
+    EXPECT_EQ("", Left());
     EXPECT_FALSE(fs::exists("/vol2/music/@eaDir/VORK@.fileindexdb"));
     EXPECT_EQ(1U, Queue("photo").size());
 }
@@ -91,27 +91,20 @@ TEST_F(IndexDelete, OfTheLastFolderStopsTheDaemonInsteadOfTellingIt) {
 
 TEST_F(IndexDelete, OfTheLastFolderIgnoresFailingServices) {
     const struct {
-        Fault fault;
-        std::string record;
+        const char *call;
+        int line;
         bool restarted;
     } rows[] = {
-        {{.call = "VLIBServiceStop", .error = 0x1500},
-         "index_mgr.cpp:89 VLIBServiceStop failed: err=[0x1500 platform.c:77]",
-         true},
-        {{.call = "VORKSMBSetSpotlight", .error = 0x1500},
-         "index_mgr.cpp:94 VORKSMBSetSpotlight failed: err=[0x1500 platform.c:77]",
-         false},
-        {{.call = "VLIBServiceRestart", .error = 0x1500},
-         "index_mgr.cpp:96 VLIBServiceRestart failed: err=[0x1500 platform.c:77]",
-         false},
-    };
+        {"VLIBServiceStop", 89, true}, {"VORKSMBSetSpotlight", 94, false}, {"VLIBServiceRestart", 96, false}};
     for (const auto &row : rows) {
         Forget();
         GivenFolders({FolderRecord("/music/a", "", "a")});
         Platform::Current().searchOn = true;
-        Fail(row.fault);
+        Fail({.call = row.call, .error = 0x1500});
         EXPECT_TRUE(Delete(R"(["/music/a"])"));
-        EXPECT_THAT(Records(), ElementsAre(row.record));
+        EXPECT_EQ(
+            "0 index_mgr.cpp:" + std::to_string(row.line) + " " + row.call + " failed: err=[0x1500 platform.c:77]",
+            Left());
         EXPECT_EQ(row.restarted, testing::Value(Journal(), testing::Contains("restart samba")));
         EXPECT_EQ(1, Script::Current().Calls("MonitorQueue::Delete"));
     }
@@ -140,24 +133,11 @@ TEST_F(IndexDelete, OfAMalformedRequestChangesNothing) {
     for (const auto &row : rows) {
         Forget();
         EXPECT_FALSE(Delete(row.request));
-        EXPECT_EQ(FILEINDEX_ERR_BAD_PARAM, TakeError());
-        EXPECT_THAT(Records(), ElementsAre(std::string("index_mgr.cpp:61 Bad param: ") + row.culprit));
+        EXPECT_EQ(std::string("1 index_mgr.cpp:61 Bad param: ") + row.culprit, Left());
         EXPECT_EQ(conf, ReadFile(kFolderConf));
         EXPECT_THAT(Journal(), testing::Not(testing::Contains("saved folder.conf")));
         EXPECT_FALSE(IsLocked(kFolderLock));
     }
-}
-
-struct FailingStep {
-    const char *name;
-    std::function<void()> arrange;
-    size_t done;
-    std::vector<std::string> records;
-    _tag_fileindex_err_ code;
-};
-
-std::function<void()> WillFail(const Fault &fault) {
-    return [fault] { Script::Current().Fail(fault); };
 }
 
 /// Done when the last event is written: after the commands and before the shares are gone through.
@@ -166,52 +146,23 @@ std::function<void()> AfterTheEvents(const std::function<void()> &action) {
         [action] { Script::Current().Fail({.call = "write", .about = "/vol1/photo/@eaDir", .action = action}); };
 }
 
-const std::string kUnreadable = "config.cpp Failed to load json from /usr/vork/etc/fileindex/folder.conf";
-const std::string kNoMusic = "utils.cpp:772 VORKShareGet failed, name=music, code=5120";
-
 const FailingStep kFailingSteps[] = {
-    {"LockBusy",
-     WillFail({.call = "flock", .about = kFolderLock, .times = 3, .error = EAGAIN}),
-     0,
-     {"config.cpp Failed to lock folder"},
-     FILEINDEX_ERR_LOCK},
-    {"ListNotToBeRead",
-     WillFail({.call = "open", .about = kFolderConf}),
-     0,
-     {kUnreadable},
-     FILEINDEX_ERR_LOAD_JSON},
-    {"ListNotToBeSaved",
-     WillFail({.call = "write", .about = kFolderConf, .error = ENOSPC}),
-     0,
-     {"config.cpp Failed to save json to /usr/vork/etc/fileindex/folder.conf"},
-     FILEINDEX_ERR_SAVE_JSON},
-    {"SecondCommand",
-     WillFail({.call = "connect", .nth = 2}),
-     2,
-     {"index_mgr.cpp:104 SendCammandToDaemon failed"},
-     FILEINDEX_ERR_NONE},
-    {"SecondEvent",
-     WillFail({.call = "open", .about = "/vol1/photo/@eaDir"}),
-     4,
-     {"index_mgr.cpp:436 AddCustomEvent failed", "index_mgr.cpp:111 Update failed"},
-     FILEINDEX_ERR_NONE},
-    {"ShareGoneBeforeItsCleaning",
-     AfterTheEvents([] { Platform::Current().shares.erase("music"); }),
-     5,
-     {kNoMusic, "index_mgr.cpp:653 FILEIDXQueuePathGet failed, share=music",
-      "index_mgr.cpp:126 CleanShareIndexData failed, share=music"},
-     FILEINDEX_ERR_NONE},
-    {"Withdrawal",
-     WillFail({.call = "MonitorQueue::Delete"}),
-     8,
-     {"index_mgr.cpp:350 MonitorQueue::Delete failed",
-      "index_mgr.cpp:130 DeleteVorkNtifydCfg failed, share=music"},
-     FILEINDEX_ERR_NONE},
-    {"Registration",
-     WillFail({.call = "MonitorQueue::Upsert"}),
-     9,
-     {"index_mgr.cpp:324 MonitorQueue::Add failed", "index_mgr.cpp:121 UpsertVorkNotifydCfg failed, share=photo"},
-     FILEINDEX_ERR_NONE},
+    {"LockBusy", WillFail({.call = "flock", .about = kFolderLock, .times = 3, .error = EAGAIN}), 0, kBusy},
+    {"ListNotToBeRead", WillFail({.call = "open", .about = kFolderConf}), 0, kFolderConfUnreadable},
+    {"ListNotToBeSaved", WillFail({.call = "write", .about = kFolderConf}), 0, kFolderConfUnwritable},
+    {"SecondCommand", WillFail({.call = "connect", .nth = 2}), 2,
+     "0 index_mgr.cpp:104 SendCammandToDaemon failed"},
+    {"SecondEvent", WillFail({.call = "open", .about = "/vol1/photo/@eaDir"}), 4,
+     "0 index_mgr.cpp:436 AddCustomEvent failed | index_mgr.cpp:111 Update failed"},
+    {"ShareGoneBeforeItsCleaning", AfterTheEvents([] { Platform::Current().shares.erase("music"); }), 5,
+     "0 utils.cpp:772 VORKShareGet failed, name=music, code=5120 | "
+     "index_mgr.cpp:653 FILEIDXQueuePathGet failed, share=music | "
+     "index_mgr.cpp:126 CleanShareIndexData failed, share=music"},
+    {"Withdrawal", WillFail({.call = "MonitorQueue::Delete"}), 8,
+     "0 index_mgr.cpp:350 MonitorQueue::Delete failed | index_mgr.cpp:130 DeleteVorkNtifydCfg failed, "
+     "share=music"},
+    {"Registration", WillFail({.call = "MonitorQueue::Upsert"}), 9,
+     "0 index_mgr.cpp:324 MonitorQueue::Add failed | index_mgr.cpp:121 UpsertVorkNotifydCfg failed, share=photo"},
 };
 
 class IndexDeleteStep : public IndexDelete, public testing::WithParamInterface<FailingStep> {};
@@ -221,20 +172,9 @@ TEST_P(IndexDeleteStep, ThatFailsStopsWhatFollowsAndTheRequestRepeatedRepairsIt)
     const std::string conf = ReadFile(kFolderConf);
     step.arrange();
     EXPECT_FALSE(Delete(kRequest));
-    EXPECT_EQ(step.code, TakeError());
-    EXPECT_EQ(step.records, Records());
-    std::vector<std::string> journal = Journal();
-    for (const char *line : {"lock folder exclusive", "unlock folder", "lock status exclusive",
-                             "saved status.conf", "unlock status"}) {
-        std::erase(journal, line);
-    }
-    const std::vector<std::string> all = Steps();
-    EXPECT_EQ(std::vector(all.begin(), all.begin() + static_cast<std::ptrdiff_t>(step.done)), journal);
-    if (step.done == 0) {
-        EXPECT_EQ(conf, ReadFile(kFolderConf));
-    } else {
-        EXPECT_EQ("{" + FolderRecord("/photo/b", "", "p") + "}", FolderConf());
-    }
+    EXPECT_EQ(step.left, Left());
+    ExpectOnlyTheFirst(step.done, Steps());
+    EXPECT_EQ(step.done == 0 ? Canonical(conf) : "{" + FolderRecord("/photo/b", "", "p") + "}", FolderConf());
     EXPECT_FALSE(IsLocked(kFolderLock));
 
     EXPECT_THAT(Script::Current().Finish(), IsEmpty());
@@ -242,7 +182,7 @@ TEST_P(IndexDeleteStep, ThatFailsStopsWhatFollowsAndTheRequestRepeatedRepairsIt)
     Forget();
     EXPECT_TRUE(Delete(kRequest));
     EXPECT_EQ("{" + FolderRecord("/photo/b", "", "p") + "}", FolderConf());
-    EXPECT_THAT(Records(), IsEmpty());
+    EXPECT_EQ("", Left());
 }
 
 INSTANTIATE_TEST_SUITE_P(Of, IndexDeleteStep, testing::ValuesIn(kFailingSteps),
@@ -256,17 +196,16 @@ TEST_F(IndexDelete, NeverCleansAShareThatTheSavedListStillHolds) {
     EXPECT_EQ(1U, Queue("photo").size());
     EXPECT_EQ(0, Script::Current().Calls("VLIBCExec"));
     EXPECT_EQ(0, Script::Current().Calls("MonitorQueue::Delete"));
-    EXPECT_EQ("index_mgr.cpp:121 UpsertVorkNotifydCfg failed, share=photo", Records().back());
+    EXPECT_THAT(Left(), testing::EndsWith(" | index_mgr.cpp:121 UpsertVorkNotifydCfg failed, share=photo"));
 }
 
 TEST_F(IndexDelete, OfAVanishedShareSavesButCannotQueueItsEvent) {
     Platform::Current().shares.erase("music");
     EXPECT_FALSE(Delete(R"(["/music/a"])"));
-    EXPECT_EQ(FILEINDEX_ERR_PATH, TakeError());
-    EXPECT_EQ("index_mgr.cpp:111 Update failed", Records().back());
+    EXPECT_EQ("2 index_mgr.cpp:430 GetFullPath failed, path=/music/a | index_mgr.cpp:111 Update failed", Left());
     EXPECT_EQ(2U, Parse(FolderConf()).size());
     EXPECT_FALSE(Delete(R"([""])"));
-    EXPECT_EQ("index_mgr.cpp:79 GetShareNameByPath failed, path=", Records().back());
+    EXPECT_THAT(Left(), testing::EndsWith(" | index_mgr.cpp:79 GetShareNameByPath failed, path="));
 }
 
 class IndexReindex : public IndexDelete {
@@ -284,7 +223,7 @@ TEST_F(IndexReindex, RevivesSharesAndQueuesOneEventForEachPath) {
                             R"(event {"data":null,"event":65536,"path":"/vol2/music"})",
                             R"(event {"data":null,"event":65536,"path":"/vol1/photo/a"})"));
     EXPECT_EQ(R"({"no_space":{"other":true}})", StatusConf());
-    EXPECT_THAT(Records(), IsEmpty());
+    EXPECT_EQ("", Left());
 }
 
 /// Between the first and the second event of one request the queue's consumer or another writer does something.
@@ -328,30 +267,24 @@ TEST_F(IndexReindex, GoesOnWhenAShareCannotBeRevived) {
     daemon_.Stop();
     GivenStatusConf(R"({"no_space":{"photo":true}})");
     EXPECT_TRUE(Reindex(R"(["/photo/a"])"));
-    EXPECT_THAT(Records(), ElementsAre("status_mgr.cpp:321 SendCammandToDaemon failed",
-                                       "index_mgr.cpp:400 ShareRevice failed, share=photo"));
+    EXPECT_EQ(
+        "0 status_mgr.cpp:321 SendCammandToDaemon failed | index_mgr.cpp:400 ShareRevice failed, share=photo",
+        Left());
     EXPECT_EQ(1U, Queue("photo").size());
 }
 
 TEST_F(IndexReindex, ChecksAllPathsBeforeItDoesAnything) {
     GivenStatusConf(R"({"no_space":{"photo":true}})");
-    const struct {
-        const char *request;
-        _tag_fileindex_err_ code;
-        std::vector<std::string> records;
-    } rows[] = {
-        {R"("/photo/a")", FILEINDEX_ERR_BAD_PARAM, {R"(index_mgr.cpp:369 Malformed jsArrPath: "/photo/a")"}},
-        {"{}", FILEINDEX_ERR_BAD_PARAM, {"index_mgr.cpp:369 Malformed jsArrPath: {}"}},
-        {R"(["/photo/a",5])", FILEINDEX_ERR_BAD_PARAM, {"index_mgr.cpp:377 Malformed jsArrPath: 5"}},
-        {R"(["/photo/a",""])", FILEINDEX_ERR_NONE, {"index_mgr.cpp:384 Failed to get share name from path: "}},
-        {R"(["/photo/a","/other/x"])", FILEINDEX_ERR_NONE, {}},
+    const std::pair<const char *, const char *> rows[] = {
+        {R"("/photo/a")", R"(1 index_mgr.cpp:369 Malformed jsArrPath: "/photo/a")"},
+        {"{}", "1 index_mgr.cpp:369 Malformed jsArrPath: {}"},
+        {R"(["/photo/a",5])", "1 index_mgr.cpp:377 Malformed jsArrPath: 5"},
+        {R"(["/photo/a",""])", "0 index_mgr.cpp:384 Failed to get share name from path: "},
+        {R"(["/photo/a","/other/x"])", ""},
     };
-    for (const auto &row : rows) {
-        SCOPED_TRACE(row.request);
-        Forget();
-        EXPECT_FALSE(Reindex(row.request));
-        EXPECT_EQ(row.code, TakeError());
-        EXPECT_EQ(row.records, Records());
+    for (const auto &[request, left] : rows) {
+        EXPECT_FALSE(Reindex(request));
+        EXPECT_EQ(left, Left());
         EXPECT_THAT(Journal(), IsEmpty());
     }
     EXPECT_TRUE(Reindex("[]"));
@@ -361,14 +294,13 @@ TEST_F(IndexReindex, StopsAtThePathThatCannotBeQueued) {
     GivenFolders(
         {FolderRecord("/none/x", "", ""), FolderRecord("/photo/a", "", ""), FolderRecord("/music", "", "")});
     EXPECT_FALSE(Reindex(R"(["/photo/a","/none/x","/music"])"));
-    EXPECT_EQ(FILEINDEX_ERR_PATH, TakeError());
-    EXPECT_EQ("index_mgr.cpp:407 GetFullPath failed, path=/none/x", Records().back());
+    EXPECT_EQ("2 index_mgr.cpp:407 GetFullPath failed, path=/none/x", Left());
     EXPECT_EQ(1U, Queue("photo").size());
     EXPECT_FALSE(fs::exists("/vol2/music/@eaDir"));
 
     Fail({.call = "open", .about = "/vol2/music/@eaDir"});
     EXPECT_FALSE(Reindex(R"(["/music"])"));
-    EXPECT_EQ("index_mgr.cpp:413 AddCustomEvent failed, path=/music", Records().back());
+    EXPECT_THAT(Left(), testing::EndsWith("index_mgr.cpp:413 AddCustomEvent failed, path=/music"));
 }
 
 }  // namespace

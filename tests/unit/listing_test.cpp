@@ -81,7 +81,7 @@ TEST_F(Listing, CarriesTheAdditionalFactsAndOutlivesBadKeys) {
     EXPECT_TRUE(IndexMgr::List(out, 0, 1, "path", "ASC", Parse(R"(["is_valid","none"])")));
     EXPECT_EQ(R"({"is_valid":false,"none":null})", Print(out["folder"][0]["additional"]))
         << "there is no directory";
-    EXPECT_EQ(FILEINDEX_ERR_BAD_PARAM, TakeError());
+    EXPECT_EQ(FILEINDEX_ERR_BAD_PARAM, LeftCode());
     EXPECT_TRUE(IndexMgr::List(out, 0, kAll, "path", "ASC", "status"));
     EXPECT_EQ(5U, out["folder"].size());
 }
@@ -93,7 +93,7 @@ TEST_F(Listing, OfNothingOrOfNoReadableFile) {
     GivenFolderConf("{");
     Json::Value out = "before";
     EXPECT_FALSE(IndexMgr::List(out, 0, kAll, "name", "ASC", Json::Value()));
-    EXPECT_EQ(FILEINDEX_ERR_LOAD_JSON, TakeError());
+    EXPECT_EQ(kFolderConfUnreadable, Left());
     EXPECT_EQ("before", out);
 }
 
