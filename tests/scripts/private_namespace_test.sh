@@ -55,4 +55,14 @@ expect "a checkout below /tmp" "$copy$here" "$(cd "$copy" && ./in-private-namesp
 expect "--keep" "/$here"$'\n/tmp/kept' "$(cd / && "$run" --keep /tmp/kept/deep -- "$copy/here")"
 expect "an empty environment" "$copy$here" "$(cd "$copy" && env -i ./in-private-namespace ./here)"
 
+closed="/tmp/closed/home of somebody"
+mkdir -p "$closed/build" "$closed/private"
+touch "$closed/build/seen" "$closed/private/hidden"
+chmod 700 /tmp/closed "$closed" "$closed/private"
+as_nobody=(setpriv --reuid=65534 --clear-groups)
+expect "what others see in a closed directory" "build private seen" \
+    "$("$run" --keep "$closed/build" "${as_nobody[@]}" ls "$closed" "$closed/build" "$closed/private" 2>/dev/null |
+        grep -v : | xargs)"
+expect "whether it is closed outside" 700 "$(stat -c %a "$closed")"
+
 exit "$((failures > 0))"
