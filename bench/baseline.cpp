@@ -3,7 +3,6 @@
 #include "data.h"
 
 #include <fileindex/folders.h>
-#include <fileindex/index_mgr.h>
 #include <fileindex/paths.h>
 
 #include <vork/text.h>
@@ -27,7 +26,6 @@ namespace baseline {
 
 using VORK::FILEINDEX::Folder;
 using VORK::FILEINDEX::GetMostSuitableCfg;
-using VORK::FILEINDEX::IndexMgr;
 using VORK::FILEINDEX::StringStartWith;
 
 namespace {

@@ -23,11 +23,12 @@ void CheckLongLines() {
     const std::string around = "{\"event\":256,\"path\":\"/a\"}\n";
     for (const std::size_t about : {64UL * 1024, 128UL * 1024, 1024UL * 1024, 1088UL * 1024}) {
         for (const std::size_t size : {about - 1, about, about + 1}) {
-            const std::string head = R"({"event":65536,"path":"/vol1/a/d","data":")";
-            const std::string line = head + std::string(size - head.size() - 2, 'x') + "\"}";
+            std::string line = R"({"event":65536,"path":"/vol1/a/d","data":")";
+            line.resize(size - 2, 'x');
+            line += "\"}";
             CheckQueue(line, about / 2);
             CheckQueue(line + '\n', about);
-            CheckQueue(around + line + '\n' + around, around.size() + about / 2);
+            CheckQueue(std::string(around).append(line).append("\n").append(around), around.size() + about / 2);
         }
     }
 }
