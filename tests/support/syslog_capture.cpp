@@ -32,12 +32,13 @@ void Keep(int priority, const char *format, va_list arguments) {
     if (std::string_view(format).starts_with(kPrefix)) {
         va_list prefix;
         va_copy(prefix, arguments);
-        record.file = va_arg(prefix, const char *);
+        record.file = va_arg(prefix, const char *);  // NOLINT(clang-analyzer-valist.Uninitialized): it is a copy
         record.line = va_arg(prefix, int);
         va_end(prefix);
     }
     std::string text(16384, '\0');
     errno = error;
+    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): the callers have started it
     const int length = std::vsnprintf(text.data(), text.size(), format, arguments);
     text.resize(std::min(static_cast<size_t>(length), text.size() - 1));
     record.message = record.file.empty() ? text : text.substr(text.find(' ') + 1);
@@ -68,6 +69,7 @@ extern "C" void syslog(int priority, const char *format, ...) {
     va_end(arguments);
 }
 
+// NOLINTNEXTLINE(bugprone-reserved-identifier): the C library's name for it
 extern "C" void __syslog_chk(int priority, int /*flag*/, const char *format, ...) {
     va_list arguments;
     va_start(arguments, format);

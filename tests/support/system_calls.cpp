@@ -117,6 +117,7 @@ extern "C" {
 int open(const char *path, int flags, ...) {
     va_list arguments;
     va_start(arguments, flags);
+    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): started just above
     const mode_t mode = (flags & (O_CREAT | O_TMPFILE)) != 0 ? va_arg(arguments, mode_t) : 0;
     va_end(arguments);
     return Call<int>("open", path, path, flags, mode);

@@ -28,6 +28,7 @@ Folder MakeFolder(const std::string &path, const std::string &flags) {
 
 std::vector<std::string> PathsOf(const std::vector<Folder> &folders) {
     std::vector<std::string> paths;
+    paths.reserve(folders.size());
     for (const Folder &folder : folders) {
         paths.push_back(folder.path);
     }
@@ -121,6 +122,23 @@ TEST_F(FoldersStore, LoadsWhatIsThereUnderTheNamesOfTheMembers) {
                         FolderRecord("/none/x", "", "v") + "," + FolderRecord("/photo", "", "") + "," +
                         FolderRecord("/photo/b", "B", "a") + "}"),
               FolderConf());
+}
+
+TEST_F(FoldersStore, TakesTheLastOfRepeatedMembersInAnyOrder) {
+    const std::pair<const char *, std::string> rows[] = {
+        {R"({"/photo/a":{"photo":true},"/photo/a":{"document":true}})", FolderRecord("/photo/a", "", "d")},
+        {R"({"/photo/a":{"photo":true},"/photo/\u0061":{"audio":true}})", FolderRecord("/photo/a", "", "a")},
+        {R"({"/photo/a":{"name":"first","name":"last"}})", FolderRecord("/photo/a", "last", "")},
+        {R"({"/photo/a":{"photo":true,"photo":5,"name":"x","name":7}})", FolderRecord("/photo/a", "", "")},
+        {R"({"/photo/b":{},"/photo/a":{"video":true}})",
+         FolderRecord("/photo/a", "", "v") + "," + FolderRecord("/photo/b", "", "")},
+    };
+    for (const auto &[conf, records] : rows) {
+        GivenFolderConf(conf);
+        Folders store;
+        ASSERT_TRUE(store.Load() && store.Save());
+        EXPECT_EQ("{" + records + "}", FolderConf()) << conf;
+    }
 }
 
 TEST_F(FoldersStore, KeepsNamesByteForByteAndEscapedOnes) {
@@ -222,6 +240,7 @@ TEST_F(FoldersStore, UpsertOfABadParameterLeavesTheFileAlone) {
 
 TEST_F(FoldersStore, HoldsAThousandFoldersAndNotOneMore) {
     std::vector<std::string> records;
+    records.reserve(1000);
     for (int number = 0; number < 1000; ++number) {
         records.push_back(FolderRecord("/photo/" + std::to_string(number), "", "d"));
     }

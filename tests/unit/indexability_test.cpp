@@ -93,6 +93,7 @@ TEST_F(Indexability, SkipsWhatThePlatformConfirms) {
 }
 
 TEST_F(Indexability, OfFullPathsLeavesItsReason) {
+    const std::string refused = "0 utils.cpp:263 check realpath failed, path=";
     const std::string base = "/vol1/photo";
     const std::string tooLong = "/" + std::string(5000, 'x');
     const char *const yes[] = {"/2015", "", "/.DS_Store", "/a#recycle", "/#bin", "/a#snapshot"};
@@ -112,8 +113,9 @@ TEST_F(Indexability, OfFullPathsLeavesItsReason) {
     }
     EXPECT_EQ("", Left());
     for (const std::string &path : notReal) {
-        EXPECT_FALSE(CanFullPathBeIndexed(base + path));
-        EXPECT_EQ("0 utils.cpp:263 check realpath failed, path=" + base + path, Left());
+        const std::string fullPath = base + path;
+        EXPECT_FALSE(CanFullPathBeIndexed(fullPath));
+        EXPECT_EQ(refused + fullPath, Left());
     }
     EXPECT_FALSE(CanFullPathBeIndexed("/vol9/x"));
     EXPECT_EQ(

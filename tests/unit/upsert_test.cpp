@@ -216,6 +216,7 @@ INSTANTIATE_TEST_SUITE_P(Of, IndexUpsertStep, testing::ValuesIn(kFailingSteps),
 
 TEST_F(IndexUpsert, OfAFolderTooManyChangesNothing) {
     std::vector<std::string> records;
+    records.reserve(999);
     for (int number = 0; number < 999; ++number) {
         records.push_back(FolderRecord("/photo/" + std::to_string(number), "", "d"));
     }
