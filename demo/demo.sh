@@ -71,6 +71,7 @@ note "and two services, none of them running:"
 service fileindexd status | indent
 check "fileindexd does not run yet" test ! -e /run/fileindexd.sock
 check "nothing is indexed yet" test ! -e "$folderConf"
+userFiles=$(find /vol1 -type f | wc -l)
 
 heading "Add a folder of photos and films"
 run_ctl add "/photo/2015" --name "Summer 2015" --media photo,video
@@ -143,6 +144,39 @@ run_ctl resume
 expect_frames 5
 check_frame "the daemon is told to go on" '{"data":{},"type":"resume"}'
 check_json "and nothing is paused in status.conf" "$statusConf" '{"resume_time":-1}'
+
+heading "How far it has got, and once more from the start"
+run_ctl list --status
+check "work waits in both queues" test "$("$ctl" list --status | grep -c processing)" -eq 2
+run_ctl reindex /photo/2015
+check_json "a reindex (0x10000) is queued" "$photoQueue" '"event":65536,"path":"/vol1/photo/2015"'
+run_ctl pause
+expect_frames 6
+check "paused folders say so" test "$("$ctl" list --status | grep -c paused)" -eq 2
+run_ctl resume
+expect_frames 7
+
+heading "The share photo gets another name"
+mv /vol1/photo /vol1/pictures
+sed -i -e 's|/vol1/photo|/vol1/pictures|' -e 's|"photo"|"pictures"|' "$platformConf"
+run_ctl share rename photo pictures
+check_json "its folder follows" "$folderConf" '"path":"/pictures/2015"'
+check_json "and is watched in its new place" "$registrations" '"path":"/vol1/pictures/2015"'
+check "the old place is not watched any more" bash -c "! grep -q /vol1/photo '$registrations'"
+
+heading "Remove a folder, then the last one"
+run_ctl remove /documents --yes
+expect_frames 8
+check_frame "the daemon is told" '{"data":{"folder_path":"/documents"},"type":"delete_folder_setting"}'
+check "the index data of its share is gone" test ! -e "$documentsQueue"
+check "the users' files are not" test -e /vol1/documents/ticket.pdf
+run_ctl remove /pictures/2015 --yes
+check "nothing is indexed" grep -qx '{}' "$folderConf"
+check "fileindexd is stopped" bash -c '! service fileindexd status'
+check_json "the search setting is off" "$platformConf" '"search":false'
+check "no queue and no database is left" test -z "$(find /vol1 -name 'VORK@*')"
+check "nothing is watched" bash -c "! grep -q /vol1 '$registrations'"
+check "every file of the users is still there" test "$(find /vol1 -type f | wc -l)" -eq "$userFiles"
 
 heading "Everything the daemon received"
 show "length and text of each frame" "$frames"

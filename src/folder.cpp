@@ -31,7 +31,8 @@ bool Folder::Load(const std::string &sharePath, const Json::Value &record) {
 }
 
 bool Folder::Reload(const std::string &sharePath, const Json::Value &record) {
-    const std::string newPath = sharePath;  // may be our own field, which is reset below
+    // The argument may be our own field, which is reset below.
+    const std::string newPath = sharePath;  // NOLINT(performance-unnecessary-copy-initialization)
     name.clear();
     path.clear();
     document = audio = video = photo = false;
