@@ -19,8 +19,7 @@ namespace {
 
 using VORK::FILEINDEX::Folder;
 
-constexpr const char *kWhereSharesAre =
-    "the shares are those that \"testparm -s\" shows, or those of /usr/vork/etc/platform.conf";
+constexpr const char *kWhereSharesAre = "the shares are those of /usr/vork/etc/platform.conf";
 
 struct ShareDeleter {
     void operator()(VORKSHARE *share) const { VORKShareFree(share); }
