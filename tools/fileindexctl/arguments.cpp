@@ -23,4 +23,8 @@ std::string Arguments::One(std::string_view name) const {
     return values.empty() ? std::string() : values.front();
 }
 
+unsigned long Arguments::Number(std::string_view name, unsigned long otherwise) const {
+    return Has(name) ? std::stoul(One(name)) : otherwise;
+}
+
 }  // namespace fileindexctl

@@ -23,6 +23,9 @@ public:
     /// The only value; empty when the parameter was not given.
     std::string One(std::string_view name) const;
 
+    /// The value of an option that takes a number, else `otherwise`.
+    unsigned long Number(std::string_view name, unsigned long otherwise) const;
+
 private:
     std::map<std::string, std::vector<std::string>, std::less<>> values_;
 };

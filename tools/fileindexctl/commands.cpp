@@ -50,12 +50,18 @@ constexpr Parameter kShareRename[] = {
     {"NEW", Takes::One, "", "the name that the share has now"},
 };
 constexpr Parameter kShareDelete[] = {{"SHARE", Takes::One, "", "the name of the share"}, kYes};
+constexpr Parameter kOneShare = {"SHARE", Takes::Optional, "", "only this share"};
+constexpr Parameter kMonitor[] = {kOneShare};
+constexpr Parameter kQueueShow[] = {kOneShare, {"--limit", Takes::Number, "N", "show at most N events"}};
+constexpr Parameter kQueueCount[] = {kOneShare};
 constexpr Parameter kMigrate[] = {{"--dry-run", Takes::Nothing, "", "only say what would be done"}};
 
 constexpr struct {
     std::string_view name;
     std::string_view help;
-} kGroups[] = {{"share", "Keep the index in step with a share"}};
+} kGroups[] = {{"share", "Keep the index in step with a share"},
+               {"monitor", "What is watched for changes"},
+               {"queue", "What waits for fileindexd"}};
 
 constexpr Command kCommands[] = {
     {"", "list", "Show the indexed folders", kList, ListFolders},
@@ -76,6 +82,10 @@ constexpr Command kCommands[] = {
     {"share", "pause", "Stop the worker and the monitor of a share", kShare, PauseShare},
     {"share", "resume", "Start the monitor and the worker of a share again", kShare, ResumeShare},
     {"share", "clean", "Delete the queue and the index database of a share", kShareDelete, CleanShare},
+    {"monitor", "show", "Compare what is watched with what should be", kMonitor, ShowMonitor},
+    {"monitor", "refresh", "Have watched what should be", kMonitor, RefreshMonitors},
+    {"queue", "show", "Show the events that wait, the oldest first", kQueueShow, ShowQueue},
+    {"queue", "count", "Count the events that wait", kQueueCount, CountQueue},
     {"", "migrate", "Bring everything into line with the folders after an upgrade", kMigrate, Migrate},
 };
 

@@ -19,10 +19,6 @@ namespace {
 
 using VORK::FILEINDEX::Folder;
 
-unsigned long Number(const Arguments &arguments, std::string_view name, unsigned long otherwise) {
-    return arguments.Has(name) ? std::stoul(arguments.One(name)) : otherwise;
-}
-
 // All folders in the order asked for. The library is asked for everything and the page is cut here, because its
 // descending order leaves the offset out and because it knows no filter by share.
 std::vector<Json::Value> Sorted(const Arguments &arguments) {
@@ -74,9 +70,9 @@ void ShowTable(const Json::Value &page, bool status, Output &output) {
 ExitStatus ListFolders(const Arguments &arguments, Output &output) {
     std::vector<Json::Value> records = Sorted(arguments);
     const std::size_t total = records.size();
-    const unsigned long offset = Number(arguments, "--offset", 0);
+    const unsigned long offset = arguments.Number("--offset", 0);
     const std::size_t begin = std::min<std::size_t>(offset, total);
-    const std::size_t count = std::min<std::size_t>(Number(arguments, "--limit", total), total - begin);
+    const std::size_t count = std::min<std::size_t>(arguments.Number("--limit", total), total - begin);
 
     Json::Value page(Json::arrayValue);
     for (std::size_t i = begin; i < begin + count; ++i) {

@@ -44,6 +44,14 @@ ExitStatus PauseShare(const Arguments &arguments, Output &output);
 ExitStatus ResumeShare(const Arguments &arguments, Output &output);
 ExitStatus CleanShare(const Arguments &arguments, Output &output);
 
+// monitor.cpp
+ExitStatus ShowMonitor(const Arguments &arguments, Output &output);
+ExitStatus RefreshMonitors(const Arguments &arguments, Output &output);
+
+// queue_verbs.cpp
+ExitStatus ShowQueue(const Arguments &arguments, Output &output);
+ExitStatus CountQueue(const Arguments &arguments, Output &output);
+
 // migrate.cpp
 ExitStatus Migrate(const Arguments &arguments, Output &output);
 

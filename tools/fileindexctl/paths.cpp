@@ -91,6 +91,19 @@ std::string ShareOf(const std::string &sharePath) {
     return share;
 }
 
+std::string ShareOfFullPath(const std::string &fullPath) {
+    const std::string path = SharePathOf(fullPath);
+    return path.empty() ? path : ShareOf(path);
+}
+
+std::set<std::string> SharesOf(const Folders &folders) {
+    std::set<std::string> shares;
+    for (const auto &folder : folders) {
+        shares.insert(ShareOf(folder.path));
+    }
+    return shares;
+}
+
 std::string RequireShare(const std::string &share) {
     const SharePointer found = FindShare(share);
     if (found) {

@@ -5,6 +5,7 @@
 
 #include <fileindex/folder.h>
 
+#include <set>
 #include <string>
 #include <vector>
 
@@ -45,6 +46,12 @@ std::string RequireShare(const std::string &share);
 
 /// The share's name of a share path.
 std::string ShareOf(const std::string &sharePath);
+
+/// The share that holds a full path; empty when none does.
+std::string ShareOfFullPath(const std::string &fullPath);
+
+/// The names of the shares that the folders lie on.
+std::set<std::string> SharesOf(const Folders &folders);
 
 bool IsSharePresent(const std::string &share);
 

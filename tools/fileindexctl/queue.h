@@ -11,6 +11,7 @@
 
 namespace fileindexctl {
 
+inline constexpr unsigned kRenameEvent = 0x100;
 inline constexpr unsigned kReindexEvent = 0x10000;
 inline constexpr unsigned kSettingsEvent = 0x20000;
 
@@ -29,6 +30,9 @@ std::optional<Backlog> ReadBacklog(const std::string &share, const std::string &
 
 /// Is a reindex of exactly this full path queued?
 bool IsReindexQueued(const std::string &share, const std::string &fullPath);
+
+/// "reindex", "settings", "rename"; for what happened to files otherwise, the number.
+std::string EventName(unsigned type);
 
 /// {"total", "events": {"65536": N}, "malformed", "tmp", "oldest"}.
 Json::Value BacklogJson(const Backlog &backlog);

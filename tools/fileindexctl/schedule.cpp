@@ -9,6 +9,7 @@
 #include <fileindex/status.h>
 #include <fileindex/status_mgr.h>
 
+#include <algorithm>
 #include <array>
 #include <cstdio>
 #include <ctime>
@@ -134,6 +135,23 @@ std::string PauseText(long long resumeTime) {
         return "indexing is not paused; a pause ended at " + LocalTime(resumeTime);
     }
     return "indexing is paused until " + LocalTime(resumeTime);
+}
+
+std::string AgeText(const std::optional<long long> &since) {
+    if (!since) {
+        return "-";
+    }
+    const long long seconds = std::max<long long>(0, std::time(nullptr) - *since);
+    constexpr long long minute = 60;
+    constexpr long long hour = 60 * minute;
+    constexpr long long day = 24 * hour;
+    if (seconds < 2 * minute) {
+        return std::to_string(seconds) + " s";
+    }
+    if (seconds < 2 * hour) {
+        return std::to_string(seconds / minute) + " min";
+    }
+    return seconds < 2 * day ? std::to_string(seconds / hour) + " h" : std::to_string(seconds / day) + " days";
 }
 
 ExitStatus PauseIndexing(const Arguments &arguments, Output &output) {

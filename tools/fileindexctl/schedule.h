@@ -1,14 +1,18 @@
 /// \file
-/// Times of resumption in words.
+/// Times in words.
 #ifndef FILEINDEXCTL_SCHEDULE_H
 #define FILEINDEXCTL_SCHEDULE_H
 
+#include <optional>
 #include <string>
 
 namespace fileindexctl {
 
 /// "indexing is paused until 2025-03-01 07:00 CET", for a time as StatusMgr::GetPauseInfo gives it.
 std::string PauseText(long long resumeTime);
+
+/// How long ago that was: "12 min"; "-" when it is not known.
+std::string AgeText(const std::optional<long long> &since);
 
 }  // namespace fileindexctl
 

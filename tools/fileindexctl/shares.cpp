@@ -3,6 +3,8 @@
 #include "failure.h"
 #include "handlers.h"
 #include "paths.h"
+#include "queue_files.h"
+#include "registrations.h"
 #include "steps.h"
 #include "text.h"
 
@@ -25,7 +27,6 @@ namespace {
 using VORK::FILEINDEX::IndexMgr;
 
 constexpr std::string_view kIndexMgr = "index_mgr.cpp";
-constexpr const char *kRegistration = "fileindex";
 
 std::vector<std::string> PathsOf(const std::string &share, const Folders &folders) {
     std::vector<std::string> paths;
@@ -43,11 +44,6 @@ std::vector<std::string> RequireIndexed(const std::string &share, const Folders 
         throw Failure(ExitStatus::NoSuchFolder, "no folder of the share \"" + share + "\" is indexed");
     }
     return paths;
-}
-
-std::string QueueOf(const std::string &share) {
-    std::array<char, 4096> path{};
-    return FILEIDXQueuePathGet(share.c_str(), path.data(), path.size()) < 0 ? std::string() : path.data();
 }
 
 void StateShare(const std::string &share, Output &output) {
@@ -85,7 +81,7 @@ bool WithdrawFormer(const std::string &oldShare, const std::string &newShare) {
     if (IsSharePresent(oldShare)) {
         return IndexMgr::DeleteVorkNotifydCfg(oldShare);
     }
-    const std::string queue = QueueOf(newShare);
+    const std::string queue = QueuePathOf(newShare);
     const std::string directory = RequireShare(newShare);
     if (!VORK::FILEINDEX::StringStartWith(queue, directory)) {
         return false;
@@ -209,7 +205,7 @@ ExitStatus CleanShare(const Arguments &arguments, Output &output) {
 
     std::array<char, 4096> database{};
     FILEIDXDBPathGet(share.c_str(), database.data(), database.size());
-    const std::string queue = QueueOf(share);
+    const std::string queue = QueuePathOf(share);
     const std::pair<const char *, std::string> files[] = {
         {"queue", queue}, {"queue at work", queue + ".tmp"}, {"database", database.data()}};
     StepReport report;

@@ -12,7 +12,6 @@
 #include <fileindex/status.h>
 #include <fileindex/status_mgr.h>
 
-#include <ctime>
 #include <map>
 #include <set>
 
@@ -37,23 +36,6 @@ Json::Value Array(const std::vector<std::string> &items) {
         array.append(item);
     }
     return array;
-}
-
-std::string Age(const std::optional<long long> &since) {
-    if (!since) {
-        return "-";
-    }
-    const long long seconds = std::max<long long>(0, std::time(nullptr) - *since);
-    constexpr long long minute = 60;
-    constexpr long long hour = 60 * minute;
-    constexpr long long day = 24 * hour;
-    if (seconds < 2 * minute) {
-        return std::to_string(seconds) + " s";
-    }
-    if (seconds < 2 * hour) {
-        return std::to_string(seconds / minute) + " min";
-    }
-    return seconds < 2 * day ? std::to_string(seconds / hour) + " h" : std::to_string(seconds / day) + " days";
 }
 
 void ShowRows(const std::vector<std::vector<std::string>> &rows, unsigned width, Output &output) {
@@ -119,7 +101,7 @@ void ShowShares(const Folders &folders, const std::string &only, Output &output)
             rows.push_back({share, std::to_string(count), "-", "-", "the share is away"});
             continue;
         }
-        rows.push_back({share, std::to_string(count), std::to_string(backlog->Total()), Age(backlog->oldest),
+        rows.push_back({share, std::to_string(count), std::to_string(backlog->Total()), AgeText(backlog->oldest),
                         BacklogText(*backlog) + (backlog->hasTemporary ? " (.tmp present)" : "")});
     }
     if (rows.size() > 1) {

@@ -1,0 +1,141 @@
+#include "handlers.h"
+#include "paths.h"
+#include "queue.h"
+#include "queue_files.h"
+#include "schedule.h"
+#include "text.h"
+
+#include <algorithm>
+#include <limits>
+#include <set>
+
+namespace fileindexctl {
+
+namespace {
+
+// The share that was asked for, or all with folders.
+std::set<std::string> Shares(const Arguments &arguments) {
+    if (arguments.Has("SHARE")) {
+        RequireShare(arguments.One("SHARE"));
+        return {arguments.One("SHARE")};
+    }
+    return SharesOf(ReadFolders());
+}
+
+std::string Padded(std::string name) {
+    constexpr std::size_t kWidth = 8;
+    name.resize(std::max(name.size(), kWidth), ' ');
+    return name;
+}
+
+// A queue may be long, so its lines are shown as they are read.
+class Listing {
+public:
+    Listing(unsigned long limit, Output &output) : left_(limit), output_(output) {
+        output_.Data()["event"] = Json::Value(Json::arrayValue);
+    }
+
+    void Show(const std::string &share, QueueFiles files) {
+        files.Visit([&](const QueueEvent *event) {
+            if (event == nullptr) {
+                ++malformed_;
+            } else if (left_ == 0) {
+                ++leftOut_;
+            } else {
+                --left_;
+                ShowEvent(share, *event);
+            }
+        });
+    }
+
+    void Finish() {
+        output_.Data()["left_out"] = static_cast<Json::UInt64>(leftOut_);
+        output_.Data()["malformed"] = static_cast<Json::UInt64>(malformed_);
+        if (leftOut_ > 0) {
+            output_.Note("left out: " + std::to_string(leftOut_));
+        }
+        if (malformed_ > 0) {
+            output_.Warn("malformed lines, which are not shown: " + std::to_string(malformed_));
+        }
+    }
+
+private:
+    void ShowEvent(const std::string &share, const QueueEvent &event) {
+        if (!output_.IsJson()) {
+            output_.Line(Printable(share + "  " + Padded(EventName(event.type)) + "  " +
+                                   (event.oldPath.empty() ? "" : event.oldPath + " -> ") + event.path +
+                                   (event.taken ? "  (taken)" : "")));
+            return;
+        }
+        Json::Value entry(Json::objectValue);
+        entry["share"] = share;
+        entry["event"] = event.type;
+        entry["path"] = event.path;
+        entry["data"] = event.data;
+        entry["tmp"] = event.taken;
+        if (!event.oldPath.empty()) {
+            entry["path_old"] = event.oldPath;
+        }
+        output_.Data()["event"].append(entry);
+    }
+
+    unsigned long left_;
+    unsigned long leftOut_ = 0;
+    unsigned long malformed_ = 0;
+    Output &output_;
+};
+
+void AddRows(const std::string &share, const Backlog &backlog, std::vector<std::vector<std::string>> &rows) {
+    for (const auto &[type, count] : backlog.events) {
+        rows.push_back({share, EventName(type), std::to_string(count)});
+    }
+    if (backlog.malformed > 0) {
+        rows.push_back({share, "malformed", std::to_string(backlog.malformed)});
+    }
+    rows.push_back({share, "all", std::to_string(backlog.Total() + backlog.malformed),
+                    AgeText(backlog.oldest) + (backlog.hasTemporary ? " (.tmp present)" : "")});
+}
+
+}  // namespace
+
+ExitStatus ShowQueue(const Arguments &arguments, Output &output) {
+    const auto shares = Shares(arguments);
+    Listing listing(arguments.Number("--limit", std::numeric_limits<unsigned long>::max()), output);
+    for (const auto &share : shares) {
+        const std::string path = QueuePathOf(share);
+        if (path.empty()) {
+            output.Warn("the share \"" + share + "\" is away");
+            continue;
+        }
+        listing.Show(share, QueueFiles(path));
+    }
+    listing.Finish();
+    return ExitStatus::Done;
+}
+
+ExitStatus CountQueue(const Arguments &arguments, Output &output) {
+    std::vector<std::vector<std::string>> rows = {{"SHARE", "EVENT", "LINES", "OLDEST"}};
+    output.Data()["share"] = Json::Value(Json::arrayValue);
+    for (const auto &share : Shares(arguments)) {
+        const auto backlog = ReadBacklog(share, "");
+        Json::Value entry(Json::objectValue);
+        entry["name"] = share;
+        entry["queue"] = backlog ? BacklogJson(*backlog) : Json::Value();
+        output.Data()["share"].append(entry);
+        if (backlog) {
+            AddRows(share, *backlog, rows);
+        } else {
+            output.Warn("the share \"" + share + "\" is away");
+        }
+    }
+    if (rows.size() == 1) {
+        output.Note("no folder is indexed");
+        return ExitStatus::Done;
+    }
+    for (const auto &line : Align(rows, output.Width())) {
+        output.Line(line);
+    }
+    return ExitStatus::Done;
+}
+
+}  // namespace fileindexctl
