@@ -72,6 +72,8 @@ constexpr Command kCommands[] = {
     {"", "check", "Is the path indexed?", kQuestion, CheckPath},
     {"", "contains", "Does an indexed folder lie at or under the path?", kQuestion, ContainsFolder},
     {"", "governs", "Whose settings hold for the path?", kQuestion, GoverningFolder},
+    {"", "explain", "Why a path is indexed or not, rule by rule; exit status 1 if it may not be", kQuestion,
+     ExplainPath},
     {"", "status", "How far indexing is, and what waits", kStatus, ShowStatus},
     {"", "pause", "Pause indexing", kPause, PauseIndexing},
     {"", "resume", "Go on with indexing", {}, ResumeIndexing},

@@ -26,6 +26,9 @@ ExitStatus CheckPath(const Arguments &arguments, Output &output);
 ExitStatus ContainsFolder(const Arguments &arguments, Output &output);
 ExitStatus GoverningFolder(const Arguments &arguments, Output &output);
 
+// explain.cpp
+ExitStatus ExplainPath(const Arguments &arguments, Output &output);
+
 // status.cpp
 ExitStatus ShowStatus(const Arguments &arguments, Output &output);
 

@@ -45,6 +45,14 @@ std::string Serialise(const Json::Value &document) {
 
 }  // namespace
 
+Json::Value ToArray(const std::vector<std::string> &items) {
+    Json::Value array(Json::arrayValue);
+    for (const auto &item : items) {
+        array.append(item);
+    }
+    return array;
+}
+
 Output::Output(bool json) : json_(json), colour_(MayColour()), width_(TerminalWidth()), data_(Json::objectValue) {}
 
 void Output::Line(std::string_view text) {

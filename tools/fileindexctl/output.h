@@ -57,6 +57,9 @@ private:
     std::vector<std::string> warnings_;
 };
 
+/// A JSON array of texts.
+Json::Value ToArray(const std::vector<std::string> &items);
+
 }  // namespace fileindexctl
 
 #endif

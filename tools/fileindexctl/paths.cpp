@@ -1,17 +1,16 @@
 #include "paths.h"
 
 #include "failure.h"
+#include "share_record.h"
 
 #include <fileindex/folders.h>
 #include <fileindex/index_mgr.h>
 #include <fileindex/paths.h>
 
 #include <vork/error.h>
-#include <vork/share.h>
 
 #include <algorithm>
 #include <array>
-#include <memory>
 
 namespace fileindexctl {
 
@@ -20,16 +19,6 @@ namespace {
 using VORK::FILEINDEX::Folder;
 
 constexpr const char *kWhereSharesAre = "the shares are those of /usr/vork/etc/platform.conf";
-
-struct ShareDeleter {
-    void operator()(VORKSHARE *share) const { VORKShareFree(share); }
-};
-using SharePointer = std::unique_ptr<VORKSHARE, ShareDeleter>;
-
-SharePointer FindShare(const std::string &name) {
-    VORKSHARE *share = nullptr;
-    return SharePointer(VORKShareGet(name.c_str(), &share) < 0 ? nullptr : share);
-}
 
 std::string WithoutTrailingSlashes(const std::string &path) {
     return path.substr(0, path.find_last_not_of('/') + 1);

@@ -12,14 +12,6 @@ namespace {
 
 using VORK::FILEINDEX::IndexMgr;
 
-Json::Value Array(const std::vector<std::string> &items) {
-    Json::Value array(Json::arrayValue);
-    for (const auto &item : items) {
-        array.append(item);
-    }
-    return array;
-}
-
 ExitStatus Answer(bool yes) {
     return yes ? ExitStatus::Done : ExitStatus::No;
 }
@@ -45,7 +37,7 @@ ExitStatus CheckPath(const Arguments &arguments, Output &output) {
                                       : IndexMgr::IsPathIndexed(place.path, folders);
     const auto covering = Covering(place, folders);
     output.Data()["indexed"] = indexed;
-    output.Data()["covered_by"] = Array(covering);
+    output.Data()["covered_by"] = ToArray(covering);
     const auto alsoCovering = Covering(AsFullPath(place), folders);
     if (!indexed && !alsoCovering.empty()) {
         output.Warn("as a full path, \"" + place.fullPath + "\" lies in " + Enumerate(alsoCovering) +
@@ -61,7 +53,7 @@ ExitStatus ContainsFolder(const Arguments &arguments, Output &output) {
     const auto contained = Contained(place, folders);
     const bool any = place.isFull ? !contained.empty() : IndexMgr::IsPathContainIndexed(place.path, folders);
     output.Data()["contains"] = any;
-    output.Data()["folders"] = Array(contained);
+    output.Data()["folders"] = ToArray(contained);
     Say(place, any ? "contains " + Enumerate(contained) : "contains no indexed folder", output);
     return Answer(any);
 }

@@ -154,6 +154,10 @@ std::string AgeText(const std::optional<long long> &since) {
     return seconds < 2 * day ? std::to_string(seconds / hour) + " h" : std::to_string(seconds / day) + " days";
 }
 
+bool IsPaused(long long resumeTime) {
+    return resumeTime == kWithoutEnd || resumeTime > std::time(nullptr);
+}
+
 ExitStatus PauseIndexing(const Arguments &arguments, Output &output) {
     if (arguments.Has("HOURS") && arguments.Has("--until")) {
         throw Failure(ExitStatus::Usage, "give a number of hours or --until, not both");

@@ -14,6 +14,9 @@ std::string PauseText(long long resumeTime);
 /// How long ago that was: "12 min"; "-" when it is not known.
 std::string AgeText(const std::optional<long long> &since);
 
+/// Does a pause with such an end hold now?
+bool IsPaused(long long resumeTime);
+
 }  // namespace fileindexctl
 
 #endif

@@ -30,14 +30,6 @@ public:
     }
 };
 
-Json::Value Array(const std::vector<std::string> &items) {
-    Json::Value array(Json::arrayValue);
-    for (const auto &item : items) {
-        array.append(item);
-    }
-    return array;
-}
-
 void ShowRows(const std::vector<std::vector<std::string>> &rows, unsigned width, Output &output) {
     for (const auto &line : Align(rows, width)) {
         output.Line(line);
@@ -70,8 +62,8 @@ void ShowService(Output &output) {
     data["status"] = state;
     data["resume_time"] = static_cast<Json::Int64>(resumeTime);
     data["daemon"] = daemon.reachable;
-    data["no_space"] = Array(noSpace);
-    data["need_reindex"] = Array(needReindex);
+    data["no_space"] = ToArray(noSpace);
+    data["need_reindex"] = ToArray(needReindex);
     ShowRows({{"state", state},
               {"pause", PauseText(resumeTime)},
               {"daemon", daemon.text},

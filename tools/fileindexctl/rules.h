@@ -1,0 +1,40 @@
+/// \file
+/// The rules that decide whether a folder may be indexed, one by one and in the library's order, with the fact
+/// behind each. The library answers with yes or no; this finds the reason, and never a different answer.
+#ifndef FILEINDEXCTL_RULES_H
+#define FILEINDEXCTL_RULES_H
+
+#include "paths.h"
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace fileindexctl {
+
+enum class RuleResult { Passed, Failed, NotReached };
+
+struct RuleOutcome {
+    std::string_view key;    ///< for programs: "mount_point"
+    std::string_view label;  ///< for people: "not a mount point"
+    RuleResult result;
+    std::string fact;
+    std::string remedy;  ///< of a failed rule
+};
+
+struct Verdict {
+    bool indexable;  ///< the library's own answer
+    std::vector<RuleOutcome> rules;
+    bool explained;  ///< do the rules lead to that answer?
+
+    /// The rule that fails and explains the answer; null when there is none.
+    const RuleOutcome *Failed() const;
+};
+
+/// Asks the library about the place as it was taken, and looks at the rules. When the two differ, something may
+/// have changed in between, so both are asked once more before the verdict counts as not explained.
+Verdict Judge(const Place &place);
+
+}  // namespace fileindexctl
+
+#endif
