@@ -42,8 +42,7 @@ inline std::string DocumentedExample(const std::string &text) {
     const std::string readme = ReadText((source == nullptr ? "." : std::string(source)) + "/platform/README.md");
     const std::string start = "```json\n";
     for (size_t at = readme.find(start); at != std::string::npos; at = readme.find(start, at + 1)) {
-        const std::string example =
-            readme.substr(at + start.size(), readme.find("```", at + 1) - at - start.size());
+        std::string example = readme.substr(at + start.size(), readme.find("```", at + 1) - at - start.size());
         if (example.find(text) != std::string::npos) {
             return example;
         }
