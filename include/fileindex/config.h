@@ -15,6 +15,7 @@
 namespace VORK {
 namespace FILEINDEX {
 
+/// What Folders and Status have in common: a JSON document, its file and the file's lock.
 class FILEINDEX_API Config {
 public:
     /// An empty JSON object, no lock. Touches no file.
@@ -24,9 +25,16 @@ public:
     /// process ends. Callers pair Lock with Unlock.
     virtual ~Config();
 
+    /// Reads the file into a fresh object (LoadJson) and makes of it what the class holds.
     virtual bool Load() = 0;
+
+    /// Writes what the class holds to the file (SaveJson).
     virtual bool Save() = 0;
+
+    /// The lock file, absolute.
     virtual std::string GetLockPath() const = 0;
+
+    /// The file, absolute.
     virtual std::string GetPath() const = 0;
 
     /// Takes the advisory lock on GetLockPath(); `exclusive` for writers, shared for readers.

@@ -36,6 +36,7 @@ public:
     /// The code of the last failure in this process, by any thread; FILEINDEX_ERR_NONE before the first.
     FILEINDEX_API static _tag_fileindex_err_ GetError();
 
+    /// The code itself. Programs of old read it as a variable; new ones call GetError.
     FILEINDEX_API static _tag_fileindex_err_ g_error_code;
 };
 

@@ -3,6 +3,7 @@
 #ifndef FILEINDEX_EXPORT_H
 #define FILEINDEX_EXPORT_H
 
+/// Marks what the shared library exports.
 #define FILEINDEX_API __attribute__((visibility("default")))
 
 #endif

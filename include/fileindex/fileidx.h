@@ -23,9 +23,9 @@ extern "C" {
 #endif
 
 /**
- * Writes the path of the share's event queue file, SHAREDIR/@eaDir/VORK@file_index_queue, to `szOutQueuePath`.
+ * Writes the path of the share's event queue file, `SHAREDIR/@eaDir/VORK@file_index_queue`, to `szOutQueuePath`.
  *
- * Makes the metadata directory "@eaDir" if it is missing (a failure to do so is logged and not fatal), never
+ * Makes the metadata directory `@eaDir` if it is missing (a failure to do so is logged and not fatal), never
  * the queue file. -1 on a null pointer or `cbOutLen` below 1 (platform error 0x0D00) and on an unknown share
  * (platform error as the share library left it); then the buffer is untouched. The library's own error code
  * is not set.
@@ -37,10 +37,14 @@ extern "C" {
 FILEINDEX_API int FILEIDXQueuePathGet(const char *szName, char *szOutQueuePath, int cbOutLen);
 
 /**
- * Writes the path of the share's index database directory, SHAREDIR/@eaDir/VORK@.fileindexdb, to `szOutDBPath`.
+ * Writes the path of the share's index database directory, `SHAREDIR/@eaDir/VORK@.fileindexdb`, to `szOutDBPath`.
  *
  * As FILEIDXQueuePathGet, and also makes the database directory itself (mode 0777 less the umask), whole even
  * when the text was cut to a short buffer; failing to make it is logged and not fatal.
+ *
+ * @param szName        the share's name, not a path
+ * @param szOutDBPath   the caller's buffer
+ * @param cbOutLen      its size in bytes
  */
 FILEINDEX_API int FILEIDXDBPathGet(const char *szName, char *szOutDBPath, int cbOutLen);
 

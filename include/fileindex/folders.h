@@ -36,7 +36,10 @@ public:
     /// Writes all folders to folder.conf (Config::SaveJson). Only "path", "name" and the four flags survive.
     bool Save() override;
 
+    /// /tmp/fileidx_cfg_folder.lock
     std::string GetLockPath() const override;
+
+    /// /usr/vork/etc/fileindex/folder.conf
     std::string GetPath() const override;
 
     /// The record stored under exactly `path` (share path). Unknown: one record,
@@ -51,12 +54,15 @@ public:
 
     /// One page as JSON: {"total": all folders, "offset": as given, "folder": [records with "additional"]}.
     ///
+    /// @param out             the page
+    /// @param offset          how many folders to leave out; beyond the total, the page is empty
+    /// @param limit           how many folders to show at most
     /// @param sort_by         "name", "document", "audio", "video", "photo" (false first); anything else
     ///                        sorts by path. Names and paths are compared without regard to letter case
     /// @param sort_direction  exactly "DESC" gives the first min(total - offset, limit) of the ascending
     ///                        order, reversed, without regard to the offset; anything else ascends
     /// @param additional      keys for Folder::GetAdditional; errors in them do not stop the listing
-    /// An `offset` beyond the total gives an empty page. Always true.
+    /// @return always true
     bool List(Json::Value &out, unsigned long offset, unsigned long limit, const std::string &sort_by,
               const std::string &sort_direction, const Json::Value &additional);
 
@@ -66,14 +72,15 @@ public:
     ///                at that path changes
     /// @param folder  a record with at least a string "path" (share path) on an existing share; otherwise
     ///                one record, FILEINDEX_ERR_BAD_PARAM, false
-    /// At most 1000 folders: one more gives one record, FILEINDEX_ERR_EXCEED_MAX_FOLDER and false, and this
-    /// object must not be saved any more.
+    /// @return false also for the 1001st folder, with one record and FILEINDEX_ERR_EXCEED_MAX_FOLDER; this object
+    ///         must not be saved any more then
     bool Upsert(Json::Value &out, const Json::Value &folder);
 
     /// Removes the folder under `path`, if there is one. In memory: Save keeps it.
     ///
-    /// @param out  {path: change report}; untouched when the path no longer resolves, which is still true, so
-    ///             that folders of a vanished share can be removed
+    /// @param out   {path: change report}; untouched when the path no longer resolves, which is still true, so
+    ///              that folders of a vanished share can be removed
+    /// @param path  share path, exactly as stored
     bool Delete(Json::Value &out, const std::string &path);
 
 private:

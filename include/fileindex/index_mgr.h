@@ -22,6 +22,7 @@
 namespace VORK {
 namespace FILEINDEX {
 
+/// All of it is static: an operation needs no object and leaves none.
 class IndexMgr {
 public:
     /// \name Questions
@@ -33,14 +34,17 @@ public:
     /// Does the share path lie at or under an indexed folder? "/photo/2015" covers "/photo/2015/a", not
     /// "/photo/20150".
     FILEINDEX_API static bool IsPathIndexed(const std::string &path);
+    /// The same of a list that the caller holds. Reads no file and asks nobody.
     FILEINDEX_API static bool IsPathIndexed(const std::string &path, const std::vector<Folder> &folders);
 
     /// Does an indexed folder lie at or under the share path?
     FILEINDEX_API static bool IsPathContainIndexed(const std::string &path);
+    /// The same of a list that the caller holds.
     FILEINDEX_API static bool IsPathContainIndexed(const std::string &path, const std::vector<Folder> &folders);
 
     /// Does the full path lie at or under an indexed folder? A folder whose share is away covers nothing.
     FILEINDEX_API static bool IsFullPathIndexed(const std::string &path);
+    /// The same of a list that the caller holds; full paths that could not be resolved are tried again.
     FILEINDEX_API static bool IsFullPathIndexed(const std::string &path, const std::vector<Folder> &folders);
 
     /// Does any indexed folder belong to the share of exactly this name?
@@ -89,6 +93,8 @@ public:
     /// without folders loses its queue, index database and monitor; when no folder is left anywhere, the
     /// daemon is stopped and the search setting switched off. A folder whose share is gone is removed and saved,
     /// but the call fails where its event cannot be queued or its share not be cleaned.
+    /// Codes: BAD_PARAM, LOCK, LOAD_JSON, MALFORMED_CONFIG, SAVE_JSON, PATH; as for Upsert, those who refuse set
+    /// none.
     FILEINDEX_API static bool Delete(const Json::Value &paths);
 
     /// Queues a reindex of each share path of the array, whose shares must be indexed, and revives shares that
@@ -104,7 +110,8 @@ public:
     /// what was registered before. Sets no code of its own.
     FILEINDEX_API static bool UpsertVorkNotifydCfg(const std::string &share);
 
-    /// Withdraws the share's registration.
+    /// Withdraws the share's registration; one that does not exist is no failure. Neither reads nor locks
+    /// folder.conf and sets no code of its own.
     FILEINDEX_API static bool DeleteVorkNotifydCfg(const std::string &share);
     /// @}
 
@@ -113,12 +120,14 @@ public:
     /// @{
 
     /// Moves the folders of `oldShare` to `newShare`, which exists already, in folder.conf. Nobody is told, and
-    /// the monitor keeps its old registration. Takes the lock.
+    /// the monitor keeps its old registration. Both are names of shares, and only folders of exactly `oldShare`
+    /// move. Takes the lock. Codes: BAD_PARAM for an unknown new share, LOCK, LOAD_JSON, MALFORMED_CONFIG,
+    /// SAVE_JSON.
     FILEINDEX_API static bool ShareRename(const std::string &oldShare, const std::string &newShare);
 
     /// Removes the folders of the share from folder.conf; when none is left anywhere, stops the daemon and
     /// switches the search setting off (failures there are only logged). Index data, monitor and flags of the
-    /// share stay. Takes the lock.
+    /// share stay. Takes the lock. Codes: LOCK, LOAD_JSON, MALFORMED_CONFIG, SAVE_JSON.
     FILEINDEX_API static bool ShareRemove(const std::string &share);
 
     /// Stops the daemon's worker of the share, then its monitor. No lock.

@@ -17,12 +17,20 @@ namespace FILEINDEX {
 /// except the questions (Is...) and GetPauseInfo, which never throw.
 class FILEINDEX_API Status : public Config {
 public:
+    /// Not paused, nothing marked. Touches no file.
     Status();
     ~Status() override;
 
+    /// Config::LoadJson.
     bool Load() override;
+
+    /// Config::SaveJson. Call it with the lock held.
     bool Save() override;
+
+    /// /tmp/fileidx_cfg_status.lock
     std::string GetLockPath() const override;
+
+    /// /usr/vork/etc/fileindex/status.conf
     std::string GetPath() const override;
 
     /// `resumeTime`: seconds since the epoch; 0 pauses without an end; -1 means not paused. Always true.

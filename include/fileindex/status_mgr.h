@@ -32,6 +32,8 @@ public:
 
     /// Marks or unmarks a share (its name) as out of space; the first mark notifies the administrators.
     FILEINDEX_API static bool ShareSetNoSpace(const std::string &share, bool noSpace);
+
+    /// Is the share marked? No, when status.conf cannot be read.
     FILEINDEX_API static bool ShareIsNoSpace(const std::string &share);
 
     /// Unmarks the share and sends "revive_share_worker" to the daemon, whether it was marked or not. False when
@@ -40,10 +42,14 @@ public:
 
     /// Marks or unmarks a share as waiting to be reindexed whole.
     FILEINDEX_API static bool ShareSetNeedReindex(const std::string &share, bool needReindex);
+
+    /// Is the share marked? No, when status.conf cannot be read.
     FILEINDEX_API static bool ShareIsNeedReindex(const std::string &share);
 
-    /// A marker of the caller's own; see Status::SetUpdated for the names to avoid.
+    /// Sets a marker of the caller's own; see Status::SetUpdated for the names to avoid.
     FILEINDEX_API static bool SetUpdated(const std::string &key);
+
+    /// Is the marker set? No, when status.conf cannot be read.
     FILEINDEX_API static bool IsUpdated(const std::string &key);
 
     /// The service as a whole: "processing", "paused" or "finished".

@@ -35,8 +35,10 @@ int VLIBCErrGet(void);
 /** Sets the code, and where: `szFile` is not copied and has to live for ever (a literal). */
 void VLIBCErrSetEx(int code, const char *szFile, int line);
 
-/** Where the code was set; never null. */
+/** The file in which the code was set; never null. */
 const char *VLIBCErrorGetFile(void);
+
+/** The line in which the code was set. */
 int VLIBCErrorGetLine(void);
 
 #ifdef __cplusplus

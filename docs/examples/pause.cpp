@@ -1,0 +1,35 @@
+#include <fileindex/fileindex.h>
+
+#include <ctime>
+#include <iostream>
+#include <string>
+
+using VORK::FILEINDEX::StatusMgr;
+
+int main() {
+    // False with the pause saved all the same, when the daemon could not be told: it reads the file when it
+    // starts.
+    if (!StatusMgr::Pause(8)) {
+        std::cout << "the daemon was not told\n";
+    }
+
+    long long resumeTime = -1;
+    if (StatusMgr::GetPauseInfo(resumeTime) && resumeTime > std::time(nullptr)) {
+        std::cout << "paused for " << (resumeTime - std::time(nullptr) + 3599) / 3600 << " hours\n";
+    }
+
+    // A pause shows as long as there is work.
+    std::string status;
+    if (StatusMgr::GetStatus(status)) {
+        std::cout << status << '\n';
+    }
+    std::cout << "/photo/2015: " << StatusMgr::GetFolderStatus("/photo/2015") << '\n';
+
+    StatusMgr::Resume();
+    std::cout << "/photo/2015: " << StatusMgr::GetFolderStatus("/photo/2015") << '\n';
+}
+// Output:
+// paused for 8 hours
+// paused
+// /photo/2015: paused
+// /photo/2015: processing
