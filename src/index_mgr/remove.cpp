@@ -16,8 +16,6 @@
 
 #include <syslog.h>
 
-#include <vector>
-
 namespace VORK {
 namespace FILEINDEX {
 
@@ -89,8 +87,7 @@ bool FollowShare(Folders &saved, const std::string &share) {
     }
     // "No" can also mean that folder.conf could not be read again. Cleaning then would delete the index of a share
     // that is in use; what was just saved decides.
-    std::vector<Folder> left;
-    if (!FoldersOf(saved, share, left) || !left.empty()) {
+    if (!FoldersOf(saved, share).empty()) {
         syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", kIndexMgrModule, 121, share.c_str());
         return false;
     }

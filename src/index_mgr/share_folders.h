@@ -12,17 +12,16 @@
 namespace VORK::FILEINDEX::internal {
 
 /// As Folders::List by share, but an empty name means the records whose own share name is empty, never all.
-inline bool FoldersOf(Folders &store, const std::string &share, std::vector<Folder> &folders) {
-    if (!store.List(folders, share)) {
-        return false;
-    }
+inline std::vector<Folder> FoldersOf(Folders &store, const std::string &share) {
+    std::vector<Folder> folders;
+    store.List(folders, share);
     if (share.empty()) {
         std::erase_if(folders, [](const Folder &folder) {
             std::string owner;
             return !GetShareNameByPath(owner, folder.path) || !owner.empty();
         });
     }
-    return true;
+    return folders;
 }
 
 }  // namespace VORK::FILEINDEX::internal

@@ -55,12 +55,11 @@ bool IndexMgr::ShareRename(const std::string &oldShare, const std::string &newSh
     return NoThrow([&] {
         Folders store;
         const ConfigUnlocker unlocker(store);
-        std::vector<Folder> folders;
-        if (!store.Lock(true) || !store.Load() || !FoldersOf(store, oldShare, folders)) {
+        if (!store.Lock(true) || !store.Load()) {
             return false;
         }
         Json::Value scratch;
-        for (Folder &folder : folders) {
+        for (Folder &folder : FoldersOf(store, oldShare)) {
             if (!store.Delete(scratch, folder.path)) {
                 return false;
             }
@@ -77,12 +76,11 @@ bool IndexMgr::ShareRemove(const std::string &share) {
     return NoThrow([&] {
         Folders store;
         const ConfigUnlocker unlocker(store);
-        std::vector<Folder> folders;
-        if (!store.Lock(true) || !store.Load() || !FoldersOf(store, share, folders)) {
+        if (!store.Lock(true) || !store.Load()) {
             return false;
         }
         Json::Value scratch;
-        for (const Folder &folder : folders) {
+        for (const Folder &folder : FoldersOf(store, share)) {
             if (!store.Delete(scratch, folder.path)) {
                 return false;
             }

@@ -91,15 +91,15 @@ struct OrdinaryReader::Parser {
 
     /// The text's top-level object; it is kept in the parser until the next text.
     bool Parse(std::string_view text, object &root) {
-        if (text.empty() || HasUnicodeEscape(text)) {
-            return false;
-        }
-        // Ahead of need, so that slowly growing lines do not allocate each time.
-        const std::size_t capacity = std::max(text.size(), 2 * parser.capacity());
-        if (text.size() > parser.capacity() && parser.allocate(capacity, kMaxDepth) != simdjson::SUCCESS) {
-            return false;
-        }
-        return parser.parse(text.data(), text.size(), false).get_object().get(root) == simdjson::SUCCESS;
+        return !text.empty() && !HasUnicodeEscape(text) && HasRoomFor(text.size()) &&
+               parser.parse(text.data(), text.size(), false).get_object().get(root) == simdjson::SUCCESS;
+    }
+
+private:
+    /// Allocates ahead of need, so that slowly growing lines do not allocate each time.
+    bool HasRoomFor(std::size_t size) {
+        return size <= parser.capacity() ||
+               parser.allocate(std::max(size, 2 * parser.capacity()), kMaxDepth) == simdjson::SUCCESS;
     }
 };
 

@@ -186,7 +186,7 @@ PendingReindexes::KnownQueue &PendingReindexes::Queue(const std::string &queueFi
 
 bool PendingReindexes::IsQueued(const std::string &fullPath, const std::string &sharePath,
                                 const std::string &queueFile) {
-    if (share_paths_.size() < 2 || !fullPath.ends_with(sharePath)) {
+    if (share_paths_.size() < 2) {
         return IsReindexQueued(fullPath, queueFile);
     }
     if (!IsFileExist(queueFile)) {
@@ -194,9 +194,6 @@ bool PendingReindexes::IsQueued(const std::string &fullPath, const std::string &
         return false;
     }
     KnownQueue &queue = Queue(queueFile, std::string_view(fullPath).substr(0, fullPath.size() - sharePath.size()));
-    if (!queue.wanted.contains(fullPath)) {
-        return IsReindexQueued(fullPath, queueFile);
-    }
     bool inLastLine = false;
     const auto restarted = [&] { queue.pending.clear(); };
     const auto visit = [&](std::string_view, const QueueEvent *event) {

@@ -24,7 +24,7 @@ namespace VORK::FILEINDEX::internal {
 /// A line that makes an event redundant is read again before the event is dropped.
 class PendingReindexes {
 public:
-    /// `sharePaths`: the share paths that will be asked for. Others are answered too, by a scan of their own.
+    /// `sharePaths`: the only share paths that may be asked for.
     explicit PendingReindexes(std::vector<std::string> sharePaths);
 
     /// Is a reindex of exactly this path waiting in the file? `sharePath` is the tail of `fullPath`.
