@@ -116,9 +116,9 @@ void FileIndexTest::GivenShare(const std::string &name, const std::string &path)
 }
 
 void FileIndexTest::GivenFolders(const std::vector<std::string> &records) {
-    std::string text;
+    std::string text = "{";
     for (const std::string &record : records) {
-        text += (text.empty() ? "{" : ",") + record;
+        text += (text.size() > 1 ? "," : "") + record;
     }
     GivenFolderConf(text + "}");
 }
@@ -167,19 +167,6 @@ int FileIndexTest::LeftCode() {
 void FileIndexTest::Forget() {
     Script::Current().ClearJournal();
     Left();
-}
-
-std::vector<std::string> FileIndexTest::Doings() {
-    std::vector<std::string> journal = Journal();
-    for (const char *line : {"lock folder exclusive", "unlock folder", "lock status exclusive",
-                             "saved status.conf", "unlock status"}) {
-        std::erase(journal, line);
-    }
-    return journal;
-}
-
-void FileIndexTest::ExpectOnlyTheFirst(size_t count, const std::vector<std::string> &steps) {
-    EXPECT_EQ(std::vector(steps.begin(), steps.begin() + static_cast<std::ptrdiff_t>(count)), Doings());
 }
 
 bool FileIndexTest::IsLocked(const std::string &lockFile) {

@@ -14,7 +14,6 @@
 #include <gtest/gtest.h>
 #include <json/value.h>
 
-#include <functional>
 #include <set>
 #include <string>
 #include <vector>
@@ -48,18 +47,6 @@ void WriteFile(const std::string &path, const std::string &text);
 /// {path: {record}} with the flags named by letters of "davp", for putting documents together.
 std::string FolderRecord(const std::string &path, const std::string &name, const std::string &flags);
 
-/// A step of an operation that is made to fail, and what is left of the operation.
-struct FailingStep {
-    const char *name;
-    std::function<void()> arrange;
-    size_t done;       ///< steps before it, which stay done
-    std::string left;  ///< as FileIndexTest::Left()
-};
-
-inline std::function<void()> WillFail(const Fault &fault) {
-    return [fault] { Script::Current().Fail(fault); };
-}
-
 class FileIndexTest : public testing::Test {
 protected:
     void SetUp() override;
@@ -89,10 +76,6 @@ protected:
     /// The code alone.
     static int LeftCode();
     static void Forget();
-
-    /// The journal without locks, and without the mark that a lost event leaves in status.conf.
-    static std::vector<std::string> Doings();
-    static void ExpectOnlyTheFirst(size_t count, const std::vector<std::string> &steps);
 
     static std::string FolderConf() { return Canonical(ReadFile(kFolderConf)); }
     static std::string StatusConf() { return Canonical(ReadFile(kStatusConf)); }

@@ -108,7 +108,7 @@ int VORKShareGet(const char *szName, _tag_VORKSHARE **ppShare) {
     record->name = found->first;
     record->path = found->second.path;
     record->szName = record->name.c_str();
-    record->szPath = record->path.c_str();
+    record->szPath = record->path.empty() ? nullptr : record->path.c_str();
     ++World().shareRecords;
     *ppShare = record;
     return 0;
@@ -137,7 +137,9 @@ int VORKShareNamePathGet(const char *szFullPath, char *szName, int cbName, char 
 }
 
 int VORKShareIsShareRecycle(const char *szFullPath) {
-    Script::Current().Take("VORKShareIsShareRecycle", szFullPath);
+    if (const auto result = Failure("VORKShareIsShareRecycle", szFullPath)) {
+        return static_cast<int>(*result);
+    }
     return StartsWithAny(szFullPath, World().recycleBins) ? 2 : 0;
 }
 
@@ -157,6 +159,9 @@ int VORKGetFSType(const char *szPath, int flags) {
     if (flags != 0) {
         throw std::logic_error("VORKGetFSType: flags");
     }
+    if (const auto result = Failure("VORKGetFSType", szPath)) {
+        return static_cast<int>(*result);
+    }
     for (const auto &[beginning, type] : World().fsTypes) {
         if (std::string(szPath).starts_with(beginning)) {
             return type;
@@ -166,11 +171,11 @@ int VORKGetFSType(const char *szPath, int flags) {
 }
 
 int VORKFSIsRemoteFS(int type) {
-    return type == kRemoteFs ? 1 : 0;
+    return static_cast<int>(Failure("VORKFSIsRemoteFS").value_or(type == kRemoteFs ? 1 : 0));
 }
 
 int VORKFSIsImageFS(int type) {
-    return type == kImageFs ? 1 : 0;
+    return static_cast<int>(Failure("VORKFSIsImageFS").value_or(type == kImageFs ? 1 : 0));
 }
 
 int VORKFSDirIsMntPoint(const char *szPath) {
@@ -222,8 +227,7 @@ int VLIBServiceRestart(const char *szName) {
 }
 
 int VORKSMBIsEnableSpotlight(void) {
-    Script::Current().Take("VORKSMBIsEnableSpotlight");
-    return World().searchOn ? 5 : 0;
+    return static_cast<int>(Failure("VORKSMBIsEnableSpotlight").value_or(World().searchOn ? 5 : 0));
 }
 
 int VORKSMBSetSpotlight(int enable) {

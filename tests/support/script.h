@@ -11,6 +11,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace fileindex_test {
@@ -42,6 +43,8 @@ public:
     /// Counts a call, and says how it is to fail.
     std::optional<Fault> Take(std::string_view call, std::string_view about = {});
     [[nodiscard]] int Calls(std::string_view call, std::string_view about = {}) const;
+    /// All calls in order, each by its name and what it was about.
+    [[nodiscard]] std::vector<std::pair<std::string, std::string>> Calls() const;
 
     void Record(std::string effect);
     [[nodiscard]] std::vector<std::string> Journal() const;
@@ -60,13 +63,10 @@ private:
         Fault fault;
         int seen = 0;
     };
-    struct Call {
-        std::string name, about;
-    };
 
     mutable std::mutex mutex_;
     std::vector<Rule> rules_;
-    std::vector<Call> calls_;
+    std::vector<std::pair<std::string, std::string>> calls_;
     std::vector<std::string> journal_;
     std::function<void()> hang_up_;
 };

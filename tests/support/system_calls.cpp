@@ -18,6 +18,7 @@
 #include <cstdlib>
 #include <ctime>
 #include <mutex>
+#include <new>
 #include <set>
 #include <string>
 
@@ -88,7 +89,7 @@ private:
 };
 
 Connections &OpenConnections() {
-    static Connections connections;
+    static auto &connections = *new Connections;  // for ever, as the script
     return connections;
 }
 
@@ -123,13 +124,23 @@ int open(const char *path, int flags, ...) {
     return Call<int>("open", path, path, flags, mode);
 }
 
+/// A close that fails has closed all the same.
 int close(int fd) {
     const bool connection = OpenConnections().Remove(fd);
+    const auto fault = Script::Current().Take("close", PathOf(fd));
     const int result = CallNext<int>("close", fd);
     if (connection) {
         Script::Current().HungUp();
     }
+    if (fault) {
+        errno = fault->error;
+        return -1;
+    }
     return result;
+}
+
+ssize_t pread(int fd, void *data, size_t size, off_t offset) {
+    return Call<ssize_t>("pread", PathOf(fd), fd, data, size, offset);
 }
 
 ssize_t write(int fd, const void *data, size_t size) {
@@ -162,6 +173,14 @@ int chmod(const char *path, mode_t mode) noexcept {
         Script::Current().Record("saved " + std::string(name.substr(name.rfind('/') + 1)));  // a save ends so
     }
     return result;
+}
+
+int fchmod(int fd, mode_t mode) noexcept {
+    return Call<int>("fchmod", PathOf(fd), fd, mode);
+}
+
+int linkat(int fromFd, const char *from, int toFd, const char *to, int flags) noexcept {
+    return Call<int>("linkat", to, fromFd, from, toFd, to, flags);
 }
 
 int mkdir(const char *path, mode_t mode) noexcept {
@@ -209,3 +228,8 @@ time_t time(time_t *out) noexcept {
 }
 
 }  // extern "C"
+
+/// The one allocation of the library that may fail without an exception.
+void *operator new(size_t size, const std::nothrow_t & /*unused*/) noexcept {
+    return Script::Current().Take("new") ? nullptr : ::operator new(size);
+}

@@ -5,9 +5,12 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <filesystem>
+#include <optional>
 #include <string>
+#include <vector>
 
 namespace fs = std::filesystem;
 
@@ -223,6 +226,8 @@ TEST_F(ConfigLoad, OfWhatIsNoFileLeavesTheEmptyObject) {
         {"not to be opened",
          [] { GivenStatusConf("[1]"), Fail({.call = "open", .about = kStatusConf, .error = EACCES}); }, false},
         {"not to be looked at", [] { Fail({.call = "lstat", .about = kStatusConf, .error = EACCES}); }, false},
+        {"not to be read to its end",
+         [] { GivenStatusConf("[1]"), Fail({.call = "pread", .about = kStatusConf}); }, false},
         {"below a file", [] { Fail({.call = "lstat", .about = kStatusConf, .error = ENOTDIR}); }, true},
     };
     WriteFile(std::string(kConfigDir) + "/elsewhere", R"({"a":1})");
@@ -283,6 +288,8 @@ TEST_F(ConfigSave, ThatFailsLeavesTheOldBytes) {
         {"cut behind the old length", {.call = "write", .about = kStatusConf, .result = 5000}, longer},
         {"cut while shrinking", {.call = "write", .about = kStatusConf, .result = 1}, "{}"},
         {"the end not set", {.call = "ftruncate", .about = kStatusConf, .error = EIO}, "{}"},
+        {"the old bytes not to be read", {.call = "pread", .about = kStatusConf}, longer},
+        {"lost at the last moment", {.call = "close", .about = kStatusConf}, longer},
     };
     for (const auto &row : rows) {
         SCOPED_TRACE(row.name);
@@ -302,16 +309,56 @@ TEST_F(ConfigSave, ThatFailsLeavesTheOldBytes) {
     }
 }
 
-TEST_F(ConfigSave, ThatFailsForANewFileLeavesNone) {
-    for (const Fault &fault : {Fault{.call = "open", .about = kConfigDir, .times = kAlways, .error = EACCES},
-                               Fault{.call = "write", .about = kConfigDir, .error = ENOSPC},
-                               Fault{.call = "write", .about = kConfigDir, .result = 1}}) {
-        Fail(fault);
-        EXPECT_FALSE(Document(R"({"a":1})").Save());
-        EXPECT_EQ(kStatusConfUnwritable, Left());
-        EXPECT_THAT(Listing(kConfigDir), IsEmpty());
+TEST_F(ConfigSave, OfANewFileTakesEveryWayAndLeavesNoneWhenItFails) {
+    const Fault nameless = {.call = "open", .about = kConfigDir, .nth = 2, .error = EOPNOTSUPP};
+    const Fault nameOnce = {.call = "linkat"};
+    const Fault nameNever = {.call = "linkat", .times = 2, .error = ENOENT};
+    const struct {
+        const char *name;
+        std::vector<Fault> faults;
+        bool saved;
+    } rows[] = {
+        {"not to be opened", {{.call = "open", .about = kConfigDir, .times = 2, .error = EACCES}}, false},
+        {"not to be made", {{.call = "open", .about = kConfigDir, .nth = 2, .error = EACCES}}, false},
+        {"nothing written", {{.call = "write", .about = kConfigDir, .error = ENOSPC}}, false},
+        {"written short", {{.call = "write", .about = kConfigDir, .result = 1}}, false},
+        {"for its owner alone", {{.call = "fchmod"}}, false},
+        {"lost at the last moment", {{.call = "close", .about = kConfigDir}}, false},
+        {"named in the second way", {nameOnce}, true},
+        {"made by another meanwhile", {{.call = "linkat", .times = 2, .error = EEXIST}}, false},
+        {"named from the start", {nameless}, true},
+        {"named from the start in the end", {nameNever}, true},
+        {"not to be named", {nameNever, {.call = "open", .about = kStatusConf, .nth = 2, .error = EEXIST}}, false},
+        {"named, nothing written", {nameless, {.call = "write", .about = kConfigDir, .error = ENOSPC}}, false},
+        {"named, lost at the last moment", {nameless, {.call = "close", .about = kStatusConf}}, false},
+    };
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        fs::remove(kStatusConf);
+        const auto descriptors = OpenDescriptors();
+        std::for_each(row.faults.begin(), row.faults.end(), Fail);
+        EXPECT_EQ(row.saved, Document(R"({"a":1})").Save());
+        EXPECT_EQ(row.saved ? "" : kStatusConfUnwritable, Left());
+        EXPECT_EQ(row.saved ? R"({"a":1})" : "(missing)", StatusConf());
+        EXPECT_EQ(row.saved ? 1U : 0U, Listing(kConfigDir).size());
+        EXPECT_EQ(descriptors, OpenDescriptors());
         EXPECT_THAT(Script::Current().Finish(), IsEmpty());
     }
+}
+
+TEST_F(ConfigSave, ReservesTheSpaceOfALongerDocumentAsFarAsItCan) {
+    for (const int error : {EINTR, EOPNOTSUPP, ENOSYS}) {
+        GivenStatusConf("{}");
+        Fail({.call = "fallocate", .about = kStatusConf, .error = error});
+        EXPECT_TRUE(Document(R"({"longer":"than before"})").Save());
+        EXPECT_THAT(Script::Current().Finish(), IsEmpty());
+    }
+}
+
+TEST_F(ConfigSave, WritesEveryKindOfValue) {
+    const std::string text = R"({"a":[null,true,-1,18446744073709551615,0.5,1e+300,"\u0001\"\\\n"],"o":{}})";
+    EXPECT_TRUE(Document(text).Save());
+    EXPECT_EQ(Canonical(text), StatusConf());
 }
 
 TEST_F(ConfigSave, TouchesNothingThatWasPlantedAtItsPath) {
@@ -374,13 +421,36 @@ TEST_F(ConfigSave, SucceedsWhenOnlyTheModeCannotBeSet) {
     EXPECT_EQ(R"({"a":1})", StatusConf());
 }
 
-TEST_F(ConfigSave, IsHeldUpForGoodByNobodyWhoLocksTheFileItself) {
-    GivenStatusConf("{}");
-    const LockAgent stranger(kStatusConf);
-    EXPECT_TRUE(Document(R"({"a":1})").Save());
-    Document document;
-    EXPECT_TRUE(document.Load());
-    EXPECT_EQ(R"({"a":1})", document.Text());
+TEST_F(ConfigLoad, GetsTheWholeFileWhateverComesInBetween) {
+    const auto replace = [] { GivenStatusConf(R"({"whole":true,"longer":"than before"})"); };
+    const struct {
+        const char *name;
+        Fault fault;
+        bool held;
+        const char *document;
+    } rows[] = {
+        {"interrupted", {.call = "pread", .error = EINTR}, false, R"({"a":1})"},
+        {"growing", {.call = "pread", .action = replace}, false, R"({"longer":"than before","whole":true})"},
+        {"held by a stranger", {.call = "none"}, true, R"({"a":1})"},
+        {"held, and growing behind the reader",
+         {.call = "pread", .nth = 3, .action = replace},
+         true,
+         R"({"longer":"than before","whole":true})"},
+    };
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        GivenStatusConf("{}");
+        std::optional<LockAgent> stranger;
+        if (row.held) {
+            stranger.emplace(kStatusConf);
+        }
+        EXPECT_TRUE(Document(R"({"a":1})").Save());
+        Fail(row.fault);
+        Document document;
+        EXPECT_TRUE(document.Load());
+        EXPECT_EQ(row.document, document.Text());
+        Script::Current().Finish();
+    }
 }
 
 }  // namespace

@@ -124,34 +124,5 @@ TEST_F(Coverage, TakesNoLock) {
     EXPECT_EQ(0, Script::Current().Calls("flock", kFolderLock));
 }
 
-TEST_F(Coverage, GetReadsOneFolderUnderTheLock) {
-    Json::Value result = "before";
-    EXPECT_TRUE(IndexMgr::Get(result, "/photo/2019"));
-    EXPECT_EQ("{" + FolderRecord("/photo/2019", "Year", "p") + "}", R"({"/photo/2019":)" + Print(result) + "}");
-    EXPECT_THAT(Journal(), ElementsAre("lock folder exclusive", "unlock folder"));
-}
-
-TEST_F(Coverage, GetThatFailsLetsGoOfTheLock) {
-    const struct {
-        const char *name, *path;
-        Fault fault;
-        std::string left;
-    } rows[] = {
-        {"unknown folder", "/photo/2019/", {.call = "none"}, "4 folders.cpp No such folder: /photo/2019/"},
-        {"busy", "/photo/2019", {.call = "flock", .about = kFolderLock, .times = 3, .error = EAGAIN}, kBusy},
-        {"unreadable", "/photo/2019", {.call = "open", .about = kFolderConf}, kFolderConfUnreadable},
-    };
-    for (const auto &row : rows) {
-        SCOPED_TRACE(row.name);
-        Fail(row.fault);
-        Json::Value result = "before";
-        EXPECT_FALSE(IndexMgr::Get(result, row.path));
-        EXPECT_EQ("before", result);
-        EXPECT_EQ(row.left, Left());
-        EXPECT_FALSE(IsLocked(kFolderLock));
-        Script::Current().Finish();
-    }
-}
-
 }  // namespace
 }  // namespace fileindex_test

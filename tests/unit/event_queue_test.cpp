@@ -46,6 +46,14 @@ TEST_F(EventQueue, GetsOneLineForEachEvent) {
     EXPECT_EQ("", Left());
 }
 
+TEST_F(EventQueue, StaysALineWhateverTheCallersTextHeld) {
+    Json::Value data = Parse(R"({"audio":true})");
+    data["audio"].setComment(std::string("// a line\n"), Json::commentBefore);
+    data.setComment(std::string("/* and\n another */"), Json::commentBefore);
+    EXPECT_TRUE(AddCustomEvent(kSetting, kPath, data));
+    EXPECT_EQ(kSettingLine + "\n", ReadFile(kQueue));
+}
+
 TEST_F(EventQueue, DropsWhatAQueuedReindexOfThePathCovers) {
     const std::string junk =
         "not json\n\n[65536]\n{\"event\":65536}\n{\"path\":\"/vol1/photo/a\"}\n"
@@ -90,6 +98,11 @@ TEST_F(EventQueue, DropsWhatAQueuedReindexOfThePathCovers) {
          R"({"data":{"path":"/vol1/photo/a"},"event":65536,"path":"/b"})"
          "\n",
          "", "/vol1/photo/a", false},
+        {"data of every kind", R"({"data":[1,{"a":[true,null]},"x"],"event":65536,"path":"/vol1/photo/a"})", "",
+         "/vol1/photo/a", true},
+        {"data with reals", R"({"data":[1,{"a":[0.5]}],"event":65536,"path":"/vol1/photo/a"})", "",
+         "/vol1/photo/a", true},
+        {"a line that breaks off", R"({"event":65536,"path":"/vol1/photo/a")", "", "/vol1/photo/a", false},
         {"in a line beyond 1 MiB", endless + "\n", "", "/vol1/photo/a", false},
         {"behind a line beyond 1 MiB", endless + "\n" + kReindexLine + "\n", "", "/vol1/photo/a", true},
     };
@@ -220,9 +233,11 @@ TEST_F(EventQueue, ThatCannotBeUsedMarksTheShareForReindexing) {
 }
 
 TEST_F(EventQueue, OfAPathOutsideEveryShareMarksTheEmptyName) {
-    EXPECT_FALSE(AddSetting("/vol9/x"));
-    EXPECT_EQ(R"({"need_reindex":{"":true}})", StatusConf());
-    EXPECT_EQ("0 utils.cpp:472 VORKShareNamePathGet failed, path=/vol9/x", Left());
+    for (const std::string &path : {std::string("/vol9/x"), std::string(kPath) + std::string("\0x", 2)}) {
+        EXPECT_FALSE(AddSetting(path));
+        EXPECT_EQ(R"({"need_reindex":{"":true}})", StatusConf());
+        EXPECT_EQ(std::string("0 utils.cpp:472 VORKShareNamePathGet failed, path=") + path.c_str(), Left());
+    }
 }
 
 TEST_F(EventQueue, SaysWhenNotEvenTheMarkCanBeSet) {

@@ -154,6 +154,23 @@ TEST_F(FoldersStore, KeepsNamesByteForByteAndEscapedOnes) {
     }
 }
 
+/// As a subclass may: without the folders.
+class SavesItsDocument : public Folders {
+public:
+    bool SaveAsRead() { return Load() && SaveJson(); }
+};
+
+TEST_F(FoldersStore, SavesWhatItHasReadForASubclass) {
+    const std::string conf = R"({"/photo/a":{"later":[1],"photo":true}})";
+    GivenFolderConf(conf + "  ");
+    EXPECT_TRUE(SavesItsDocument().SaveAsRead());
+    EXPECT_EQ(conf, FolderConf());
+    const std::string ordinary = "{" + FolderRecord("/photo/a", "", "p") + "}";
+    GivenFolderConf(ordinary + "  ");
+    EXPECT_TRUE(SavesItsDocument().SaveAsRead());
+    EXPECT_EQ(ordinary + "\n", ReadFile(kFolderConf));
+}
+
 TEST_F(FoldersStore, RefusesADocumentThatIsNoObject) {
     for (const char *text : {"[]", R"("text")", "5", "null", "true"}) {
         GivenFolderConf(text);

@@ -134,6 +134,12 @@ TEST_F(Paths, WhatCannotBeResolvedLeavesItsReasonAndTheOutput) {
     Fail({.call = "VORKShareGet", .result = 0});  // claims success and brings no record
     EXPECT_FALSE(GetFullPath(out, "/photo/x"));
     EXPECT_EQ("2", Left());
+    Platform::Current().shares["nowhere"].path = "";
+    for (const std::string &unreal : {std::string("/nowhere/x"), std::string("/photo\0/x", 9)}) {
+        EXPECT_FALSE(GetFullPath(out, unreal));
+        EXPECT_EQ("2", Left());
+    }
+    Platform::Current().shares.erase("nowhere");
     EXPECT_FALSE(GetFullPath(out, ""));
     EXPECT_EQ("0 utils.cpp:389 GetShareNameByPath failed, path=", Left());
     EXPECT_FALSE(GetShareNamePathByFullPath(out, path, "/vol9/x"));

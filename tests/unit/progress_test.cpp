@@ -86,34 +86,10 @@ TEST_F(Progress, LeavesOutFoldersThatMayNotBeIndexed) {
     EXPECT_EQ("paused", StatusMgr::GetFolderStatus("/photo/a"));
 }
 
-TEST_F(Progress, ThatCannotBeToldIsReported) {
-    const struct {
-        const char *name;
-        std::function<void()> arrange;
-        std::string left;
-    } rows[] = {
-        {"unreadable list", [] { GivenFolderConf("{"); }, kFolderConfUnreadable},
-        {"a folder without a share", [] { GivenFolders({FolderRecord("", "", "")}); },
-         "status_mgr.cpp:135 Failed to get share name from path: "},
-        {"share gone in between",
-         [] {
-             GivenFolders({FolderRecord("/photo/a", "", "")});
-             Fail({.call = "VLIBShareIsReadOnlyGet",
-                   .action = [] { Script::Current().Fail({.call = "VORKShareGet", .about = "photo"}); }});
-         },
-         "status_mgr.cpp:146 FILEIDXQueuePathGet failed, share=photo"},
-    };
-    for (const auto &row : rows) {
-        SCOPED_TRACE(row.name);
-        Forget();
-        row.arrange();
-        EXPECT_EQ("failed, unset", Overall());
-        EXPECT_THAT(Left(), testing::EndsWith(row.left));
-    }
-    Fail({.call = "VLIBShareIsReadOnlyGet",
-          .action = [] { Script::Current().Fail({.call = "VORKShareGet", .about = "photo"}); }});
-    EXPECT_EQ("finished", StatusMgr::GetFolderStatus("/photo/a"));
-    EXPECT_THAT(Left(), testing::EndsWith("status_mgr.cpp:100 FILEIDXQueuePathGet failed, share=photo"));
+TEST_F(Progress, OfAFolderWithoutAShareCannotBeTold) {
+    GivenFolders({FolderRecord("", "", "")});
+    EXPECT_EQ("failed, unset", Overall());
+    EXPECT_THAT(Left(), testing::EndsWith("status_mgr.cpp:135 Failed to get share name from path: "));
 }
 
 TEST_F(Progress, OfAFolderIsSeenInTheEventsAtOrBelowIt) {
@@ -166,14 +142,6 @@ TEST_F(Progress, OfAShareWithoutSpaceIsAnErrorWhateverIsQueued) {
     EXPECT_EQ("err_no_space", StatusMgr::GetFolderStatus("/photo/a"));
     EXPECT_EQ("finished", StatusMgr::GetFolderStatus("/music"));
     EXPECT_EQ("paused", StatusMgr::GetFolderStatus("/none/x")) << "what may not be indexed comes first";
-}
-
-TEST_F(Progress, OfAQueueThatCannotBeReadIsFinished) {
-    GivenQueue("photo", EventLine("/vol1/photo/a"));
-    Fail({.call = "open", .about = kQueue, .error = 13});
-    EXPECT_EQ("finished", StatusMgr::GetFolderStatus("/photo/a"));
-    EXPECT_EQ(std::string("0 status_mgr.cpp:37 Failed to open queue=") + kQueue + ", reason=Permission denied",
-              Left());
 }
 
 TEST_F(Progress, IsAnAdditionalFactOfAFolder) {

@@ -172,49 +172,6 @@ TEST_F(StatusManager, RefusesANegativePauseBeforeAnything) {
     EXPECT_THAT(Journal(), IsEmpty());
 }
 
-TEST_F(StatusManager, KeepsWhatItSavedWhenTheDaemonIsAway) {
-    GivenStatusConf(R"({"no_space":{"a":true},"resume_time":0})");
-    EXPECT_FALSE(StatusMgr::Pause(1));
-    EXPECT_FALSE(StatusMgr::Resume());
-    EXPECT_FALSE(StatusMgr::ShareRevive("a"));
-    EXPECT_EQ(R"({"no_space":{},"resume_time":-1})", StatusConf());
-    EXPECT_EQ(
-        "0 status_mgr.cpp:198 SendCammandToDaemon failed | status_mgr.cpp:221 SendCammandToDaemon failed | "
-        "status_mgr.cpp:321 SendCammandToDaemon failed",
-        Left());
-    EXPECT_FALSE(IsLocked(kStatusLock));
-}
-
-TEST_F(StatusManager, ChangesNothingWhenLockLoadOrSaveFails) {
-    const std::string conf = R"({"resume_time": 3})";
-    const std::function<bool()> changes[] = {
-        [] { return StatusMgr::Pause(1); },
-        [] { return StatusMgr::Resume(); },
-        [] { return StatusMgr::ShareRevive("a"); },
-        [] { return StatusMgr::ShareSetNoSpace("a", true); },
-        [] { return StatusMgr::ShareSetNeedReindex("a", true); },
-        [] { return StatusMgr::SetUpdated("x"); },
-    };
-    const std::pair<Fault, std::string> rows[] = {
-        {{.call = "flock", .about = kStatusLock, .times = 3, .error = EAGAIN}, kBusy},
-        {{.call = "open", .about = kStatusConf, .error = EACCES}, kStatusConfUnreadable},
-        {{.call = "write", .about = kStatusConf, .error = ENOSPC}, kStatusConfUnwritable},
-    };
-    daemon_.Start();
-    GivenStatusConf(conf);
-    for (const auto &[fault, left] : rows) {
-        for (const auto &change : changes) {
-            Fail(fault);
-            EXPECT_FALSE(change());
-            EXPECT_EQ(left, Left());
-            EXPECT_EQ(conf, ReadFile(kStatusConf));
-            EXPECT_FALSE(IsLocked(kStatusLock));
-            Script::Current().Finish();
-        }
-    }
-    EXPECT_THAT(daemon_.Commands(), IsEmpty());
-}
-
 TEST_F(StatusManager, ReadsWhileAnotherHoldsTheLockAndFailsOnAnUnreadableFile) {
     GivenStatusConf(R"({"resume_time":3,"no_space":{"a":true},"need_reindex":{"a":true},"x":true})");
     const LockAgent writer(kStatusLock);

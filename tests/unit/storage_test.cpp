@@ -1,4 +1,4 @@
-// Where a share's queue and database are, and the registration of its folders with the notification daemon.
+// Where a share's queue and database are.
 #include "fixture.h"
 
 #include <sys/stat.h>
@@ -84,26 +84,6 @@ TEST_P(StorageLocation, RefusesBadArgumentsInOrder) {
     EXPECT_FALSE(fs::exists("/vol1/photo/@eaDir"));
 }
 
-TEST_P(StorageLocation, OfAnUnknownShareFailsAsThePlatformSays) {
-    EXPECT_EQ(-1, Get("none"));
-    EXPECT_EQ("0 utils.cpp:" + std::to_string(GetParam().shareLine) + " VORKShareGet failed, name=none, code=5120",
-              Left());
-    EXPECT_EQ("platform.c", Platform::Current().errorFile) << "the platform's own error stands";
-    Fail({.call = "VORKShareGet", .result = 0});
-    EXPECT_EQ(-1, Get("photo"));
-    EXPECT_EQ('#', buffer_[0]);
-}
-
-TEST_P(StorageLocation, IsToldEvenWhenTheMetadataDirectoryCannotBeMade) {
-    fs::create_directory("/vol1/photo/@eaDir");
-    Fail({.call = "VORKEAMKDir", .error = 0x0800});
-    EXPECT_EQ(GetParam().path.size(), Get("photo"));
-    EXPECT_EQ(GetParam().path, buffer_.data());
-    EXPECT_EQ("0 utils.cpp:" + std::to_string(GetParam().metadataLine) +
-                  " VORKEAMKDir failed, path=/vol1/photo/@eaDir, code=2048",
-              Left());
-}
-
 INSTANTIATE_TEST_SUITE_P(
     Of, StorageLocation,
     testing::Values(Location{"Queue", FILEIDXQueuePathGet, kQueue, "szOutQueuePath", 769, 772, 779},
@@ -123,73 +103,6 @@ TEST_F(DatabaseLocation, IsMadeWithTheUmaskAndToldEvenWhenItCannotBe) {
     EXPECT_EQ(std::string(kDatabase).size(), FILEIDXDBPathGet("photo", buffer.data(), 4096));
     ::umask(before);
     EXPECT_EQ(fs::perms(0750), fs::status(kDatabase).permissions());
-}
-
-class Monitor : public FileIndexTest {
-protected:
-    void SetUp() override {
-        FileIndexTest::SetUp();
-        GivenShare("photo");
-        GivenShare("photos");
-        GivenShare("empty");
-        GivenFolders({FolderRecord("/photo/b", "", "p"), FolderRecord("/photo", "", "d"),
-                      FolderRecord("/photos/x", "", "d")});
-    }
-};
-
-TEST_F(Monitor, IsRegisteredWithAllFoldersOfTheShare) {
-    EXPECT_TRUE(IndexMgr::UpsertVorkNotifydCfg("photo"));
-    EXPECT_TRUE(IndexMgr::UpsertVorkNotifydCfg("empty"));
-    EXPECT_THAT(
-        Journal(),
-        ElementsAre(R"(monitor fileindex 1 {"config":[)"
-                    R"({"ignore":["@eaDir"],"mask":65486,"path":"/vol1/photo"},)"
-                    R"({"ignore":["@eaDir"],"mask":65486,"path":"/vol1/photo/b"}],)"
-                    R"("queue":"/vol1/photo/@eaDir/VORK@file_index_queue"})",
-                    R"(monitor fileindex 1 {"config":[],"queue":"/vol1/empty/@eaDir/VORK@file_index_queue"})"));
-    EXPECT_EQ(0, Script::Current().Calls("flock", kFolderLock));
-    EXPECT_EQ("", Left());
-}
-
-TEST_F(Monitor, IsWithdrawnByItsQueue) {
-    GivenFolderConf("{");  // not even read
-    EXPECT_TRUE(IndexMgr::DeleteVorkNotifydCfg("photo"));
-    EXPECT_THAT(Journal(), ElementsAre(std::string("unmonitor fileindex 1 ") + kQueue));
-    EXPECT_EQ("", Left());
-}
-
-TEST_F(Monitor, ThatCannotBeChangedIsReported) {
-    const std::string none = "0 utils.cpp:772 VORKShareGet failed, name=none, code=5120 | ";
-    const auto upsert = IndexMgr::UpsertVorkNotifydCfg;
-    const auto withdraw = IndexMgr::DeleteVorkNotifydCfg;
-    const struct {
-        bool (*change)(const std::string &);
-        const char *share;
-        Fault fault;
-        std::string left;
-    } rows[] = {
-        {upsert, "none", {.call = "none"}, none + "index_mgr.cpp:286 FILEIDXQueuePathGet failed, share=none"},
-        {upsert,
-         "photo",
-         {.call = "VORKShareGet", .nth = 2, .times = kAlways},
-         "2 index_mgr.cpp:297 GetFullPath failed, path=/photo"},
-        {upsert, "photo", {.call = "MonitorQueue::Upsert"}, "0 index_mgr.cpp:324 MonitorQueue::Add failed"},
-        {upsert, "photo", {.call = "MonitorQueue::Upsert", .result = -2}, ""},  // throws
-        {upsert, "photo", {.call = "open", .about = kFolderConf}, kFolderConfUnreadable},
-        {withdraw, "none", {.call = "none"}, none + "index_mgr.cpp:344 FILEIDXQueuePathGet failed, share=none"},
-        {withdraw, "photo", {.call = "MonitorQueue::Delete"}, "0 index_mgr.cpp:350 MonitorQueue::Delete failed"},
-    };
-    for (const auto &row : rows) {
-        Forget();
-        Fail(row.fault);
-        EXPECT_FALSE(row.change(row.share));
-        EXPECT_EQ(row.left, Left());
-        EXPECT_THAT(Journal(), IsEmpty());
-        if (row.share == std::string("none")) {
-            EXPECT_EQ(0, Script::Current().Calls("open", kFolderConf)) << "fails before the list is read";
-        }
-        Script::Current().Finish();
-    }
 }
 
 }  // namespace
