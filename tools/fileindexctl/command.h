@@ -22,6 +22,7 @@ struct Parameter {
     std::string_view value;  ///< what an option takes, for the help; empty for flags and positional arguments
     std::string_view help;
     std::span<const std::string_view> choices{};  ///< the only values allowed; none given: any
+    std::string_view letter{};                    ///< a short form of the name: "-o"
 
     constexpr bool IsOption() const { return name.starts_with("--"); }
     constexpr bool IsRequired() const { return !IsOption() && (takes == Takes::One || takes == Takes::Many); }

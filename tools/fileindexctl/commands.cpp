@@ -54,6 +54,15 @@ constexpr Parameter kOneShare = {"SHARE", Takes::Optional, "", "only this share"
 constexpr Parameter kMonitor[] = {kOneShare};
 constexpr Parameter kQueueShow[] = {kOneShare, {"--limit", Takes::Number, "N", "show at most N events"}};
 constexpr Parameter kQueueCount[] = {kOneShare};
+constexpr Parameter kExport[] = {
+    {"--output", Takes::One, "FILE", "write this file, whole or not at all", {}, "-o"},
+};
+constexpr Parameter kImport[] = {
+    {"FILE", Takes::One, "", "what \"export\" wrote; - is the standard input"},
+    {"--dry-run", Takes::Nothing, "", "only say what would be done"},
+    {"--replace", Takes::Nothing, "", "also remove the folders that are not in the file"},
+    kYes,
+};
 constexpr Parameter kMigrate[] = {{"--dry-run", Takes::Nothing, "", "only say what would be done"}};
 
 constexpr struct {
@@ -88,6 +97,8 @@ constexpr Command kCommands[] = {
     {"monitor", "refresh", "Have watched what should be", kMonitor, RefreshMonitors},
     {"queue", "show", "Show the events that wait, the oldest first", kQueueShow, ShowQueue},
     {"queue", "count", "Count the events that wait", kQueueCount, CountQueue},
+    {"", "export", "Write folders and status as one JSON document", kExport, ExportConfiguration},
+    {"", "import", "Bring folders and status into the state that a document holds", kImport, ImportConfiguration},
     {"", "migrate", "Bring everything into line with the folders after an upgrade", kMigrate, Migrate},
 };
 

@@ -1,4 +1,5 @@
 #include "failure.h"
+#include "folder_operations.h"
 #include "folder_text.h"
 #include "handlers.h"
 #include "paths.h"
@@ -53,13 +54,7 @@ ExitStatus Upsert(const Json::Value &record, Output &output) {
     const std::string path = record["path"].asString();
     Json::Value request(Json::arrayValue);
     request.append(record);
-    const bool searchWasOn = VORKSMBIsEnableSpotlight() != 0;
-    StepReport report =
-        StepReport::Perform(UpsertPlan(), VORK::FILEINDEX::Folders(), [&] { return IndexMgr::Upsert(request); });
-    if (searchWasOn) {
-        report.Correct("search setting", StepResult::Already);
-    }
-    MarkDroppedEvents(report);
+    const StepReport report = PerformUpsert(request);
     report.Show(output);
     StateFolder(path, output);
     if (report.Status() != ExitStatus::Done) {
@@ -84,6 +79,17 @@ void WarnOfNesting(const std::string &path, const Folders &folders, Output &outp
 }
 
 }  // namespace
+
+StepReport PerformUpsert(const Json::Value &records) {
+    const bool searchWasOn = VORKSMBIsEnableSpotlight() != 0;
+    StepReport report =
+        StepReport::Perform(UpsertPlan(), VORK::FILEINDEX::Folders(), [&] { return IndexMgr::Upsert(records); });
+    if (searchWasOn) {
+        report.Correct("search setting", StepResult::Already);
+    }
+    MarkDroppedEvents(report);
+    return report;
+}
 
 ExitStatus AddFolder(const Arguments &arguments, Output &output) {
     const Folders folders = ReadFolders();

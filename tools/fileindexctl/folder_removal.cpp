@@ -1,5 +1,6 @@
 #include "confirm.h"
 #include "failure.h"
+#include "folder_operations.h"
 #include "handlers.h"
 #include "paths.h"
 #include "steps.h"
@@ -22,11 +23,6 @@ using VORK::FILEINDEX::IndexMgr;
 constexpr std::string_view kIndexMgr = "index_mgr.cpp";
 
 using Paths = std::vector<std::string>;
-
-struct Removal {
-    Paths present;  // on shares that are there
-    Paths away;     // on shares that are not: their queues and monitors cannot be reached
-};
 
 bool Contains(const Paths &paths, const std::string &path) {
     return std::find(paths.begin(), paths.end(), path) != paths.end();
@@ -54,12 +50,11 @@ Removal Requested(const Arguments &arguments, const Folders &folders, Output &ou
     Removal removal;
     for (const auto &given : arguments.All("PATH")) {
         const std::string path = RequireFolder(given, folders).path;
-        Paths &paths = IsSharePresent(ShareOf(path)) ? removal.present : removal.away;
-        if (Contains(paths, path)) {
+        if (removal.Contains(path)) {
             output.Warn("\"" + path + "\" is given twice");
             continue;
         }
-        paths.push_back(path);
+        removal.Add(path);
     }
     if (!removal.away.empty() && !arguments.Has("--force")) {
         throw Failure(ExitStatus::Usage, "the share of \"" + removal.away.front() +
@@ -67,23 +62,6 @@ Removal Requested(const Arguments &arguments, const Folders &folders, Output &ou
                                              "--force removes the folder all the same");
     }
     return removal;
-}
-
-void Ask(const Arguments &arguments, const Removal &removal, const Folders &folders) {
-    Paths all = removal.present;
-    all.insert(all.end(), removal.away.begin(), removal.away.end());
-    std::string consequence = "this removes " + Enumerate(all) + " from the index";
-    const std::set<std::string> left = SharesOf(Without(folders, all));
-    Paths emptied;
-    for (const auto &share : SharesOf(removal.present)) {
-        if (left.count(share) == 0) {
-            emptied.push_back(share);
-        }
-    }
-    if (!emptied.empty()) {
-        consequence += " and deletes the index data of the share " + Enumerate(emptied);
-    }
-    RequireConsent(arguments, consequence);
 }
 
 // The last folder of all stops the service; then nobody is told anything.
@@ -146,24 +124,58 @@ void StateRest(const Paths &removed, Output &output) {
 
 }  // namespace
 
+bool Removal::Contains(const std::string &path) const {
+    return fileindexctl::Contains(All(), path);
+}
+
+void Removal::Add(const std::string &path) {
+    (IsSharePresent(ShareOf(path)) ? present : away).push_back(path);
+}
+
+Paths Removal::All() const {
+    Paths all = present;
+    all.insert(all.end(), away.begin(), away.end());
+    return all;
+}
+
+std::string ConsequenceOf(const Removal &removal, const Folders &folders) {
+    const Paths all = removal.All();
+    std::string consequence = "this removes " + Enumerate(all) + " from the index";
+    const std::set<std::string> left = SharesOf(Without(folders, all));
+    Paths emptied;
+    for (const auto &share : SharesOf(removal.present)) {
+        if (left.count(share) == 0) {
+            emptied.push_back(share);
+        }
+    }
+    if (!emptied.empty()) {
+        consequence += " and deletes the index data of the share " + Enumerate(emptied);
+    }
+    return consequence;
+}
+
+// Two requests: the library stops at the first folder whose share is away, and must not leave the others undone.
+StepReport PerformRemoval(const std::string &saved, const Removal &removal, Paths &removed) {
+    StepReport report;
+    removed = removal.present;
+    if (!removal.present.empty()) {
+        report = Remove(saved, removal.present, ReadFolders());
+    }
+    if (!removal.away.empty() && report.Status() == ExitStatus::Done) {
+        StepReport away = Remove(saved + " (share away)", removal.away, ReadFolders());
+        away.Excuse("the share is away");
+        report.Append(away);
+        removed = removal.All();
+    }
+    return report;
+}
+
 ExitStatus RemoveFolders(const Arguments &arguments, Output &output) {
     const Folders folders = ReadFolders();
     const Removal removal = Requested(arguments, folders, output);
-    Ask(arguments, removal, folders);
-
-    // Two requests: the library stops at the first folder whose share is away, and must not leave the others
-    // undone.
-    StepReport report;
-    Paths removed = removal.present;
-    if (!removal.present.empty()) {
-        report = Remove("saved", removal.present, folders);
-    }
-    if (!removal.away.empty() && report.Status() == ExitStatus::Done) {
-        StepReport away = Remove("saved (share away)", removal.away, ReadFolders());
-        away.Excuse("the share is away");
-        report.Append(away);
-        removed.insert(removed.end(), removal.away.begin(), removal.away.end());
-    }
+    RequireConsent(arguments, ConsequenceOf(removal, folders));
+    Paths removed;
+    const StepReport report = PerformRemoval("saved", removal, removed);
     report.Show(output);
     StateRest(removed, output);
     if (report.Status() != ExitStatus::Done) {

@@ -55,6 +55,12 @@ ExitStatus RefreshMonitors(const Arguments &arguments, Output &output);
 ExitStatus ShowQueue(const Arguments &arguments, Output &output);
 ExitStatus CountQueue(const Arguments &arguments, Output &output);
 
+// export.cpp
+ExitStatus ExportConfiguration(const Arguments &arguments, Output &output);
+
+// import.cpp
+ExitStatus ImportConfiguration(const Arguments &arguments, Output &output);
+
 // migrate.cpp
 ExitStatus Migrate(const Arguments &arguments, Output &output);
 

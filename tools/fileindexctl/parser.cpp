@@ -89,7 +89,8 @@ private:
     }
 
     static void AddParameter(CLI::App &app, const Parameter &parameter) {
-        const std::string name(parameter.name);
+        const std::string letter(parameter.letter);
+        const std::string name = (letter.empty() ? letter : letter + ",") + std::string(parameter.name);
         const std::string help(parameter.help);
         if (parameter.takes == Takes::Nothing) {
             app.add_flag_callback(

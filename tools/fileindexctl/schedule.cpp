@@ -29,8 +29,8 @@ constexpr long long kSecondsPerHour = 3600;
 // The library and the daemon reckon pauses in 32 bits: a later end would wrap and end the pause at once.
 constexpr long long kLatest = std::numeric_limits<int>::max();
 
-std::vector<PlannedStep> Plan(int line) {
-    return {SaveStep(), {"daemon told", "fileindexd cannot be reached", {{"status_mgr.cpp", line}}}};
+std::vector<PlannedStep> Plan(int line, const std::string &saved = "saved") {
+    return {SaveStep(saved), {"daemon told", "fileindexd cannot be reached", {{"status_mgr.cpp", line}}}};
 }
 
 std::string LocalTime(long long seconds) {
@@ -92,14 +92,15 @@ long long ParseUntil(const std::string &text) {
 }
 
 // StatusMgr::Pause counts in whole hours from now; for a time of day its steps are taken one by one.
-StepReport PauseUntil(long long resumeTime) {
+StepReport PauseUntil(long long resumeTime, const std::string &saved = "saved") {
+    ForgetErrors();
     Status status;
     const ConfigLock lock(status);
     if (!lock.IsHeld() || !status.Load() || !status.Pause(resumeTime) || !status.Save()) {
         throw FailureOf(status);
     }
     StepReport report;
-    report.Add("saved", StepResult::Done);
+    report.Add(saved, StepResult::Done);
     Json::Value data(Json::objectValue);
     data["resume_time"] = static_cast<Json::Int64>(resumeTime);
     const bool told = VORK::FILEINDEX::SendCammandToDaemon("pause", data);
@@ -123,6 +124,16 @@ ExitStatus Report(const StepReport &report, Output &output) {
 }
 
 }  // namespace
+
+StepReport SetPause(long long resumeTime, const std::string &saved) {
+    if (resumeTime == kNotPaused) {
+        return StepReport::Perform(Plan(221, saved), Status(), [] { return StatusMgr::Resume(); });
+    }
+    if (resumeTime == kWithoutEnd) {
+        return StepReport::Perform(Plan(198, saved), Status(), [] { return StatusMgr::Pause(0); });
+    }
+    return PauseUntil(resumeTime, saved);
+}
 
 std::string PauseText(long long resumeTime) {
     if (resumeTime == kWithoutEnd) {
@@ -164,7 +175,6 @@ ExitStatus PauseIndexing(const Arguments &arguments, Output &output) {
     }
     if (arguments.Has("--until")) {
         const long long resumeTime = ParseUntil(arguments.One("--until"));
-        ForgetErrors();
         return Report(PauseUntil(resumeTime), output);
     }
     const int hours = arguments.Has("HOURS") ? ParseHours(arguments.One("HOURS")) : 0;

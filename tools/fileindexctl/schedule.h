@@ -3,10 +3,16 @@
 #ifndef FILEINDEXCTL_SCHEDULE_H
 #define FILEINDEXCTL_SCHEDULE_H
 
+#include "steps.h"
+
 #include <optional>
 #include <string>
 
 namespace fileindexctl {
+
+/// Pauses until that time, 0 for without an end, or resumes for -1; the first step is called `saved`. Throws
+/// Failure when nothing was done.
+StepReport SetPause(long long resumeTime, const std::string &saved);
 
 /// "indexing is paused until 2025-03-01 07:00 CET", for a time as StatusMgr::GetPauseInfo gives it.
 std::string PauseText(long long resumeTime);
