@@ -1,7 +1,7 @@
 /// \file
 /// The last error code and the log level, both process-wide.
 ///
-/// Neither is per thread and neither is guarded: concurrent failures overwrite each other, and the last wins.
+/// Neither is per thread: concurrent failures overwrite each other, and the last wins.
 /// Most failures also write a record to the system log (`syslog`, LOG_ERR, "file:line message"), and each layer
 /// that fails because of it adds its own; the library never calls `openlog`, so identity and facility are the
 /// host's.

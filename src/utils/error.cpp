@@ -1,5 +1,7 @@
 #include <fileindex/error.h>
 
+#include <atomic>
+
 namespace VORK {
 namespace FILEINDEX {
 
@@ -7,12 +9,13 @@ _tag_fileindex_err_ ErrorHandler::g_error_code = FILEINDEX_ERR_NONE;
 
 int LOG_LEVEL = 3;
 
+// A plain variable, which programs of old read; several threads may fail at once all the same.
 void ErrorHandler::SetError(_tag_fileindex_err_ code) {
-    g_error_code = code;
+    std::atomic_ref(g_error_code).store(code, std::memory_order_relaxed);
 }
 
 _tag_fileindex_err_ ErrorHandler::GetError() {
-    return g_error_code;
+    return std::atomic_ref(g_error_code).load(std::memory_order_relaxed);
 }
 
 }  // namespace FILEINDEX

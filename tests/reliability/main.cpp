@@ -16,6 +16,7 @@ int main(int count, char **arguments) {
         {"kills", [&] { Kills(argument); }},
         {"readers", Readers},
         {"adders", Adders},
+        {"threads", Threads},
         {"queue-writers", QueueWriters},
         {"moods", Moods},
         {"writer-model", WriterModel},

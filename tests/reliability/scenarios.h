@@ -12,8 +12,9 @@ void Faults();
 void Kills(const std::string &fileSystem);
 void Readers();
 
-// Many processes.
+// Many processes, many threads.
 void Adders();
+void Threads();
 void QueueWriters();
 
 // The command socket.

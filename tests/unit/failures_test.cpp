@@ -113,7 +113,7 @@ using Call = std::pair<std::string, std::string>;
 /// Nothing for a call that is none of the platform's and of no file that matters.
 Call KeyOf(const Call &made) {
     const auto &[name, about] = made;
-    if (name.starts_with("V") || name.starts_with("Monitor") || name == "new" || name == "connect") {
+    if (name.starts_with("V") || name.starts_with("Monitor") || name == "connect") {
         return {name, ""};
     }
     for (const char *file : {"folder.conf", "status.conf", "folder.lock", "status.lock", "_queue"}) {

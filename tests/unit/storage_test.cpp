@@ -1,4 +1,4 @@
-// Where a share's queue and database are.
+// Where a share's queue and database are, and what watches it.
 #include "fixture.h"
 
 #include <sys/stat.h>
@@ -6,6 +6,7 @@
 #include <array>
 #include <cerrno>
 #include <filesystem>
+#include <new>
 #include <string>
 #include <vector>
 
@@ -103,6 +104,21 @@ TEST_F(DatabaseLocation, IsMadeWithTheUmaskAndToldEvenWhenItCannotBe) {
     EXPECT_EQ(std::string(kDatabase).size(), FILEIDXDBPathGet("photo", buffer.data(), 4096));
     ::umask(before);
     EXPECT_EQ(fs::perms(0750), fs::status(kDatabase).permissions());
+}
+
+class Monitor : public FileIndexTest {};
+
+TEST_F(Monitor, WithoutMemoryForItIsReported) {
+    delete new (std::nothrow) char;
+    if (Script::Current().Calls("new") == 0) {
+        GTEST_SKIP() << "a memory checker allocates instead";
+    }
+    GivenShare("photo");
+    Fail({.call = "new"});
+    EXPECT_FALSE(IndexMgr::UpsertVorkNotifydCfg("photo"));
+    EXPECT_EQ(R"(0 index_mgr.cpp:317 Failed to create MonitorQueue, jsQueue={"config":[],"queue":")" +
+                  std::string(kQueue) + "\"}",
+              Left());
 }
 
 }  // namespace
