@@ -1,5 +1,9 @@
 #include "daemon.h"
 
+#include "descriptor.h"
+#include "listener.h"
+
+#include <fcntl.h>
 #include <sys/socket.h>
 #include <sys/un.h>
 #include <unistd.h>
@@ -11,28 +15,58 @@ namespace fileindexctl {
 
 namespace {
 
-constexpr const char *kSocket = "/var/run/fileindexd.sock";
+// 0 or an error number. Does not wait.
+int TryToConnect() {
+    const Descriptor descriptor(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
+    sockaddr_un address{};
+    address.sun_family = AF_UNIX;
+    std::strncpy(address.sun_path, kDaemonSocket, sizeof(address.sun_path) - 1);
+    const bool connected = descriptor && connect(descriptor.Get(), reinterpret_cast<const sockaddr *>(&address),
+                                                 sizeof(address)) == 0;
+    return connected ? 0 : errno;
+}
+
+// What connecting would lead to.
+int FindOut() {
+    if (faccessat(AT_FDCWD, kDaemonSocket, W_OK, AT_EACCESS) != 0) {
+        return errno;
+    }
+    switch (FindListener(kDaemonSocket)) {
+        case Listener::Listening:
+            return 0;
+        case Listener::Full:
+            return EAGAIN;
+        case Listener::NotSeen:
+            break;
+    }
+    return TryToConnect();
+}
+
+DaemonCondition ConditionOf(int error) {
+    switch (error) {
+        case ENOENT:
+            return DaemonCondition::Absent;
+        case ECONNREFUSED:
+            return DaemonCondition::Stale;
+        case EACCES:
+        case EPERM:
+            return DaemonCondition::Denied;
+        default:
+            return DaemonCondition::Unknown;
+    }
+}
 
 }  // namespace
 
 DaemonState ProbeDaemon() {
-    const int descriptor = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
-    if (descriptor < 0) {
-        return {false, std::string("cannot be asked: ") + std::strerror(errno)};
-    }
-    sockaddr_un address{};
-    address.sun_family = AF_UNIX;
-    std::strncpy(address.sun_path, kSocket, sizeof(address.sun_path) - 1);
-    const bool connected = connect(descriptor, reinterpret_cast<const sockaddr *>(&address), sizeof(address)) == 0;
-    const int error = connected ? 0 : errno;
-    close(descriptor);
-    if (connected) {
-        return {true, "reachable"};
+    const int error = FindOut();
+    if (error == 0) {
+        return {true, "reachable", DaemonCondition::Listening};
     }
     if (error == EAGAIN) {
-        return {true, "reachable, but its backlog is full"};
+        return {true, "reachable, but its backlog is full", DaemonCondition::Full};
     }
-    return {false, std::string("not reachable: ") + std::strerror(error)};
+    return {false, std::string("not reachable: ") + std::strerror(error), ConditionOf(error)};
 }
 
 }  // namespace fileindexctl
