@@ -46,4 +46,11 @@ expect "after the refusals" 1 "$(fileindexctl list | grep -c "$folder")"
 on_terminal $'y\n' "fileindexctl remove $folder" >/dev/null
 expect "after the consent" 0 "$(fileindexctl list 2>/dev/null | grep -c "$folder")"
 
+status=/usr/vork/etc/fileindex/status.conf
+echo '{"no_space": 1}' >$status
+on_terminal $'n\n' "fileindexctl doctor --fix" >/dev/null
+expect "a repair that is refused" '{"no_space": 1}' "$(cat $status)"
+on_terminal $'y\n' "fileindexctl doctor --fix" >/dev/null
+expect "a repair, and the copy" $'{}\n{"no_space": 1}' "$(sed 's/ *$//' $status $status.*)"
+
 exit "$((failures > 0))"

@@ -5,9 +5,10 @@
 #                 writes to stderr, then its exit status unless that is 0: "[66]"
 #   # TEXT        a remark, behind an empty line
 #
-# Points in time are shown as TIME, seconds since the epoch as EPOCH, lines of the platform's source as PLACE. Each transcript starts on a fresh machine with
-# the shares photo and music on /vol1, video on /vol2, and "odd", whose directory has another name. After a deliberate
-# change of an output, write the transcripts anew with
+# Points in time are shown as TIME or, in names of files, STAMP, seconds since the epoch as EPOCH, numbers of processes
+# as PID, lines of the platform's source as PLACE. Each transcript starts on a fresh machine with the shares photo and
+# music on /vol1, video on /vol2, and "odd", whose directory has another name. After a deliberate change of an output,
+# write the transcripts anew with
 #   BIN_DIR=... BUILD_DIR=... REWRITE=1 scripts/in-private-namespace tests/cli/transcripts_test.sh
 set -uo pipefail
 
@@ -16,7 +17,9 @@ export PATH="$BIN_DIR:$PATH" TZ=UTC LC_ALL=C
 unset NO_COLOR
 
 fresh_machine() {
-    [[ ! -S /run/fileindexd.sock ]] || /etc/init.d/fileindexd stop
+    # Not by the init script, which the transcript may have replaced.
+    [[ ! -S /run/fileindexd.sock ]] || kill "$(cat /run/peer.pid)"
+    rm -f /run/fileindexd.sock
     umount -n /vol2/video 2>/dev/null
     rm -rf /vol1/* /vol2/* /usr/vork/etc/* /tmp/fileidx_cfg_*.lock /tmp/commands
     mkdir -p /usr/vork/etc/fileindex /vol1/photo/2015/trip /vol1/music /vol2/video
@@ -38,14 +41,15 @@ END
 without_accidents() {
     sed -E 's/[0-9]{4}-[0-9]{2}-[0-9]{2} [0-9]{2}:[0-9]{2} UTC/TIME/g
             s/(err=\[0x[0-9A-F]{4}) [a-z_]+\.cpp:[0-9]+\]/\1 PLACE]/
-            s/"(oldest|resume_time)":[0-9]{10}/"\1":EPOCH/g'
+            s/"(oldest|resume_time)":[0-9]{10}/"\1":EPOCH/g
+            s/(process )[0-9]+ /\1PID /g; s/[0-9]{8}-[0-9]{6}/STAMP/g'
 }
 
-# What the daemon received, once it has read that many commands; those that say nothing are probes.
+# What the daemon received, once it has read that many commands.
 # shellcheck disable=SC2317  # the transcripts call it
 received() {
-    until [[ $(grep -c '^[0-9]' /tmp/commands) -ge $1 ]]; do sleep 0.01; done
-    grep '^[0-9]' /tmp/commands
+    until [[ $(wc -l </tmp/commands) -ge $1 ]]; do sleep 0.01; done
+    cat /tmp/commands
 }
 
 # The commands of a transcript share one shell, so that one can build on another.

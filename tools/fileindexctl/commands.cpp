@@ -42,6 +42,11 @@ constexpr Parameter kStatus[] = {
     {"PATH", Takes::Optional, "", "only this indexed folder"},
     {"--share", Takes::One, "SHARE", "only this share"},
 };
+constexpr Parameter kDoctor[] = {
+    {"--fix", Takes::Nothing, "",
+     "mend what can be mended: shows the difference first, and keeps copies of files"},
+    {"--yes", Takes::Nothing, "", "mend without asking"},
+};
 constexpr Parameter kReindex[] = {{"PATH", Takes::Many, "", "share paths in or of indexed folders"}};
 constexpr Parameter kRevive[] = {{"SHARE", Takes::Many, "", "names of shares"}};
 constexpr Parameter kShare[] = {{"SHARE", Takes::One, "", "the name of the share"}};
@@ -84,6 +89,8 @@ constexpr Command kCommands[] = {
     {"", "explain", "Why a path is indexed or not, rule by rule; exit status 1 if it may not be", kQuestion,
      ExplainPath},
     {"", "status", "How far indexing is, and what waits", kStatus, ShowStatus},
+    {"", "doctor", "Find out what is wrong, and mend it; exit status 1 while something is", kDoctor,
+     ExamineSystem},
     {"", "pause", "Pause indexing", kPause, PauseIndexing},
     {"", "resume", "Go on with indexing", {}, ResumeIndexing},
     {"", "reindex", "Have paths indexed again", kReindex, ReindexPaths},

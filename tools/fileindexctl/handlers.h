@@ -29,6 +29,9 @@ ExitStatus GoverningFolder(const Arguments &arguments, Output &output);
 // explain.cpp
 ExitStatus ExplainPath(const Arguments &arguments, Output &output);
 
+// doctor/doctor.cpp
+ExitStatus ExamineSystem(const Arguments &arguments, Output &output);
+
 // status.cpp
 ExitStatus ShowStatus(const Arguments &arguments, Output &output);
 

@@ -63,6 +63,10 @@ void Output::Line(std::string_view text) {
     Print(stdout, "\n");
 }
 
+void Output::Flush() {
+    std::fflush(stdout);
+}
+
 void Output::Warn(const std::string &text) {
     warnings_.push_back(text);
     Complain("warning: ", text);

@@ -31,6 +31,9 @@ public:
     /// One line of data for people; left out of JSON.
     void Line(std::string_view text);
 
+    /// Has the lines so far shown, before a question.
+    void Flush();
+
     /// What programs get as "data"; not shown to people.
     Json::Value &Data() { return data_; }
 

@@ -6,6 +6,7 @@
 #include "queue.h"
 #include "records.h"
 #include "schedule.h"
+#include "status_file.h"
 #include "text.h"
 
 #include <fileindex/indexability.h>
@@ -20,15 +21,6 @@ namespace fileindexctl {
 namespace {
 
 using VORK::FILEINDEX::StatusMgr;
-
-// The library answers for one share at a time; a report names them all, indexed or not.
-class StatusFile : public VORK::FILEINDEX::Status {
-public:
-    std::vector<std::string> Marked(const char *flag) const {
-        const bool usable = document_.isObject() && document_[flag].isObject();
-        return usable ? document_[flag].getMemberNames() : std::vector<std::string>();
-    }
-};
 
 void ShowRows(const std::vector<std::vector<std::string>> &rows, unsigned width, Output &output) {
     for (const auto &line : Align(rows, width)) {

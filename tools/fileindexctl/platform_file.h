@@ -1,0 +1,24 @@
+/// \file
+/// The configuration of the Linux platform: which shares it lists. The platform's interface looks shares up by
+/// name only.
+#ifndef FILEINDEXCTL_PLATFORM_FILE_H
+#define FILEINDEXCTL_PLATFORM_FILE_H
+
+#include <json/value.h>
+
+#include <string>
+#include <vector>
+
+namespace fileindexctl {
+
+inline constexpr const char *kPlatformFile = "/usr/vork/etc/platform.conf";
+
+/// The document. Throws Failure when it is missing or malformed.
+Json::Value ReadPlatformFile();
+
+/// The names of all shares, also of those that the platform refuses; none when the file cannot be read.
+std::vector<std::string> ConfiguredShares();
+
+}  // namespace fileindexctl
+
+#endif
