@@ -9,6 +9,7 @@
 
 #include <syslog.h>
 
+#include <algorithm>
 #include <cstddef>
 #include <iterator>
 #include <string_view>
@@ -19,6 +20,13 @@ namespace VORK {
 namespace FILEINDEX {
 
 namespace {
+
+int CountUnresolved(const std::map<std::string, Folder> &folders) {
+    const auto unresolved = [](const auto &entry) {
+        return internal::FolderAccess::StoredFullPath(entry.second).empty();
+    };
+    return static_cast<int>(std::count_if(folders.begin(), folders.end(), unresolved));
+}
 
 /// Takes over a folder.conf in its usual form. False, with nothing taken, when it is not quite that.
 bool LoadOrdinary(std::map<std::string, Folder> &folders, std::string &text) {
@@ -75,6 +83,7 @@ bool Folders::Load() {
     const bool loaded = internal::LoadConfig(GetPath(), [&](std::string &text) {
         done = LoadOrdinary(folders_, text);
         if (done) {
+            unresolved_ = CountUnresolved(folders_);
             unparsed_ = std::move(text);
             return true;
         }
@@ -96,6 +105,7 @@ bool Folders::Load() {
         folder.Load(path, *it);  // a folder whose share is away stays in the list
         folders_.emplace(path, std::move(folder));
     }
+    unresolved_ = CountUnresolved(folders_);
     return true;
 }
 

@@ -10,6 +10,7 @@
 
 #include <syslog.h>
 
+#include <algorithm>
 #include <cstddef>
 #include <iterator>
 #include <utility>
@@ -24,23 +25,57 @@ namespace {
 
 using FolderMap = std::map<std::string, Folder>;
 
-/// The folder that governs `fullPath` when the record stored under `path` is `own` (null: none is).
-///
-/// Walks the store as it was or will be without copying it.
-const Folder *GoverningFolder(const FolderMap &folders, const std::string &fullPath, const std::string &path,
-                              const Folder *own) {
-    internal::Governing governing(fullPath);
-    const auto split = folders.lower_bound(path);
-    for (auto it = folders.begin(); it != split; ++it) {
-        governing.Consider(it->second);
+template <typename Iterator>
+const Folder *FirstCovering(Iterator it, Iterator end, const std::string &fullPath) {
+    const auto found =
+        std::find_if(it, end, [&](const auto &entry) { return internal::Covers(entry.second, fullPath); });
+    return found == end ? nullptr : &found->second;
+}
+
+/// The store as it was or will be, without a copy of it: the record stored under `path` is `own` (null: none is).
+class StoreWith {
+public:
+    StoreWith(const FolderMap &folders, const std::string &path, const Folder *own)
+        : folders_(folders), own_(own), before_(folders.lower_bound(path)), behind_(folders.upper_bound(path)) {}
+
+    /// Null when no folder governs the full path. Where some have no full path each folder is asked in the list's
+    /// order, because each of those leaves a record; otherwise from the end, as the last one that covers governs.
+    const Folder *Governing(const std::string &fullPath, bool allResolved) const {
+        return allResolved ? LastCovering(fullPath) : AskAll(fullPath);
     }
-    if (own != nullptr) {
-        governing.Consider(*own);
+
+private:
+    const Folder *AskAll(const std::string &fullPath) const {
+        internal::Governing governing(fullPath);
+        for (auto it = folders_.begin(); it != before_; ++it) {
+            governing.Consider(it->second);
+        }
+        if (own_ != nullptr) {
+            governing.Consider(*own_);
+        }
+        for (auto it = behind_; it != folders_.end(); ++it) {
+            governing.Consider(it->second);
+        }
+        return governing.Get();
     }
-    for (auto it = folders.upper_bound(path); it != folders.end(); ++it) {
-        governing.Consider(it->second);
+
+    const Folder *LastCovering(const std::string &fullPath) const {
+        const Folder *found = FirstCovering(folders_.rbegin(), std::make_reverse_iterator(behind_), fullPath);
+        if (found == nullptr && own_ != nullptr && internal::Covers(*own_, fullPath)) {
+            found = own_;
+        }
+        return found != nullptr ? found
+                                : FirstCovering(std::make_reverse_iterator(before_), folders_.rend(), fullPath);
     }
-    return governing.Get();
+
+    const FolderMap &folders_;
+    const Folder *own_;
+    FolderMap::const_iterator before_;
+    FolderMap::const_iterator behind_;
+};
+
+bool IsUnresolved(const Folder &folder) {
+    return internal::FolderAccess::StoredFullPath(folder).empty();
 }
 
 /// True for each media kind that is indexed differently after the change. A side that no folder governs always
@@ -118,23 +153,28 @@ bool Folders::Upsert(Json::Value &out, const Json::Value &folder) {
             return false;
         }
     }
-    const Folder *before = GoverningFolder(folders_, fullPath, path, known ? &found->second : nullptr);
+    const StoreWith asItWas(folders_, path, known ? &found->second : nullptr);
     // After the change the record itself counts, even where a folder later in the list governs the path.
-    out = ChangeReport(before, &updated);
+    out = ChangeReport(asItWas.Governing(fullPath, unresolved_ == 0), &updated);
+    unresolved_ += IsUnresolved(updated) ? 1 : 0;
     if (known) {
+        unresolved_ -= IsUnresolved(found->second) ? 1 : 0;
         found->second = std::move(updated);
     }
     return true;
 }
 
 bool Folders::Delete(Json::Value &out, const std::string &path) {
+    const bool allResolved = unresolved_ == 0;
     const auto removed = folders_.extract(path);
+    const Folder *own = removed ? &removed.mapped() : nullptr;
+    unresolved_ -= own != nullptr && IsUnresolved(*own) ? 1 : 0;
     std::string fullPath;
     if (!GetFullPath(fullPath, path)) {
         return true;  // a folder of a share that is gone can still be removed
     }
-    const Folder *before = GoverningFolder(folders_, fullPath, path, removed ? &removed.mapped() : nullptr);
-    const Folder *after = GoverningFolder(folders_, fullPath, path, nullptr);
+    const Folder *before = StoreWith(folders_, path, own).Governing(fullPath, allResolved);
+    const Folder *after = StoreWith(folders_, path, nullptr).Governing(fullPath, unresolved_ == 0);
     out = Json::Value(Json::objectValue);
     out[path] = ChangeReport(before, after);
     return true;

@@ -1,5 +1,6 @@
 #include "json/ordinary.h"
 
+#include "json/compact_event.h"
 #include "names.h"
 
 #include <simdjson.h>
@@ -115,6 +116,9 @@ OrdinaryReader::OrdinaryReader() {
 OrdinaryReader::~OrdinaryReader() = default;
 
 bool OrdinaryReader::ReadEvent(std::string_view line, OrdinaryEvent &event) {
+    if (ReadCompactEvent(line, event)) {
+        return true;
+    }
     object root;
     if (!parser_->Parse(line, root)) {
         return false;

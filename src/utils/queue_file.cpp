@@ -16,6 +16,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
+#include <iterator>
 #include <memory>
 #include <optional>
 #include <utility>
@@ -187,12 +188,15 @@ private:
         Json::Value record;
         path_.clear();
         old_path_.clear();
-        if (!exact_->Parse(line, record) || !RetrieveStringFromJsonObj(path_, kPathKey, record) ||
-            !record.isMember(kEventKey) || !record[kEventKey].isConvertibleTo(Json::uintValue)) {
+        if (!exact_->Parse(line, record) || !RetrieveStringFromJsonObj(path_, kPathKey, record)) {
+            return false;
+        }
+        const Json::Value *type = record.find(std::begin(kEventKey), std::end(kEventKey) - 1);
+        if (type == nullptr || !type->isConvertibleTo(Json::uintValue)) {
             return false;
         }
         RetrieveStringFromJsonObj(old_path_, kOldPathKey, record);
-        event_ = {record[kEventKey].asUInt(), path_, old_path_};
+        event_ = {type->asUInt(), path_, old_path_};
         return true;
     }
 
