@@ -1,0 +1,28 @@
+#include "rows/support.h"
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <stdexcept>
+
+namespace bench {
+
+void Require(bool condition, const char *what) {
+    if (!condition) {
+        throw std::runtime_error(what);
+    }
+}
+
+std::string FullPath(const std::string &sharePath) {
+    return kVolume + sharePath;
+}
+
+void ReadBytes(const std::string &path) {
+    static std::vector<char> block(128 * 1024);
+    const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+    while (read(fd, block.data(), block.size()) > 0) {
+    }
+    close(fd);
+}
+
+}  // namespace bench
