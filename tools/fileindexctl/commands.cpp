@@ -104,6 +104,7 @@ constexpr Command kCommands[] = {
     {"monitor", "refresh", "Have watched what should be", kMonitor, RefreshMonitors},
     {"queue", "show", "Show the events that wait, the oldest first", kQueueShow, ShowQueue},
     {"queue", "count", "Count the events that wait", kQueueCount, CountQueue},
+    {"", "metrics", "Write what can be measured in the text format of Prometheus", {}, ShowMetrics},
     {"", "export", "Write folders and status as one JSON document", kExport, ExportConfiguration},
     {"", "import", "Bring folders and status into the state that a document holds", kImport, ImportConfiguration},
     {"", "migrate", "Bring everything into line with the folders after an upgrade", kMigrate, Migrate},

@@ -64,6 +64,9 @@ ExitStatus ExportConfiguration(const Arguments &arguments, Output &output);
 // import.cpp
 ExitStatus ImportConfiguration(const Arguments &arguments, Output &output);
 
+// metrics.cpp
+ExitStatus ShowMetrics(const Arguments &arguments, Output &output);
+
 // migrate.cpp
 ExitStatus Migrate(const Arguments &arguments, Output &output);
 

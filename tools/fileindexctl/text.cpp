@@ -78,6 +78,21 @@ std::string Printable(const std::string &text) {
     return result;
 }
 
+std::string AsUtf8(const std::string &text) {
+    std::string result;
+    for (std::size_t i = 0; i < text.size();) {
+        ucs4_t character = 0;
+        const int length = u8_mbtoucr(&character, Bytes(text) + i, text.size() - i);
+        if (length > 0) {
+            result.append(text, i, static_cast<std::size_t>(length));
+        } else {
+            result += Escape(static_cast<unsigned char>(text[i]));
+        }
+        i += static_cast<std::size_t>(std::max(length, 1));
+    }
+    return result;
+}
+
 unsigned DisplayWidth(const std::string &text) {
     const int width = IsUtf8(text) ? u8_width(Bytes(text), text.size(), "UTF-8") : -1;
     return width >= 0 ? static_cast<unsigned>(width) : static_cast<unsigned>(text.size());

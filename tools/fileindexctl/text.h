@@ -12,6 +12,9 @@ namespace fileindexctl {
 /// cursor. Bytes that are not UTF-8 pass.
 std::string Printable(const std::string &text);
 
+/// The text with each byte that is not UTF-8 written as an escape: "\xe9".
+std::string AsUtf8(const std::string &text);
+
 /// The columns the text takes on a terminal; for bytes that are not UTF-8, their number.
 unsigned DisplayWidth(const std::string &text);
 
