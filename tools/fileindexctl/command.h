@@ -1,5 +1,6 @@
 /// \file
-/// The shape of the command table (commands.cpp), from which parsing and help are made.
+/// The shape of the command table (commands.cpp), from which parsing, help, completion and the manual page are
+/// made.
 #ifndef FILEINDEXCTL_COMMAND_H
 #define FILEINDEXCTL_COMMAND_H
 
@@ -34,6 +35,7 @@ struct Command {
     std::string_view help;
     std::span<const Parameter> parameters;
     ExitStatus (*run)(const Arguments &, Output &);
+    bool hidden = false;  ///< for the build, not for users
 };
 
 /// All commands, in the order in which help shows them.

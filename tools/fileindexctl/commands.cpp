@@ -18,6 +18,7 @@ constexpr Parameter kList[] = {
     {"--offset", Takes::Number, "N", "leave out the first N"},
     {"--limit", Takes::Number, "N", "show at most N"},
     {"--status", Takes::Nothing, "", "add how far indexing is; reads the queues"},
+    {"--paths", Takes::Nothing, "", "only the paths, as they are, each on a line"},
 };
 constexpr Parameter kFolder[] = {{"PATH", Takes::One, "", "the indexed folder: /SHARE/..."}};
 constexpr Parameter kAdd[] = {
@@ -59,6 +60,8 @@ constexpr Parameter kOneShare = {"SHARE", Takes::Optional, "", "only this share"
 constexpr Parameter kMonitor[] = {kOneShare};
 constexpr Parameter kQueueShow[] = {kOneShare, {"--limit", Takes::Number, "N", "show at most N events"}};
 constexpr Parameter kQueueCount[] = {kOneShare};
+constexpr std::string_view kShells[] = {"bash", "zsh", "fish"};
+constexpr Parameter kCompletion[] = {{"SHELL", Takes::One, "", "the shell that reads it", kShells}};
 constexpr Parameter kExport[] = {
     {"--output", Takes::One, "FILE", "write this file, whole or not at all", {}, "-o"},
 };
@@ -107,6 +110,8 @@ constexpr Command kCommands[] = {
     {"", "metrics", "Write what can be measured in the text format of Prometheus", {}, ShowMetrics},
     {"", "export", "Write folders and status as one JSON document", kExport, ExportConfiguration},
     {"", "import", "Bring folders and status into the state that a document holds", kImport, ImportConfiguration},
+    {"", "completion", "Write what completes command lines in a shell", kCompletion, WriteCompletion},
+    {"", "manual", "Write the manual page", {}, WriteManual, true},
     {"", "migrate", "Bring everything into line with the folders after an upgrade", kMigrate, Migrate},
 };
 

@@ -4,6 +4,9 @@
 #ifndef FILEINDEXCTL_EXIT_STATUS_H
 #define FILEINDEXCTL_EXIT_STATUS_H
 
+#include <span>
+#include <string_view>
+
 namespace fileindexctl {
 
 enum class ExitStatus {
@@ -19,6 +22,15 @@ enum class ExitStatus {
     Permission = 77,     ///< the files may not be read or written by this user
     NotConfigured = 78,  ///< the platform knows no shares, or this share cannot be used
 };
+
+struct ExitMeaning {
+    ExitStatus status;
+    std::string_view words;
+    std::string_view sentence;
+};
+
+/// All of them, for the help and the manual page.
+std::span<const ExitMeaning> ExitMeanings();
 
 }  // namespace fileindexctl
 

@@ -85,6 +85,12 @@ ExitStatus ListFolders(const Arguments &arguments, Output &output) {
         output.Note(total == 0 ? "no folder is indexed" : "no folder on this page");
         return ExitStatus::Done;
     }
+    if (arguments.Has("--paths")) {
+        for (const auto &record : page) {
+            output.Line(record["path"].asString());
+        }
+        return ExitStatus::Done;
+    }
     ShowTable(page, arguments.Has("--status"), output);
     return ExitStatus::Done;
 }

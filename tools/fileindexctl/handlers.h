@@ -67,6 +67,12 @@ ExitStatus ImportConfiguration(const Arguments &arguments, Output &output);
 // metrics.cpp
 ExitStatus ShowMetrics(const Arguments &arguments, Output &output);
 
+// completion.cpp
+ExitStatus WriteCompletion(const Arguments &arguments, Output &output);
+
+// manual.cpp
+ExitStatus WriteManual(const Arguments &arguments, Output &output);
+
 // migrate.cpp
 ExitStatus Migrate(const Arguments &arguments, Output &output);
 

@@ -131,6 +131,7 @@ ExitStatus ImportConfiguration(const Arguments &arguments, Output &output) {
         output.Note("nothing was done");
         return ExitStatus::Done;
     }
+    output.Flush();
     AskForRemoval(arguments, plan);
     const StepReport report = Apply(plan);
     report.Show(output);

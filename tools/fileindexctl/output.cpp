@@ -56,11 +56,14 @@ Json::Value ToArray(const std::vector<std::string> &items) {
 Output::Output(bool json) : json_(json), colour_(MayColour()), width_(TerminalWidth()), data_(Json::objectValue) {}
 
 void Output::Line(std::string_view text) {
-    if (json_) {
-        return;
+    Text(text);
+    Text("\n");
+}
+
+void Output::Text(std::string_view text) {
+    if (!json_) {
+        Print(stdout, text);
     }
-    Print(stdout, text);
-    Print(stdout, "\n");
 }
 
 void Output::Flush() {

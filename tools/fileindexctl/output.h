@@ -34,6 +34,9 @@ public:
     /// Has the lines so far shown, before a question.
     void Flush();
 
+    /// Lines of data for people, with their ends; left out of JSON.
+    void Text(std::string_view text);
+
     /// What programs get as "data"; not shown to people.
     Json::Value &Data() { return data_; }
 

@@ -12,10 +12,21 @@ namespace fileindexctl {
 namespace {
 
 constexpr const char *kAbout = "fileindexctl - which folders are indexed, and how far indexing is";
-constexpr const char *kFooter =
-    "Exit status: 0 done or yes, 1 no, 64 usage, 65 malformed configuration, 66 no such folder or share,\n"
-    "69 daemon or service unreachable, 70 partly done, 73 cannot save, 75 lock busy, 77 permission,\n"
-    "78 platform not configured.";
+constexpr std::size_t kHelpWidth = 104;
+
+std::string Footer() {
+    std::string text = "Exit status:";
+    std::size_t width = text.size();
+    for (const auto &meaning : ExitMeanings()) {
+        const std::string item =
+            std::to_string(static_cast<int>(meaning.status)) + " " + std::string(meaning.words);
+        const bool last = &meaning == &ExitMeanings().back();
+        const bool breaks = width + item.size() + 2 > kHelpWidth;
+        text += (breaks ? "\n" : " ") + item + (last ? "." : ",");
+        width = (breaks ? 0 : width + 1) + item.size() + 1;
+    }
+    return text;
+}
 
 // Checked as text, so that what is read later is digits only and fits.
 std::string CheckNumber(const std::string &text) {
@@ -26,7 +37,7 @@ std::string CheckNumber(const std::string &text) {
 class Parser {
 public:
     Parser() : app_(kAbout, "fileindexctl") {
-        app_.footer(kFooter);
+        app_.footer(Footer());
         app_.require_subcommand(1);
         app_.add_flag("--json", json_, "one JSON document on the standard output");
         app_.set_version_flag("--version", FILEINDEXCTL_VERSION, "show the version");
@@ -82,6 +93,9 @@ private:
         CLI::App &parent = ParentOf(command);
         CLI::App *app = parent.add_subcommand(std::string(command.name), std::string(command.help));
         app->fallthrough();
+        if (command.hidden) {
+            app->group("");
+        }
         for (const auto &parameter : command.parameters) {
             AddParameter(*app, parameter);
         }

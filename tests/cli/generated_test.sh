@@ -1,0 +1,90 @@
+#!/bin/bash
+# What is made from the table of commands for other programs: completions, run in the shells that are there, and the
+# manual page.
+# shellcheck disable=SC2016,SC2317  # words for other shells; functions are called through their names
+set -uo pipefail
+
+export PATH="$BIN_DIR:$PATH"
+failures=0
+
+expect() {
+    local what=$1 expected=$2 found=$3
+    [[ $found == "$expected" ]] && return
+    printf '%s:\n%s\n' "$what" "$(diff <(echo "$expected") <(echo "$found"))"
+    failures=$((failures + 1))
+}
+
+# A folder's name must be completed, not run.
+cat >/usr/vork/etc/fileindex/folder.conf <<'END'
+{"/music": {}, "/photo/$(touch /tmp/hacked)": {}, "/photo/a b": {}, "/photo/*": {}}
+END
+mkdir /tmp/files && cd /tmp/files && touch "one file" two
+
+# What is typed after "fileindexctl", "|", what is offered.
+rows=(
+    'qu|queue'
+    'queue |count,show'
+    'share re|remove,rename,resume'
+    'completion |bash,fish,zsh'
+    'list --sh|--share'
+    'list --sort p|path,photo'
+    'list --share |music,photo'
+    'list --limit |'
+    '--json share rename p|photo'
+    'share rename photo m|music'
+    'show /mu|/music'
+    'show /music --j|--json'
+    'remove --yes /music /photo/a|/photo/a b'
+    'check o|one file'
+    'export -o t|two'
+    'import |one file,two'
+    'nonsense |'
+)
+onlyBash=(
+    'list --sort=p|path,photo'
+    'remove --yes /music /photo/$|/photo/$(touch /tmp/hacked)'
+    'show /photo/a\ |/photo/a b'
+    'show "/photo/a|/photo/a b'
+    'resume |--help,--json'
+)
+
+# shellcheck disable=SC1090,SC2001,SC2034  # the function reads COMP_WORDS
+in_bash() {
+    source <(fileindexctl completion bash)
+    local line="fileindexctl ${1/=/ = }"
+    mapfile -t COMP_WORDS < <(sed 's/\([^\\]\) /\1\n/g' <<<"$line")
+    COMP_CWORD=$((${#COMP_WORDS[@]} - 1))
+    _fileindexctl
+    printf '%s\n' "${COMPREPLY[@]}"
+}
+
+in_fish() {
+    typed="fileindexctl $1" fish --no-config -c 'fileindexctl completion fish | source; complete -C "$typed"' 2>&1 | cut -f 1
+}
+
+check_rows() {
+    local shell=$1 row
+    for row in "${@:2}"; do
+        expect "$shell: fileindexctl ${row%%|*}" "$(tr , '\n' <<<"${row#*|}")" "$("in_$shell" "${row%%|*}" | LC_ALL=C sort)"
+    done
+}
+
+check_rows bash "${rows[@]}" "${onlyBash[@]}"
+if command -v fish >/dev/null; then
+    check_rows fish "${rows[@]}"
+fi
+if command -v zsh >/dev/null; then
+    expect "what zsh reads" "" "$(fileindexctl completion zsh | zsh -n 2>&1)"
+    expect "what zsh registers" _fileindexctl "$(zsh -fc 'autoload -Uz compinit && compinit -u -d /tmp/dump
+        source =(fileindexctl completion zsh) && print $_comps[fileindexctl]' 2>&1)"
+fi
+[[ ! -e /tmp/hacked ]] || expect "names of folders" "completed" "run"
+
+for shell in '' tcsh; do
+    fileindexctl completion $shell &>/dev/null
+    expect "status for the shell \"$shell\"" 64 $?
+done
+expect "the page in JSON" '{"data":{"page":".Dd ' "$(fileindexctl manual --json | cut -c 1-21)"
+expect "what mandoc finds" "" "$(fileindexctl manual | mandoc -T lint -W warning 2>&1)"
+
+exit "$((failures > 0))"

@@ -1,0 +1,209 @@
+// The manual page in mdoc, made from the command table.
+#include "command.h"
+#include "completion.h"
+#include "exit_status.h"
+#include "handlers.h"
+
+namespace fileindexctl {
+
+namespace {
+
+constexpr const char *kHead = R"(.Dd November 21, 2026
+.Dt FILEINDEXCTL 1
+.Os libfileindex
+.Sh NAME
+.Nm fileindexctl
+.Nd which folders are indexed, and how far indexing is
+.Sh SYNOPSIS
+.Nm
+.Op Fl -json
+.Ar command
+.Op Ar argument ...
+.Nm
+.Fl -help | Fl -version
+.Sh DESCRIPTION
+The daemon fileindexd builds a search index of the files in a server's shares.
+.Nm
+tells it which folders to index, pauses it, says how far it has got and why a file is not found.
+.Pp
+A folder is named by its share path, which begins with the name of the share:
+.Pa /photo/2015
+lies in the share
+.Dq photo .
+The questions
+.Cm check , contains
+and
+.Cm governs
+also take full paths,
+.Pa /vol1/photo/2015 .
+.Pp
+A change is saved first, then everybody is told.
+Each step is listed with what became of it; when a step fails, those behind it are not reached, and the message says how
+to go on.
+What deletes asks first on a terminal, and needs
+.Fl -yes
+without one.
+.Pp
+Data goes to the standard output, everything else to the standard error.
+Each command takes these:
+.Bl -tag -width Ds
+.It Fl -json
+Write one JSON document to the standard output:
+.Ql {\(dqschema\(dq: 1, \(dqok\(dq: true, \(dqdata\(dq: {...}, \(dqwarnings\(dq: [...]} .
+.It Fl -help
+Show what the command takes.
+.El
+.Sh COMMANDS
+.Bl -tag -width Ds
+)";
+
+constexpr const char *kSurroundings = R"(.Sh ENVIRONMENT
+.Bl -tag -width NO_COLOR
+.It Ev NO_COLOR
+If set and not empty, nothing is coloured on a terminal.
+.It Ev TZ
+The time zone in which times are read and shown.
+.El
+.Sh FILES
+.Bl -tag -width Ds
+.It Pa /usr/vork/etc/fileindex/folder.conf
+The indexed folders.
+.It Pa /usr/vork/etc/fileindex/status.conf
+The pause, and the flags of shares.
+.It Pa /tmp/fileidx_cfg_folder.lock , Pa /tmp/fileidx_cfg_status.lock
+Their locks.
+.It Pa SHARE/@eaDir/VORK@file_index_queue
+The event queue of a share.
+.It Pa /var/run/fileindexd.sock
+The socket of the daemon.
+.It Pa /usr/vork/etc/platform.conf
+The shares (Linux platform only).
+.It Pa /usr/vork/etc/vorknotifyd/registrations.json
+What is watched for changes (Linux platform only).
+.El
+)";
+
+constexpr const char *kTail = R"(.Sh EXAMPLES
+Have a folder indexed, photos and films only:
+.Pp
+.Dl fileindexctl add /photo/2015 --name Holiday --media photo,video
+.Pp
+Pause until the next morning:
+.Pp
+.Dl fileindexctl pause --until 07:00
+.Pp
+Move the configuration to another machine; the first command on it only looks:
+.Pp
+.Dl fileindexctl export -o fileindex.json
+.Dl fileindexctl import fileindex.json --dry-run
+.Dl fileindexctl import fileindex.json --replace
+.Pp
+Hand the metrics to a collector that reads files:
+.Pp
+.Dl fileindexctl metrics > fileindex.prom.new && mv fileindex.prom.new fileindex.prom
+.Pp
+Complete command lines in this shell:
+.Pp
+.Dl source <(fileindexctl completion bash)
+.Sh SEE ALSO
+.Xr libfileindex 3 ,
+.Xr fileindex-folder.conf 5 ,
+.Xr fileindex-queue 5 ,
+.Xr fileindex-status.conf 5
+)";
+
+// No word is taken for a request or a macro, nor a dash for a hyphen.
+std::string Escaped(std::string_view text) {
+    std::string result;
+    for (const char character : text) {
+        switch (character) {
+            case '\\':
+                result += "\\e";
+                break;
+            case '-':
+                result += "\\-";
+                break;
+            case '"':
+                result += "\\(dq";
+                break;
+            default:
+                result += character;
+        }
+    }
+    return result;
+}
+
+// A sentence on a line of its own, as it stands in the table: without a full stop, unless it has parts.
+std::string Sentence(std::string_view text) {
+    const bool closed = text.ends_with('.') || text.ends_with('?');
+    const char first = text.empty() ? ' ' : text.front();
+    return std::string(first == '.' || first == '\'' ? "\\&" : "") + Escaped(text) + (closed ? "\n" : ".\n");
+}
+
+std::string Capital(std::string_view text) {
+    std::string result(text);
+    if (!result.empty() && result.front() >= 'a' && result.front() <= 'z') {
+        result.front() = static_cast<char>(result.front() - 'a' + 'A');
+    }
+    return result;
+}
+
+std::string Option(const Parameter &parameter) {
+    const std::string value = parameter.value.empty() ? "" : " Ar " + std::string(parameter.value);
+    const std::string letter =
+        parameter.letter.empty() ? "" : "Fl " + std::string(parameter.letter.substr(1)) + value + " , ";
+    return letter + "Fl -" + std::string(parameter.name.substr(2)) + value;
+}
+
+std::string Synopsis(const Command &command) {
+    std::string line = ".It Cm " + FullName(command);
+    for (const auto &parameter : command.parameters) {
+        if (parameter.IsOption()) {
+            Parameter shown = parameter;
+            shown.letter = {};
+            line += " Oo " + Option(shown) + " Oc";
+            continue;
+        }
+        const std::string name = "Ar " + std::string(parameter.name);
+        const std::string more = parameter.takes == Takes::Many ? " ..." : "";
+        line += parameter.IsRequired() ? " " + name + more : " Oo " + name + more + " Oc";
+    }
+    return line + "\n";
+}
+
+std::string Section(const Command &command) {
+    std::string text = Synopsis(command) + Sentence(command.help);
+    if (command.parameters.empty()) {
+        return text;
+    }
+    text += ".Bl -tag -width Ds -compact\n";
+    for (const auto &parameter : command.parameters) {
+        text += ".It " + (parameter.IsOption() ? Option(parameter) : "Ar " + std::string(parameter.name)) + "\n";
+        text += Sentence(Capital(parameter.help));
+        std::string choices;
+        for (const auto &choice : parameter.choices) {
+            choices += (choices.empty() ? "" : ", ") + std::string(choice);
+        }
+        text += choices.empty() ? "" : "One of " + choices + ".\n";
+    }
+    return text + ".El\n";
+}
+
+}  // namespace
+
+ExitStatus WriteManual(const Arguments & /*arguments*/, Output &output) {
+    std::string page = kHead;
+    for (const Command *command : OfferedCommands()) {
+        page += Section(*command);
+    }
+    page += ".El\n" + std::string(kSurroundings) + ".Sh EXIT STATUS\n.Bl -tag -width Ds -compact\n";
+    for (const auto &meaning : ExitMeanings()) {
+        page += ".It " + std::to_string(static_cast<int>(meaning.status)) + "\n" + Sentence(meaning.sentence);
+    }
+    page += ".El\n" + std::string(kTail);
+    output.Data()["page"] = page;
+    output.Text(page);
+    return ExitStatus::Done;
+}
+
+}  // namespace fileindexctl
