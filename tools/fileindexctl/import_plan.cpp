@@ -5,6 +5,8 @@
 #include "schedule.h"
 #include "text.h"
 
+#include <fileindex/indexability.h>
+
 #include <algorithm>
 
 namespace fileindexctl {
@@ -134,6 +136,10 @@ void ImportPlan::Show(Output &output) const {
     data["kept"] = Array(kept);
     Rows rows;
     for (const auto &change : folders) {
+        const std::string path = change.to["path"].asString();
+        if (change.from.isNull() && !VORK::FILEINDEX::CanPathBeIndexed(path)) {
+            output.Warn(Quoted(path) + " cannot be indexed at present; \"fileindexctl explain\" says why");
+        }
         rows.push_back(Row(change));
         Json::Value pair(Json::objectValue);
         pair["from"] = change.from;

@@ -57,7 +57,45 @@ Show what the command takes.
 .Bl -tag -width Ds
 )";
 
-constexpr const char *kSurroundings = R"(.Sh ENVIRONMENT
+constexpr const char *kSurroundings = R"(.Sh THE EXPORTED DOCUMENT
+What
+.Cm export
+writes is one JSON object:
+.Bl -tag -width "version"
+.It Cm version
+1.
+.It Cm folder
+As in
+.Xr fileindex-folder.conf 5 .
+.It Cm status
+As in
+.Xr fileindex-status.conf 5 ;
+a pause that has ended is written as none.
+.El
+.Pp
+.Cm import
+takes this document, and also what
+.Cm export Fl -json
+writes.
+It checks all of it before anything is changed, and names the member at fault.
+Of a record, what is absent is empty or false; a part of the document that is absent is not touched; a member that nobody
+knows, or that is given twice, is refused.
+.Pp
+Folders that are new or differ are saved and announced as by
+.Cm add
+and
+.Cm set .
+Folders that the document lacks stay, unless
+.Fl -replace
+is given: then they are removed as by
+.Cm remove .
+The status is brought into the state of the document: marking a share as out of space notifies the administrators, taking
+the mark back revives the share, and markers are set, but none is taken back.
+What is so already is not done again, so a second import does nothing.
+After a failure in the middle,
+.Cm migrate
+tells everybody again what is saved.
+.Sh ENVIRONMENT
 .Bl -tag -width NO_COLOR
 .It Ev NO_COLOR
 If set and not empty, nothing is coloured on a terminal.
@@ -164,9 +202,10 @@ std::string Synopsis(const Command &command) {
             line += " Oo " + Option(shown) + " Oc";
             continue;
         }
-        const std::string name = "Ar " + std::string(parameter.name);
-        const std::string more = parameter.takes == Takes::Many ? " ..." : "";
-        line += parameter.IsRequired() ? " " + name + more : " Oo " + name + more + " Oc";
+        line += parameter.IsRequired() ? " Ar " : " Oo Ar ";
+        line += parameter.name;
+        line += parameter.takes == Takes::Many ? " ..." : "";
+        line += parameter.IsRequired() ? "" : " Oc";
     }
     return line + "\n";
 }

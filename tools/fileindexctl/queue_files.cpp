@@ -34,16 +34,19 @@ bool IsEvent(const Json::Value &line) {
            line["path"].isString();
 }
 
-std::optional<QueueEvent> ParseLine(const char *begin, const char *end, bool taken) {
+std::unique_ptr<Json::CharReader> LineReader() {
     Json::CharReaderBuilder builder;
     Json::CharReaderBuilder::strictMode(&builder.settings_);
     builder["strictRoot"] = false;
     builder["rejectDupKeys"] = false;
     builder["stackLimit"] = kDeepest;
-    const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
+    return std::unique_ptr<Json::CharReader>(builder.newCharReader());
+}
+
+std::optional<QueueEvent> ParseLine(Json::CharReader &reader, const char *begin, const char *end, bool taken) {
     Json::Value line;
     try {
-        if (!reader->parse(begin, end, &line, nullptr) || !IsEvent(line)) {
+        if (!reader.parse(begin, end, &line, nullptr) || !IsEvent(line)) {
             return std::nullopt;
         }
     } catch (const Json::Exception &) {  // nested too deeply
@@ -62,6 +65,7 @@ void VisitLines(int descriptor, long long size, bool taken, const Visitor &visit
     __gnu_cxx::stdio_filebuf<char> file(descriptor, std::ios::in);  // closes it
     std::istream lines(&file);
     std::vector<char> buffer(kLongestLine + 1);
+    const auto reader = LineReader();
     for (long long position = 0; lines.good() && position < size; position += lines.gcount()) {
         lines.getline(buffer.data(), static_cast<std::streamsize>(buffer.size()));
         const std::streamsize read = lines.gcount();
@@ -75,7 +79,7 @@ void VisitLines(int descriptor, long long size, bool taken, const Visitor &visit
         if (read == 0) {
             return;
         }
-        const auto event = ParseLine(buffer.data(), buffer.data() + read - (lines.eof() ? 0 : 1), taken);
+        const auto event = ParseLine(*reader, buffer.data(), buffer.data() + read - (lines.eof() ? 0 : 1), taken);
         visitor(event ? &*event : nullptr);
     }
 }
