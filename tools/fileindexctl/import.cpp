@@ -62,6 +62,11 @@ StepReport Apply(const FlagChange &flag) {
     });
 }
 
+// Both lists together may be more than can be stored.
+bool RemovesFirst(const ImportPlan &plan) {
+    return ReadFolders().size() + plan.folders.size() > kMostFolders;
+}
+
 // Folders first: the first of them starts the daemon, which then can be told of the rest. They are added before
 // others are removed, so that the daemon is not stopped on the way from one list to another.
 StepReport Apply(const ImportPlan &plan) {
@@ -81,9 +86,9 @@ StepReport Apply(const ImportPlan &plan) {
             sequence.Do("removal saved", [&] { return PerformRemoval("removal saved", plan.removal, removed); });
         }
     };
-    const bool full = ReadFolders().size() + records.size() > kMostFolders;
-    full ? remove() : upsert();
-    full ? upsert() : remove();
+    const bool removesFirst = RemovesFirst(plan);
+    removesFirst ? remove() : upsert();
+    removesFirst ? upsert() : remove();
     if (plan.pause) {
         sequence.Do("pause saved", [&] { return SetPause(*plan.pause, "pause saved"); });
     }
@@ -98,10 +103,12 @@ void AskForRemoval(const Arguments &arguments, const ImportPlan &plan) {
         return;
     }
     Folders folders = ReadFolders();
-    for (const auto &change : plan.folders) {
-        VORK::FILEINDEX::Folder folder;
-        folder.path = change.to["path"].asString();
-        folders.push_back(folder);
+    if (!RemovesFirst(plan)) {
+        for (const auto &change : plan.folders) {
+            VORK::FILEINDEX::Folder folder;
+            folder.path = change.to["path"].asString();
+            folders.push_back(folder);
+        }
     }
     RequireConsent(arguments, ConsequenceOf(plan.removal, folders));
 }
