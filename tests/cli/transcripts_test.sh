@@ -39,9 +39,9 @@ END
 }
 
 without_accidents() {
-    sed -E 's/[0-9]{4}-[0-9]{2}-[0-9]{2} [0-9]{2}:[0-9]{2} UTC/TIME/g
+    sed -E 's/[0-9]{4}-[0-9]{2}-[0-9]{2} [0-9]{2}:[0-9]{2} UTC/TIME/g; s/[-0-9]{10}T[0-9:]{8}\+0000/TIME/g
             s/(err=\[0x[0-9A-F]{4}) [a-z_]+\.cpp:[0-9]+\]/\1 PLACE]/
-            s/"(oldest|resume_time)":[0-9]{10}/"\1":EPOCH/g
+            s/"(oldest|resume_time|time)":[0-9]{10}/"\1":EPOCH/g
             s/(process )[0-9]+ /\1PID /g; s/[0-9]{8}-[0-9]{6}/STAMP/g'
 }
 

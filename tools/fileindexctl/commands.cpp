@@ -42,6 +42,9 @@ constexpr Parameter kPause[] = {
 constexpr Parameter kStatus[] = {
     {"PATH", Takes::Optional, "", "only this indexed folder"},
     {"--share", Takes::One, "SHARE", "only this share"},
+    {"--watch", Takes::Nothing, "",
+     "show it again and again, with the rate and an estimate; one line for each look when not on a terminal"},
+    {"--interval", Takes::Number, "SECONDS", "with --watch: how often; 2 if not given"},
 };
 constexpr Parameter kDoctor[] = {
     {"--fix", Takes::Nothing, "",

@@ -37,6 +37,7 @@ struct Explanation {
     Json::Value governing{};   // the record; null when there is none
     std::string passedOver{};  // the first part of the path that the indexer passes over
     std::optional<Backlog> backlog{};
+    std::string queueTrouble{};            // why there is none
     std::vector<std::string> reindexed{};  // full paths above the place whose reindex is queued
     ShareFlags share{};
     bool isPauseKnown = false;
@@ -101,7 +102,12 @@ ShareFlags FlagsOf(const std::string &share) {
 
 void AddQueued(const std::string &share, const std::string &top, Explanation &explanation) {
     const std::string &path = explanation.place.fullPath;
-    explanation.backlog = ReadBacklog(share, path);
+    try {
+        explanation.backlog = ReadBacklog(share, path);
+    } catch (const Failure &failure) {
+        explanation.queueTrouble = failure.what();  // the rest of the explanation does not need it
+        return;
+    }
     for (const auto &outer : DownFrom(top, path)) {
         if (outer != path && IsReindexQueued(share, outer)) {
             explanation.reindexed.push_back(outer);
@@ -170,6 +176,9 @@ std::string RemedyFor(const Explanation &explanation) {
 }
 
 std::string QueuedText(const Explanation &explanation) {
+    if (!explanation.queueTrouble.empty()) {
+        return explanation.queueTrouble;
+    }
     if (!explanation.backlog) {
         return explanation.share.name.empty() ? "nothing: the path is in no share" : "the share is away";
     }

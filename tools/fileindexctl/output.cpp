@@ -66,8 +66,27 @@ void Output::Text(std::string_view text) {
     }
 }
 
-void Output::Flush() {
-    std::fflush(stdout);
+bool Output::Flush() {
+    return std::fflush(stdout) == 0 && std::ferror(stdout) == 0;
+}
+
+bool Output::EndSample() {
+    if (json_) {
+        PrintDocument(ExitStatus::Done);
+        data_ = Json::Value(Json::objectValue);
+        warnings_.clear();
+    }
+    sampled_ = true;
+    return Flush();
+}
+
+void Output::PrintDocument(ExitStatus status) {
+    Json::Value document(Json::objectValue);
+    document["schema"] = 1;
+    document["ok"] = status == ExitStatus::Done || (status == ExitStatus::No && !data_.isMember("error"));
+    document["data"] = data_;
+    document["warnings"] = ToArray(warnings_);
+    Print(stdout, Serialise(document));
 }
 
 void Output::Warn(const std::string &text) {
@@ -96,16 +115,8 @@ std::string Output::Paint(Colour colour, std::string_view text) const {
 }
 
 ExitStatus Output::Finish(ExitStatus status) {
-    if (json_) {
-        Json::Value document(Json::objectValue);
-        document["schema"] = 1;
-        document["ok"] = status == ExitStatus::Done || (status == ExitStatus::No && !data_.isMember("error"));
-        document["data"] = data_;
-        document["warnings"] = Json::Value(Json::arrayValue);
-        for (const auto &warning : warnings_) {
-            document["warnings"].append(warning);
-        }
-        Print(stdout, Serialise(document));
+    if (json_ && (!sampled_ || data_.isMember("error"))) {
+        PrintDocument(status);
     }
     if (std::fflush(stdout) != 0 || std::ferror(stdout) != 0) {
         Complain("", "the output could not be written");

@@ -31,8 +31,12 @@ public:
     /// One line of data for people; left out of JSON.
     void Line(std::string_view text);
 
-    /// Has the lines so far shown, before a question.
-    void Flush();
+    /// Has the lines so far shown, before a question. False when they cannot be written.
+    bool Flush();
+
+    /// For a command that goes on and on: ends one of its samples, in JSON a document of its own on one line. The
+    /// data begin anew, and no document is written at the end. False as above.
+    bool EndSample();
 
     /// Lines of data for people, with their ends; left out of JSON.
     void Text(std::string_view text);
@@ -56,7 +60,10 @@ public:
     ExitStatus Finish(ExitStatus status);
 
 private:
+    void PrintDocument(ExitStatus status);
+
     bool json_;
+    bool sampled_ = false;
     bool colour_;
     unsigned width_;
     Json::Value data_;

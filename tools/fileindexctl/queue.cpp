@@ -3,6 +3,9 @@
 #include "paths.h"
 #include "queue_files.h"
 
+#include <set>
+#include <unordered_map>
+
 namespace fileindexctl {
 
 unsigned long Backlog::Total() const {
@@ -13,23 +16,84 @@ unsigned long Backlog::Total() const {
     return total;
 }
 
-std::optional<Backlog> ReadBacklog(const std::string &share, const std::string &below) {
+namespace {
+
+// Which of many places an event belongs to: looked up by each directory above it, so that a long queue and many
+// folders do not multiply.
+class PlaceIndex {
+public:
+    explicit PlaceIndex(const std::vector<std::string> &places) {
+        for (std::size_t i = 0; i < places.size(); ++i) {
+            byPath_[places[i]].push_back(i);
+        }
+    }
+
+    std::set<std::size_t> Of(const QueueEvent &event) const {
+        std::set<std::size_t> found;
+        AddAbove(event.path, found);
+        if (!event.oldPath.empty()) {
+            AddAbove(event.oldPath, found);
+        }
+        return found;
+    }
+
+private:
+    void Add(const std::string &path, std::set<std::size_t> &found) const {
+        const auto places = byPath_.find(path);
+        if (places != byPath_.end()) {
+            found.insert(places->second.begin(), places->second.end());
+        }
+    }
+
+    void AddAbove(const std::string &path, std::set<std::size_t> &found) const {
+        for (std::size_t end = path.size(); end != std::string::npos && end > 0; end = path.rfind('/', end - 1)) {
+            Add(path.substr(0, end), found);
+        }
+        Add("", found);
+    }
+
+    std::unordered_map<std::string, std::vector<std::size_t>> byPath_;
+};
+
+void Count(const QueueEvent &event, const std::string &file, Backlog &backlog) {
+    ++backlog.events[event.type];
+    ++backlog.files[file];
+    backlog.taken += event.taken ? 1 : 0;
+}
+
+}  // namespace
+
+std::vector<Backlog> ReadBacklogs(const std::string &share, const std::vector<std::string> &places) {
     const std::string path = QueuePathOf(share);
     if (path.empty()) {
-        return std::nullopt;
+        return {};
     }
     QueueFiles files(path);
-    Backlog backlog;
-    backlog.hasTemporary = files.IsTaken();
-    backlog.oldest = files.Oldest();
+    const PlaceIndex index(places);
+    std::vector<Backlog> backlogs(places.size());
+    for (auto &backlog : backlogs) {
+        backlog.hasTemporary = files.IsTaken();
+        backlog.oldest = files.Oldest();
+    }
+    unsigned long malformed = 0;
     files.Visit([&](const QueueEvent *event) {
         if (event == nullptr) {
-            ++backlog.malformed;
-        } else if (below.empty() || LiesIn(event->path, below) || LiesIn(event->oldPath, below)) {
-            ++backlog.events[event->type];
+            ++malformed;
+            return;
+        }
+        for (const std::size_t i : index.Of(*event)) {
+            Count(*event, files.Identity(event->taken), backlogs[i]);
         }
     });
-    return backlog;
+    for (auto &backlog : backlogs) {
+        backlog.malformed = malformed;
+    }
+    return backlogs;
+}
+
+std::optional<Backlog> ReadBacklog(const std::string &share, const std::string &below) {
+    const auto backlogs = ReadBacklogs(share, {below});
+    return backlogs.empty() ? std::nullopt : std::optional<Backlog>(backlogs.front());
 }
 
 bool IsReindexQueued(const std::string &share, const std::string &fullPath) {

@@ -8,6 +8,7 @@
 #include <map>
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace fileindexctl {
 
@@ -21,12 +22,20 @@ struct Backlog {
     bool hasTemporary = false;          ///< the daemon is at work on an earlier queue
     std::optional<long long> oldest{};  ///< when the older of the files was made, in seconds since the epoch
 
+    unsigned long taken = 0;  ///< how many of them the daemon is at work on
+
+    /// How many in each file, by its identity (queue_files.h).
+    std::map<std::string, unsigned long> files{};
+
     unsigned long Total() const;
 };
 
 /// The share's queue and its ".tmp" companion; only events at or under `below` when that is not empty (a full
 /// path). Nothing when there is no such share.
 std::optional<Backlog> ReadBacklog(const std::string &share, const std::string &below);
+
+/// The same for several places at once, in the same order. Nothing when there is no such share.
+std::vector<Backlog> ReadBacklogs(const std::string &share, const std::vector<std::string> &places);
 
 /// Is a reindex of exactly this full path queued?
 bool IsReindexQueued(const std::string &share, const std::string &fullPath);

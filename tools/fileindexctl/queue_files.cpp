@@ -109,6 +109,9 @@ QueueFiles::File QueueFiles::Open(const std::string &path) {
     file.size = static_cast<long long>(status.stx_size);
     // A queue is made by the first event that goes into it, so its age is that of the oldest event.
     file.birth = (status.stx_mask & STATX_BTIME) != 0 ? status.stx_btime.tv_sec : status.stx_mtime.tv_sec;
+    file.identity = std::to_string(status.stx_dev_major) + ":" + std::to_string(status.stx_dev_minor) + ":" +
+                    std::to_string(status.stx_ino) + ":" + std::to_string(status.stx_btime.tv_sec) + "." +
+                    std::to_string(status.stx_btime.tv_nsec);
     return file;
 }
 

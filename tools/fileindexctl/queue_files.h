@@ -36,6 +36,10 @@ public:
     /// When the older of the files was made, in seconds since the epoch.
     std::optional<long long> Oldest() const;
 
+    /// Tells the queue, or what was taken of it, from every other file, also from one of the same name before or
+    /// after it. A queue keeps it when it is taken. Empty for a file that is not there.
+    const std::string &Identity(bool taken) const { return (taken ? taken_ : queue_).identity; }
+
     /// Calls the visitor for each line that was there when the files were opened, the oldest first; with null for
     /// a malformed one. Once.
     void Visit(const std::function<void(const QueueEvent *)> &visitor);
@@ -45,6 +49,7 @@ private:
         Descriptor descriptor{};
         long long size = 0;
         std::optional<long long> birth{};
+        std::string identity{};
     };
     static File Open(const std::string &path);
 

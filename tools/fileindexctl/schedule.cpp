@@ -3,6 +3,7 @@
 #include "config_lock.h"
 #include "failure.h"
 #include "handlers.h"
+#include "progress.h"
 #include "steps.h"
 
 #include <fileindex/daemon.h>
@@ -152,17 +153,7 @@ std::string AgeText(const std::optional<long long> &since) {
     if (!since) {
         return "-";
     }
-    const long long seconds = std::max<long long>(0, std::time(nullptr) - *since);
-    constexpr long long minute = 60;
-    constexpr long long hour = 60 * minute;
-    constexpr long long day = 24 * hour;
-    if (seconds < 2 * minute) {
-        return std::to_string(seconds) + " s";
-    }
-    if (seconds < 2 * hour) {
-        return std::to_string(seconds / minute) + " min";
-    }
-    return seconds < 2 * day ? std::to_string(seconds / hour) + " h" : std::to_string(seconds / day) + " days";
+    return DurationText(static_cast<double>(std::max<long long>(0, std::time(nullptr) - *since)));
 }
 
 bool IsPaused(long long resumeTime) {

@@ -1,113 +1,142 @@
-#include "daemon.h"
+// "status": how far indexing is, once or for as long as somebody watches.
 #include "failure.h"
-#include "folder_text.h"
 #include "handlers.h"
-#include "paths.h"
-#include "queue.h"
-#include "records.h"
-#include "schedule.h"
-#include "status_file.h"
+#include "progress.h"
+#include "screen.h"
+#include "status_report.h"
 #include "text.h"
 
-#include <fileindex/indexability.h>
-#include <fileindex/status.h>
-#include <fileindex/status_mgr.h>
-
+#include <array>
+#include <chrono>
+#include <ctime>
+#include <functional>
 #include <map>
-#include <set>
+#include <optional>
+#include <string>
+#include <vector>
 
 namespace fileindexctl {
 
 namespace {
 
-using VORK::FILEINDEX::StatusMgr;
+constexpr unsigned long kInterval = 2;
+constexpr unsigned long kLongestInterval = 86400;
 
-void ShowRows(const std::vector<std::vector<std::string>> &rows, unsigned width, Output &output) {
-    for (const auto &line : Align(rows, width)) {
-        output.Line(line);
-    }
+using Reporter = std::function<StatusReport()>;
+
+double Now() {
+    return std::chrono::duration<double>(std::chrono::steady_clock::now().time_since_epoch()).count();
 }
 
-std::string Listed(const std::vector<std::string> &items) {
-    return items.empty() ? "none" : Enumerate(items);
+void AddProgress(const Progress &progress, StatusReport &report) {
+    auto &data = report.data["progress"];
+    data["left"] = static_cast<Json::UInt64>(progress.Left());
+    data["done"] = static_cast<Json::UInt64>(progress.Done());
+    data["per_second"] = progress.Rate() ? Json::Value(*progress.Rate()) : Json::Value();
+    data["seconds_left"] = progress.SecondsLeft() ? Json::Value(*progress.SecondsLeft()) : Json::Value();
+    data["seconds_without_progress"] = progress.SecondsWithoutProgress();
+    report.data["time"] = static_cast<Json::Int64>(std::time(nullptr));
+    report.facts.push_back({"at work on", report.AtWork()});
+    report.facts.push_back({"progress", progress.Text()});
 }
 
-void ShowService(Output &output) {
-    StatusFile file;
-    std::string state;
-    long long resumeTime = -1;
-    ForgetErrors();
-    if (!file.Load()) {
-        throw FailureOf(file);
+StatusReport Sample(const Reporter &reporter, Progress &progress) {
+    StatusReport report = reporter();
+    std::map<std::string, unsigned long> files;
+    for (const auto &[name, backlog] : report.backlogs) {
+        files.insert(backlog.files.begin(), backlog.files.end());
     }
-    if (!file.GetPauseInfo(resumeTime)) {
-        throw Failure(ExitStatus::Malformed, file.GetPath() + ": \"resume_time\" is no number");
-    }
-    if (!StatusMgr::GetStatus(state)) {
-        state = "unknown";
-        output.Warn("the state cannot be told: " + Records().Last());
-    }
-    const auto noSpace = file.Marked("no_space");
-    const auto needReindex = file.Marked("need_reindex");
-    const DaemonState daemon = ProbeDaemon();
-    auto &data = output.Data();
-    data["status"] = state;
-    data["resume_time"] = static_cast<Json::Int64>(resumeTime);
-    data["daemon"] = daemon.reachable;
-    data["no_space"] = ToArray(noSpace);
-    data["need_reindex"] = ToArray(needReindex);
-    ShowRows({{"state", state},
-              {"pause", PauseText(resumeTime)},
-              {"daemon", daemon.text},
-              {"out of space", Listed(noSpace)},
-              {"to be reindexed", Listed(needReindex)}},
-             0, output);
+    progress.Add(Now(), files);
+    AddProgress(progress, report);
+    return report;
 }
 
-void ShowShares(const Folders &folders, const std::string &only, Output &output) {
-    std::map<std::string, unsigned> shares;
-    for (const auto &folder : folders) {
-        ++shares[ShareOf(folder.path)];
+std::string Clock() {
+    const std::time_t now = std::time(nullptr);
+    std::tm local{};
+    localtime_r(&now, &local);
+    std::array<char, 40> text{};
+    std::strftime(text.data(), text.size(), "%Y-%m-%dT%H:%M:%S%z", &local);
+    return text.data();
+}
+
+// One line, for logs and for programs that read lines.
+std::string Brief(const StatusReport &report, const Progress &progress) {
+    std::vector<std::string> shares;
+    for (const auto &[name, backlog] : report.backlogs) {
+        shares.push_back(name + " " + std::to_string(backlog.Total()));
     }
-    if (!only.empty()) {
-        shares = {{only, shares[only]}};
-    }
-    std::vector<std::vector<std::string>> rows = {{"SHARE", "FOLDERS", "QUEUED", "OLDEST", "EVENTS"}};
-    output.Data()["share"] = Json::Value(Json::arrayValue);
-    for (const auto &[share, count] : shares) {
-        const auto backlog = ReadBacklog(share, "");
-        Json::Value entry(Json::objectValue);
-        entry["name"] = share;
-        entry["folders"] = count;
-        entry["queue"] = backlog ? BacklogJson(*backlog) : Json::Value();
-        output.Data()["share"].append(entry);
-        if (!backlog) {
-            rows.push_back({share, std::to_string(count), "-", "-", "the share is away"});
-            continue;
+    return Printable(Clock() + ": " + report.state + ", " + std::to_string(report.Queued()) + " queued" +
+                     (shares.empty() ? "" : " (" + Enumerate(shares) + ")") + ", at work on " + report.AtWork() +
+                     ", " + progress.Text());
+}
+
+void Draw(const StatusReport &report, unsigned long interval, Screen &screen) {
+    auto lines = report.Lines(Screen::Width());
+    lines.emplace_back();
+    lines.push_back("every " + std::to_string(interval) + " s; Ctrl-C ends it");
+    screen.Draw(lines);
+}
+
+// False when nobody reads it any more.
+bool Write(const StatusReport &report, const Progress &progress, Output &output) {
+    output.Data() = report.data;
+    output.Line(Brief(report, progress));
+    return output.EndSample();
+}
+
+// The signal that is to end the program; 0 to go on.
+int AwaitEnd(const Signals &signals, unsigned long interval, std::optional<Screen> &screen) {
+    const int signal = signals.Await(interval);
+    if (signal == SIGTSTP) {
+        if (screen) {
+            screen->Leave();
         }
-        rows.push_back({share, std::to_string(count), std::to_string(backlog->Total()), AgeText(backlog->oldest),
-                        BacklogText(*backlog) + (backlog->hasTemporary ? " (.tmp present)" : "")});
+        signals.Deliver(signal);
+        if (screen) {
+            screen->Enter();
+        }
     }
-    if (rows.size() > 1) {
-        output.Line("");
-        ShowRows(rows, output.Width(), output);
+    return signal == SIGTSTP || signal == SIGWINCH ? 0 : signal;
+}
+
+// Until the user or the system ends it.
+void Watch(const Reporter &reporter, unsigned long interval, Output &output) {
+    const Signals signals;
+    std::optional<Screen> screen;
+    if (Screen::IsUsable() && !output.IsJson()) {
+        screen.emplace();
+    }
+    Progress progress;
+    int signal = 0;
+    while (signal == 0) {
+        const StatusReport report = Sample(reporter, progress);
+        if (screen) {
+            Draw(report, interval, *screen);
+        } else if (!Write(report, progress, output)) {
+            return;
+        }
+        signal = AwaitEnd(signals, interval, screen);
+    }
+    const bool echoed = screen.has_value();
+    screen.reset();
+    if (echoed) {
+        output.Line("");  // behind the "^C" of the terminal
+    }
+    if (signal != SIGINT) {
+        signals.Deliver(signal);
     }
 }
 
-void ShowFolderProgress(const std::string &given, const Folders &folders, Output &output) {
-    const auto &folder = RequireFolder(given, folders);
-    const std::string full = folder.GetFullPath();
-    Json::Value facts(Json::objectValue);
-    facts["status"] = StatusMgr::GetFolderStatus(folder.path);
-    facts["is_valid"] = VORK::FILEINDEX::CanPathBeIndexed(folder.path);
-    const auto backlog = full.empty() ? std::nullopt : ReadBacklog(ShareOf(folder.path), full);
-    output.Data()["path"] = folder.path;
-    output.Data()["additional"] = facts;
-    output.Data()["queue"] = backlog ? BacklogJson(*backlog) : Json::Value();
-    ShowRows({{"path", folder.path},
-              {"state", StatusText(facts)},
-              {"queued", backlog ? BacklogText(*backlog) : "the share is away"}},
-             0, output);
+unsigned long Interval(const Arguments &arguments) {
+    const unsigned long interval = arguments.Number("--interval", kInterval);
+    if (arguments.Has("--interval") && !arguments.Has("--watch")) {
+        throw Failure(ExitStatus::Usage, "--interval goes with --watch");
+    }
+    if (interval == 0 || interval > kLongestInterval) {
+        throw Failure(ExitStatus::Usage, "--interval: 1 to " + std::to_string(kLongestInterval) + " seconds");
+    }
+    return interval;
 }
 
 }  // namespace
@@ -116,16 +145,20 @@ ExitStatus ShowStatus(const Arguments &arguments, Output &output) {
     if (arguments.Has("PATH") && arguments.Has("--share")) {
         throw Failure(ExitStatus::Usage, "give a path or --share, not both");
     }
-    const Folders folders = ReadFolders();
-    if (arguments.Has("PATH")) {
-        ShowFolderProgress(arguments.One("PATH"), folders, output);
-        return ExitStatus::Done;
+    const unsigned long interval = Interval(arguments);
+    const Reporter reporter = [&] {
+        return arguments.Has("PATH") ? ReportFolder(arguments.One("PATH"))
+                                     : ReportService(arguments.One("--share"), output);
+    };
+    if (!arguments.Has("--watch")) {
+        const StatusReport report = reporter();
+        output.Data() = report.data;
+        for (const auto &line : report.Lines(output.Width())) {
+            output.Line(line);
+        }
+    } else {
+        Watch(reporter, interval, output);
     }
-    if (arguments.Has("--share")) {
-        RequireShare(arguments.One("--share"));
-    }
-    ShowService(output);
-    ShowShares(folders, arguments.One("--share"), output);
     return ExitStatus::Done;
 }
 

@@ -1,0 +1,45 @@
+/// \file
+/// How far indexing is, as a whole or for one folder, at one moment.
+#ifndef FILEINDEXCTL_STATUS_REPORT_H
+#define FILEINDEXCTL_STATUS_REPORT_H
+
+#include "output.h"
+#include "queue.h"
+
+#include <json/value.h>
+
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace fileindexctl {
+
+struct StatusReport {
+    using Rows = std::vector<std::vector<std::string>>;
+
+    std::string state{};  ///< in one word
+    Rows facts{};         ///< what it is, and how it stands
+    Rows shares{};        ///< tables with a head; empty when there is nothing to tell
+    Rows folders{};
+    std::map<std::string, Backlog> backlogs{};  ///< by share or, for a report of one folder, by folder
+    Json::Value data{Json::objectValue};
+
+    unsigned long Queued() const;
+
+    /// "photo: 12 events taken from its queue", "nothing".
+    std::string AtWork() const;
+
+    /// `width` as for Align.
+    std::vector<std::string> Lines(unsigned width) const;
+};
+
+/// Everything or, with a name, one share. Throws Failure.
+StatusReport ReportService(const std::string &onlyShare, Output &output);
+
+/// One indexed folder. Throws Failure.
+StatusReport ReportFolder(const std::string &given);
+
+}  // namespace fileindexctl
+
+#endif
