@@ -69,8 +69,8 @@ int Seeds(const std::string &dir) {
         {"json_differential", &NearValid::Document},
         {"queue_file", &NearValid::Queue},
         {"folder_conf", &NearValid::FolderConf},
-        {"status_conf", &NearValid::StatusConf},
-        {"requests", &NearValid::Request},
+        {"status_conf", &NearValid::Document},
+        {"requests", &NearValid::FolderConf},
         {"paths", &NearValid::QueueLine},
         {"operations", &NearValid::Queue},
     };
@@ -89,8 +89,9 @@ int Seeds(const std::string &dir) {
                              "resume_time", "no_space", "need_reindex"}) {
         dictionary << "\"\\\"" << word << "\\\":\"\n";
     }
-    for (const char *word : {"/photo", "/a/d", "/b", "/ro", "/away", "/vol1/a", "@eaDir", "#recycle", "#snapshot",
-                             "65536", "true", "false", "null", "\\\\ud83d", "\\xef\\xbb\\xbf"}) {
+    for (const char *word :
+         {"/photo", "/a/d", "/b", "/ro", "/away", "/vol1/a", "@eaDir", "/vol1/a/#recycle", "/vol1/a/#snapshot",
+          "65536", "true", "false", "null", "\\\\ud83d", "\\xef\\xbb\\xbf"}) {
         dictionary << '"' << word << "\"\n";
     }
     return dictionary.good() ? 0 : 1;

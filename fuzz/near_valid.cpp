@@ -25,7 +25,6 @@ constexpr std::string_view kPieces[] = {
 // clang-format on
 constexpr std::string_view kLiterals[] = {"true", "false", "null", "True", "NaN", "Infinity", "-Infinity", "nul"};
 constexpr std::string_view kPaths[] = {"/photo/2015", "/a/d", "/a", "/b/d/e", "/ro/d", "/away/x", "/", "", "a"};
-constexpr std::string_view kNames[] = {"a", "b", "photo", "ro", "away", "upgrade_1", "", "x y"};
 constexpr std::string_view kRecordKeys[] = {"name", "document", "audio", "video", "photo"};
 constexpr std::string_view kTails[] = {",",  "}",    "]", "x",  " 1",
                                        "//", "/**/", "#", "\n", std::string_view("\0", 1)};
@@ -141,33 +140,6 @@ std::string NearValid::FolderConf() {
             return Quoted(OneIn(8) ? OneOf(kPaths) : std::string("/photo/") + next);
         },
         [&] { return OneIn(15) ? Value(2) : Record(OneIn(2)); }));
-}
-
-std::string NearValid::Flags() {
-    return OneIn(8) ? Value(2)
-                    : Object(
-                          Below(4), [&] { return Quoted(OneOf(kNames)); },
-                          [&] { return std::string(OneIn(6) ? "false" : "true"); });
-}
-
-std::string NearValid::StatusConf() {
-    constexpr std::string_view kKeys[] = {"resume_time", "no_space", "need_reindex", "upgrade_1"};
-    std::string_view key;
-    return Spoil(Object(
-        Below(5),
-        [&] {
-            key = OneOf(kKeys);
-            return Quoted(key);
-        },
-        [&] { return key == "resume_time" ? Number() : Flags(); }));
-}
-
-std::string NearValid::Request() {
-    std::string array = "[";
-    for (std::size_t left = Below(5); left > 0; --left) {
-        array += (OneIn(10) ? Value(3) : OneIn(2) ? Quoted(OneOf(kPaths)) : Record(true)) + (left > 1 ? "," : "");
-    }
-    return Spoil(array + ']');
 }
 
 std::string NearValid::Document() {

@@ -19,8 +19,6 @@ public:
     std::string Document();    ///< any value
     std::string QueueLine();   ///< an event, without its newline
     std::string FolderConf();  ///< folder records by path
-    std::string StatusConf();
-    std::string Request();  ///< what IndexMgr's changes are given
 
     /// Some lines.
     std::string Queue();
@@ -41,7 +39,6 @@ private:
     template <typename Key, typename Content>
     std::string Object(std::size_t members, Key key, Content content);
     std::string Record(bool withPath);
-    std::string Flags();
     std::string Spoil(std::string text);
 
     std::mt19937_64 random_;

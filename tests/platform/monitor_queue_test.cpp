@@ -3,14 +3,11 @@
 
 #include <vorknotifyd/monitor_queue.h>
 
-#include <json/json.h>
-
 #include <fcntl.h>
 #include <sys/file.h>
 
-#include <sstream>
-
 using platform_test::Fork;
+using platform_test::Parse;
 using platform_test::ReadText;
 using platform_test::WaitFor;
 using platform_test::WriteFile;
@@ -22,12 +19,6 @@ namespace {
 
 const std::string kDirectory = "/usr/vork/etc/vorknotifyd";
 const std::string kFile = kDirectory + "/registrations.json";
-
-Json::Value Parse(const std::string &text) {
-    Json::Value value;
-    std::istringstream(text) >> value;
-    return value;
-}
 
 Json::Value Description(const std::string &queue, const std::string &path) {
     Json::Value watch;

@@ -4,27 +4,18 @@
 #include <vork/search.h>
 #include <vork/share.h>
 
-#include <json/json.h>
-
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
 
-#include <sstream>
-
 using platform_test::Fork;
 using platform_test::kConfiguration;
+using platform_test::Parse;
 using platform_test::ReadText;
 using platform_test::WaitFor;
 using platform_test::WriteFile;
 
 namespace {
-
-Json::Value Parse(const std::string &text) {
-    Json::Value value;
-    std::istringstream(text) >> value;
-    return value;
-}
 
 class SearchSettingTest : public testing::Test {
 protected:

@@ -3,8 +3,6 @@
 
 #include <vork/share.h>
 
-#include <gmock/gmock.h>
-
 #include <dlfcn.h>
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -12,7 +10,6 @@
 #include <atomic>
 #include <cstdarg>
 #include <cstring>
-#include <thread>
 
 using platform_test::kConfiguration;
 using platform_test::WriteFile;
@@ -226,28 +223,6 @@ TEST_F(SharesTest, ReadsTheFileOnceForAThousandShares) {
         ASSERT_EQ(HolderOf("/vol1/" + name + "/x"), name + " /vol1/" + name);
     }
     EXPECT_EQ(configurationReads, before);
-}
-
-TEST_F(SharesTest, AnswersManyThreadsWhileTheFileChanges) {
-    Configure(R"({"photo": {"path": "/vol1/photo"}})");
-    std::atomic<bool> done{false};
-    std::vector<std::thread> readers;
-    for (int i = 0; i < 4; ++i) {
-        readers.emplace_back([&done] {
-            while (!done) {
-                EXPECT_THAT(PathOf("photo"), testing::AnyOf("/vol1/photo", "/vol22/photo"));
-            }
-        });
-    }
-    for (int i = 0; i < 200; ++i) {
-        WriteFile(kConfiguration + ".new", i % 2 == 0 ? R"({"shares": {"photo": {"path": "/vol22/photo"}}})"
-                                                      : R"({"shares": {"photo": {"path": "/vol1/photo"}}})");
-        std::filesystem::rename(kConfiguration + ".new", kConfiguration);
-    }
-    done = true;
-    for (std::thread &reader : readers) {
-        reader.join();
-    }
 }
 
 TEST(NullArguments, AreRefused) {

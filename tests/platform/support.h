@@ -6,6 +6,7 @@
 #include <vork/error.h>
 
 #include <gtest/gtest.h>
+#include <json/json.h>
 
 #include <sys/mount.h>
 #include <sys/wait.h>
@@ -16,6 +17,7 @@
 #include <fstream>
 #include <functional>
 #include <iterator>
+#include <sstream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -34,6 +36,12 @@ inline void WriteFile(const std::string &path, const std::string &text) {
 inline std::string ReadText(const std::string &path) {
     std::ifstream file(path, std::ios::binary);
     return {std::istreambuf_iterator<char>(file), {}};
+}
+
+inline Json::Value Parse(const std::string &text) {
+    Json::Value value;
+    std::istringstream(text) >> value;
+    return value;
 }
 
 /// The JSON example in the platform's README that holds the text.

@@ -1,5 +1,4 @@
 // Eight processes change both configuration files at once, and some of them are killed.
-#include "calls.h"
 #include "harness.h"
 #include "scenarios.h"
 
@@ -64,7 +63,7 @@ void Insist(Board &board, Operation operation) {
 }
 
 void Work(Board &board, int worker, int firstFolder, int markers) {
-    TheHooks().write = [&board, worker](int fd, const void *data, size_t size) {
+    WriteHook() = [&board, worker](int fd, const void *data, size_t size) {
         if (size <= kPage) {
             return RealWrite(fd, data, size);
         }

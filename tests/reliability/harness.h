@@ -85,6 +85,10 @@ Object &Shared() {
     return *new (SharedMemory(sizeof(Object))) Object();
 }
 
+/// Called in the place of `write` in this process, the library's own calls included; none at first.
+std::function<ssize_t(int fd, const void *data, size_t size)> &WriteHook();
+ssize_t RealWrite(int fd, const void *data, size_t size);
+
 /// Shares photo and music, the services and the notification tool; no configuration, no queue.
 void MakeMachine(bool search = true);
 

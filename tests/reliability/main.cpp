@@ -12,7 +12,6 @@ int main(int count, char **arguments) {
         std::function<void()> run;
     } scenarios[] = {
         {"full-disk", [&] { FullDisk(argument); }},
-        {"faults", Faults},
         {"kills", [&] { Kills(argument); }},
         {"readers", Readers},
         {"adders", Adders},

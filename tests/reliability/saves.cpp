@@ -1,6 +1,4 @@
-// Saving a configuration file while the disk is full, while calls fail, while the writer is killed, while others
-// read.
-#include "calls.h"
+// Saving a configuration file while the disk is full, while the writer is killed, while others read.
 #include "harness.h"
 #include "scenarios.h"
 
@@ -8,8 +6,6 @@
 #include <unistd.h>
 
 #include <atomic>
-#include <cerrno>
-#include <csignal>
 #include <fstream>
 #include <random>
 
@@ -70,107 +66,6 @@ void FillDisk(const std::string &path, int blocksLeft) {
         size += static_cast<long>(block.size());
     }
     Check(::truncate(path.c_str(), std::max(0L, size - 4096L * blocksLeft)) == 0, "truncate");
-}
-
-/// A failed save: the result, the code, the old bytes, no descriptor.
-void SaveMustFail(Document &document, int number, size_t size, const std::string &what) {
-    const auto old = ReadFile(kFolderConf);
-    const SameDescriptors sameDescriptors;
-    Check(Fails([&] { return document.SaveNumber(number, size); }, FILEINDEX_ERR_SAVE_JSON), what + ": code 7");
-    Check(ReadFile(kFolderConf) == old, what + ": the old bytes");
-}
-
-/// Hands a call on so that it does only `size` bytes of its work.
-ssize_t WriteUpTo(int fd, const void *data, size_t size, size_t upTo) {
-    return RealWrite(fd, data, std::min(size, upTo));
-}
-
-ssize_t FailWith(int error) {
-    errno = error;
-    return -1;
-}
-
-/// How the one write of a save goes wrong after `done` bytes of it.
-struct WriteFault {
-    const char *name;
-    ssize_t (*write)(int fd, const void *data, size_t size, size_t done);
-};
-
-constexpr WriteFault kWriteFaults[] = {
-    {"short write",
-     [](int fd, const void *data, size_t size, size_t done) { return WriteUpTo(fd, data, size, done); }},
-    {"I/O error",
-     [](int fd, const void *data, size_t size, size_t done) {
-         WriteUpTo(fd, data, size, done);
-         return FailWith(EIO);
-     }},
-    {"no space", [](int, const void *, size_t, size_t) { return FailWith(ENOSPC); }},
-};
-
-/// The way back is no smooth one either: it is interrupted, and takes a page at a time.
-void RoughenRestore() {
-    TheHooks().pwrite = [calls = 0](int fd, const void *data, size_t size, off_t offset) mutable -> ssize_t {
-        if (++calls % 2 == 1) {
-            return FailWith(EINTR);
-        }
-        Check(::lseek(fd, offset, SEEK_SET) == offset, "lseek");
-        return WriteUpTo(fd, data, size, 4096);
-    };
-}
-
-/// Once: the call after it is let through.
-template <typename Hook>
-void FailOnce(Hook &hook, int error) {
-    hook = [&hook, error](auto...) {
-        hook = nullptr;
-        return static_cast<int>(FailWith(error));
-    };
-}
-
-int WriteFaults(Document &document, size_t oldSize, size_t newSize) {
-    constexpr size_t kBlock = 4096;
-    int failures = 0;
-    for (const WriteFault &fault : kWriteFaults) {
-        for (size_t done = 0; done <= std::max(oldSize, newSize); done += kBlock) {
-            Check(document.SaveNumber(1, oldSize), "save before the fault");
-            TheHooks().write = [&](int fd, const void *data, size_t size) {
-                return fault.write(fd, data, size, done);
-            };
-            RoughenRestore();
-            SaveMustFail(document, 2, newSize, std::string(fault.name) + " after " + std::to_string(done));
-            TheHooks() = {};
-            ++failures;
-        }
-    }
-    return failures;
-}
-
-int OtherFaults(Document &document, size_t size) {
-    const struct {
-        const char *name;
-        void (*arm)();
-        size_t newSize;
-        bool saved;
-    } rows[] = {
-        {"reservation: disk full", [] { FailOnce(TheHooks().fallocate, ENOSPC); }, size * 2, false},
-        {"reservation: I/O error", [] { FailOnce(TheHooks().fallocate, EIO); }, size * 2, false},
-        {"reservation: interrupted", [] { FailOnce(TheHooks().fallocate, EINTR); }, size * 2, true},
-        {"reservation: not supported", [] { FailOnce(TheHooks().fallocate, EOPNOTSUPP); }, size * 2, true},
-        {"new length: I/O error", [] { FailOnce(TheHooks().ftruncate, EIO); }, size / 2, false},
-    };
-    int failures = 0;
-    for (const auto &row : rows) {
-        Check(document.SaveNumber(1, size), "save before the fault");
-        row.arm();
-        if (row.saved) {
-            Check(document.SaveNumber(2, row.newSize), row.name);
-        } else {
-            SaveMustFail(document, 2, row.newSize, row.name);
-            ++failures;
-        }
-        TheHooks() = {};
-    }
-    return failures;
 }
 
 /// Saves ever new documents until it is killed; `saved` is the last one that was acknowledged.
@@ -300,17 +195,6 @@ void FullDisk(const std::string &fileSystem) {
     Check(failures > rounds, "the disk was hardly ever full");
     Figure("full disk, " + fileSystem, std::to_string(failures) + " failed saves: old bytes each time, then " +
                                            std::to_string(rounds) + " good ones");
-}
-
-void Faults() {
-    constexpr size_t kSize = 153600;
-    Document document;
-    int failures = OtherFaults(document, kSize);
-    for (const size_t oldSize : {kSize / 2, kSize, kSize * 2}) {
-        failures += WriteFaults(document, oldSize, kSize);
-    }
-    Figure("faults in a save of 150 KiB, at every block",
-           std::to_string(failures) + " failed saves: code 7 and the old bytes each time");
 }
 
 void Kills(const std::string &fileSystem) {

@@ -8,7 +8,6 @@ namespace reliability {
 
 // Saving a configuration file.
 void FullDisk(const std::string &fileSystem);
-void Faults();
 void Kills(const std::string &fileSystem);
 void Readers();
 

@@ -1,5 +1,4 @@
 // The command socket: a daemon in every mood, and the writer's loop against a model of it.
-#include "calls.h"
 #include "harness.h"
 #include "scenarios.h"
 
@@ -142,13 +141,13 @@ void TryMood(const Mood &mood) {
         ::close(fd);
     });
     ::close(listener);
-    TheHooks().write = [](int fd, const void *data, size_t size) {
+    WriteHook() = [](int fd, const void *data, size_t size) {
         const ssize_t result = RealWrite(fd, data, size);
         FailedWrites() += result < 0 ? 1 : 0;
         return result;
     };
     SendMust(mood.sent, mood.bodySize, mood.name);
-    TheHooks() = {};
+    WriteHook() = nullptr;
     Check(Wait(peer) == 0, "the peer failed");
     Check(AreRight(mood.bytes, ReadFile(kReceived).value_or("?"), FrameOf(mood.bodySize)),
           std::string(mood.name) + ": the bytes");
@@ -250,11 +249,11 @@ Transcript Model(unsigned seed, size_t bodySize) {
 Transcript Library(unsigned seed, size_t bodySize) {
     Dice dice(seed);
     Transcript transcript;
-    TheHooks().write = [&](int, const void *data, size_t size) {
+    WriteHook() = [&](int, const void *data, size_t size) {
         return transcript.Play(dice, static_cast<const char *>(data), size);
     };
     transcript.sent = Send(bodySize);
-    TheHooks() = {};
+    WriteHook() = nullptr;
     return transcript;
 }
 

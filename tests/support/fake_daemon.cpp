@@ -2,25 +2,22 @@
 
 #include "script.h"
 
-#include <sys/socket.h>
+#include <fcntl.h>
 #include <sys/un.h>
 #include <unistd.h>
 
 #include <array>
-#include <chrono>
+#include <cerrno>
 #include <cstdint>
-#include <cstdlib>
 #include <cstring>
 
 namespace fileindex_test {
 namespace {
 
-constexpr char kSocket[] = "/var/run/fileindexd.sock";
-
 std::string ReadToEnd(int fd) {
     std::string all;
     std::array<char, 4096> buffer{};
-    for (ssize_t got = 0; (got = ::recv(fd, buffer.data(), buffer.size(), 0)) > 0;) {
+    for (ssize_t got = 0; (got = ::read(fd, buffer.data(), buffer.size())) > 0;) {
         all.append(buffer.data(), static_cast<size_t>(got));
     }
     return all;
@@ -41,73 +38,56 @@ std::string Decode(const std::string &frame) {
 
 }  // namespace
 
+FakeDaemon *FakeDaemon::listening = nullptr;
+
 FakeDaemon::~FakeDaemon() {
     Stop();
 }
 
-void FakeDaemon::Start(Mood mood) {
-    ::unlink(kSocket);
-    listener_ = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
-    sockaddr_un address{};
-    address.sun_family = AF_UNIX;
-    std::memcpy(address.sun_path, kSocket, sizeof kSocket);
-    if (::bind(listener_, reinterpret_cast<const sockaddr *>(&address), sizeof address) != 0 ||
-        ::listen(listener_, mood == Mood::kDeaf ? 0 : 64) != 0) {
-        std::abort();
-    }
-    if (mood == Mood::kDeaf) {
-        return;
-    }
-    thread_ = std::thread([this, mood] { Serve(mood); });
-    if (mood == Mood::kCollecting) {
-        Script::Current().OnHangUp([this] { AwaitAll(); });
-    }
+void FakeDaemon::Start(bool hangsUp) {
+    listening = this;
+    hangs_up_ = hangsUp;
 }
 
 void FakeDaemon::Stop() {
-    if (listener_ < 0) {
-        return;
-    }
-    Script::Current().OnHangUp(nullptr);
-    ::shutdown(listener_, SHUT_RDWR);  // ends the thread's accept
-    if (thread_.joinable()) {
-        thread_.join();
-    }
-    ::close(listener_);
-    ::unlink(kSocket);
-    listener_ = -1;
+    listening = nullptr;
 }
 
-void FakeDaemon::Serve(Mood mood) {
-    for (int fd = -1; (fd = ::accept4(listener_, nullptr, nullptr, SOCK_CLOEXEC)) >= 0;) {
-        const std::string frame = mood == Mood::kCollecting ? ReadToEnd(fd) : "";
-        ::close(fd);
-        Script::Current().Record("command " + Decode(frame));
-        const std::lock_guard guard(mutex_);
-        frames_.push_back(frame);
-        served_.notify_all();
-    }
-}
-
-/// Keeps the caller waiting until what it has sent is in the journal, so that the journal's order is that of
-/// the calls.
-void FakeDaemon::AwaitAll() {
-    std::unique_lock lock(mutex_);
-    ++hung_up_;
-    served_.wait_for(lock, std::chrono::seconds(30), [this] { return frames_.size() >= hung_up_; });
-}
-
-std::vector<std::string> FakeDaemon::Frames() {
-    const std::lock_guard guard(mutex_);
-    return frames_;
-}
-
-std::vector<std::string> FakeDaemon::Commands() {
+std::vector<std::string> FakeDaemon::Commands() const {
     std::vector<std::string> commands;
-    for (const std::string &frame : Frames()) {
+    for (const std::string &frame : frames_) {
         commands.push_back(Decode(frame));
     }
     return commands;
+}
+
+int FakeDaemon::Connect(int fd, const sockaddr *address) {
+    const char *path = reinterpret_cast<const sockaddr_un *>(address)->sun_path;
+    std::array<int, 2> ends{};
+    if (listening == nullptr || std::strcmp(path, "/var/run/fileindexd.sock") != 0) {
+        errno = ECONNREFUSED;
+        return -1;
+    }
+    if (::socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, ends.data()) != 0 ||
+        ::dup3(ends[0], fd, O_CLOEXEC) < 0) {
+        return -1;
+    }
+    ::close(ends[0]);
+    if (listening->hangs_up_) {
+        return ::close(ends[1]);
+    }
+    listening->far_ends_[fd] = ends[1];
+    return 0;
+}
+
+void FakeDaemon::Closed(int fd) {
+    if (listening == nullptr || !listening->far_ends_.contains(fd)) {
+        return;
+    }
+    const int end = listening->far_ends_.extract(fd).mapped();
+    listening->frames_.push_back(ReadToEnd(end));
+    Script::Current().Record("command " + Decode(listening->frames_.back()));
+    ::close(end);
 }
 
 }  // namespace fileindex_test

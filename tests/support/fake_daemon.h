@@ -1,46 +1,42 @@
 /// \file
-/// The indexing daemon's end of the command socket.
+/// The indexing daemon's end of the command socket, in the same thread: a connection is read when it has been
+/// closed.
 #pragma once
 
-#include <condition_variable>
-#include <mutex>
+#include <sys/socket.h>
+
+#include <map>
 #include <string>
-#include <thread>
 #include <vector>
 
 namespace fileindex_test {
 
 class FakeDaemon {
 public:
-    enum class Mood {
-        kCollecting,  ///< reads every connection to its end
-        kHangingUp,   ///< closes every connection unread
-        kDeaf         ///< lets callers connect until the backlog is full, and never answers
-    };
-
     FakeDaemon() = default;
     ~FakeDaemon();
     FakeDaemon(const FakeDaemon &) = delete;
     FakeDaemon &operator=(const FakeDaemon &) = delete;
 
-    void Start(Mood mood = Mood::kCollecting);
+    /// Listens from now on; `hangsUp`: closes every connection at once.
+    void Start(bool hangsUp = false);
     void Stop();
 
     /// What each connection brought, byte for byte.
-    std::vector<std::string> Frames();
+    const std::vector<std::string> &Frames() const { return frames_; }
     /// The JSON text of each connection's frame; "malformed: ..." for one that is not length, text and NUL.
-    std::vector<std::string> Commands();
+    std::vector<std::string> Commands() const;
+
+    /// In the place of `connect`, and after `close`.
+    static int Connect(int fd, const sockaddr *address);
+    static void Closed(int fd);
 
 private:
-    void Serve(Mood mood);
-    void AwaitAll();
+    static FakeDaemon *listening;
 
-    int listener_ = -1;
-    std::thread thread_;
-    std::mutex mutex_;
-    std::condition_variable served_;
+    bool hangs_up_ = false;
+    std::map<int, int> far_ends_;  ///< by the caller's end
     std::vector<std::string> frames_;
-    size_t hung_up_ = 0;
 };
 
 }  // namespace fileindex_test

@@ -20,6 +20,7 @@
 
 #include <cerrno>
 #include <cstdio>
+#include <cstdlib>
 #include <filesystem>
 #include <stdexcept>
 #include <string>
@@ -38,7 +39,7 @@ Platform &World() {
 }
 
 /// The scripted result of a call if it is to fail, with the platform's error set as a real one would.
-std::optional<long> Failure(const char *call, const std::string &about = {}) {
+std::optional<int> Failure(const char *call, const std::string &about = {}) {
     const auto fault = Script::Current().Take(call, about);
     if (!fault) {
         return std::nullopt;
@@ -46,13 +47,13 @@ std::optional<long> Failure(const char *call, const std::string &about = {}) {
     if (fault->result <= 0) {
         VLIBCErrSetEx(fault->error, "platform.c", 77);
     }
-    return fault->result;
+    return static_cast<int>(fault->result);
 }
 
 /// A call that changes something: one line of the journal, unless it is to fail.
 int Effect(const char *call, const std::string &about, const std::string &line) {
     if (const auto result = Failure(call, about)) {
-        return static_cast<int>(*result);
+        return *result;
     }
     Script::Current().Record(line);
     return 0;
@@ -79,7 +80,7 @@ struct ShareRecord : _tag_VORKSHARE {
 
 int ShareFlag(const _tag_VORKSHARE *share, const char *call, bool FakeShare::*flag, int *out) {
     if (const auto result = Failure(call, share->szName)) {
-        return static_cast<int>(*result);
+        return *result;
     }
     *out = World().shares.at(share->szName).*flag ? 1 : 0;
     return 0;
@@ -97,7 +98,7 @@ int VORKShareGet(const char *szName, _tag_VORKSHARE **ppShare) {
         if (*result == 0) {
             *ppShare = nullptr;
         }
-        return static_cast<int>(*result);
+        return *result;
     }
     const auto found = World().shares.find(szName);
     if (found == World().shares.end()) {
@@ -123,7 +124,7 @@ void VORKShareFree(_tag_VORKSHARE *pShare) {
 
 int VORKShareNamePathGet(const char *szFullPath, char *szName, int cbName, char *szPath, int cbPath) {
     if (const auto result = Failure("VORKShareNamePathGet", szFullPath)) {
-        return static_cast<int>(*result);
+        return *result;
     }
     for (const auto &[name, share] : World().shares) {
         if ((std::string(szFullPath) + "/").starts_with(share.path + "/")) {
@@ -137,10 +138,8 @@ int VORKShareNamePathGet(const char *szFullPath, char *szName, int cbName, char 
 }
 
 int VORKShareIsShareRecycle(const char *szFullPath) {
-    if (const auto result = Failure("VORKShareIsShareRecycle", szFullPath)) {
-        return static_cast<int>(*result);
-    }
-    return StartsWithAny(szFullPath, World().recycleBins) ? 2 : 0;
+    return Failure("VORKShareIsShareRecycle", szFullPath)
+        .value_or(StartsWithAny(szFullPath, World().recycleBins) ? 2 : 0);
 }
 
 int VLIBShareIsEncryptedGet(const _tag_VORKSHARE *pShare, int *pEncrypted) {
@@ -160,7 +159,7 @@ int VORKGetFSType(const char *szPath, int flags) {
         throw std::logic_error("VORKGetFSType: flags");
     }
     if (const auto result = Failure("VORKGetFSType", szPath)) {
-        return static_cast<int>(*result);
+        return *result;
     }
     for (const auto &[beginning, type] : World().fsTypes) {
         if (std::string(szPath).starts_with(beginning)) {
@@ -171,39 +170,33 @@ int VORKGetFSType(const char *szPath, int flags) {
 }
 
 int VORKFSIsRemoteFS(int type) {
-    return static_cast<int>(Failure("VORKFSIsRemoteFS").value_or(type == kRemoteFs ? 1 : 0));
+    return Failure("VORKFSIsRemoteFS").value_or(type == kRemoteFs ? 1 : 0);
 }
 
 int VORKFSIsImageFS(int type) {
-    return static_cast<int>(Failure("VORKFSIsImageFS").value_or(type == kImageFs ? 1 : 0));
+    return Failure("VORKFSIsImageFS").value_or(type == kImageFs ? 1 : 0);
 }
 
 int VORKFSDirIsMntPoint(const char *szPath) {
-    if (const auto result = Failure("VORKFSDirIsMntPoint", szPath)) {
-        return static_cast<int>(*result);
-    }
-    return World().mountPoints.contains(szPath) ? 1 : 0;
+    return Failure("VORKFSDirIsMntPoint", szPath).value_or(World().mountPoints.contains(szPath) ? 1 : 0);
 }
 
 int VLIBFhsPathInSnapshot(const char *szPath, int *pInSnapshot) {
     if (const auto result = Failure("VLIBFhsPathInSnapshot", szPath)) {
         *pInSnapshot = 1;  // what a failed call leaves behind is not to be believed
-        return static_cast<int>(*result);
+        return *result;
     }
     *pInSnapshot = StartsWithAny(szPath, World().snapshots) ? 1 : 0;
     return 0;
 }
 
 int VORKEAIsHiddenDir(const char *szName) {
-    if (const auto result = Failure("VORKEAIsHiddenDir", szName)) {
-        return static_cast<int>(*result);
-    }
-    return std::string(szName) == "@eaDir" ? 1 : 0;
+    return Failure("VORKEAIsHiddenDir", szName).value_or(std::string(szName) == "@eaDir" ? 1 : 0);
 }
 
 int VORKEAMKDir(int flags, const char *szPath) {
     if (const auto result = Failure("VORKEAMKDir", szPath)) {
-        return static_cast<int>(*result);
+        return *result;
     }
     return flags == 0 && (::mkdir(szPath, 0755) == 0 || errno == EEXIST) ? 0 : -1;
 }
@@ -211,7 +204,7 @@ int VORKEAMKDir(int flags, const char *szPath) {
 int VORKQuotaIsEnough(unsigned int uid, const char *szPath, unsigned long long cbRequired) {
     const std::string question =
         std::to_string(uid) + " " + std::string(szPath) + " " + std::to_string(cbRequired);
-    return static_cast<int>(Failure("VORKQuotaIsEnough", question).value_or(1));
+    return Failure("VORKQuotaIsEnough", question).value_or(1);
 }
 
 int VLIBServiceStart(const char *szName, int flag) {
@@ -227,7 +220,7 @@ int VLIBServiceRestart(const char *szName) {
 }
 
 int VORKSMBIsEnableSpotlight(void) {
-    return static_cast<int>(Failure("VORKSMBIsEnableSpotlight").value_or(World().searchOn ? 5 : 0));
+    return Failure("VORKSMBIsEnableSpotlight").value_or(World().searchOn ? 5 : 0);
 }
 
 int VORKSMBSetSpotlight(int enable) {
@@ -262,8 +255,15 @@ int VLIBCExec(const char *szProgram, const char *arg1, const char *arg2, const c
         line += argument != nullptr ? " " + std::string(argument) : "";
     }
     const int result = Effect("VLIBCExec", line, line);
-    if (result == 0 && line.starts_with("exec /bin/rm -rf ")) {
-        std::filesystem::remove_all(arg2);
+    if (result == 0) {
+        const std::string path = arg2;
+        const auto is = [&](const char *end) { return path.ends_with(std::string("/@eaDir/VORK@") + end); };
+        if (line != "exec /bin/rm -rf " + path ||
+            !(is("file_index_queue") || is("file_index_queue.tmp") || is(".fileindexdb"))) {
+            std::fprintf(stderr, "not to be run: %s\n", line.c_str());
+            std::abort();
+        }
+        std::filesystem::remove_all(path);
     }
     return result;
 }

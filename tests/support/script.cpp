@@ -87,20 +87,4 @@ void Script::ClearJournal() {
     journal_.clear();
 }
 
-void Script::OnHangUp(std::function<void()> listener) {
-    const std::lock_guard guard(mutex_);
-    hang_up_ = std::move(listener);
-}
-
-void Script::HungUp() {
-    std::function<void()> listener;
-    {
-        const std::lock_guard guard(mutex_);
-        listener = hang_up_;
-    }
-    if (listener) {
-        listener();
-    }
-}
-
 }  // namespace fileindex_test

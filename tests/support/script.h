@@ -50,10 +50,6 @@ public:
     [[nodiscard]] std::vector<std::string> Journal() const;
     void ClearJournal();
 
-    /// Called with the descriptor after a connection to a socket has been closed.
-    void OnHangUp(std::function<void()> listener);
-    void HungUp();
-
     /// Fixed answers of time() and rand(), while set.
     std::optional<long> now;
     std::optional<int> random;
@@ -68,7 +64,6 @@ private:
     std::vector<Rule> rules_;
     std::vector<std::pair<std::string, std::string>> calls_;
     std::vector<std::string> journal_;
-    std::function<void()> hang_up_;
 };
 
 }  // namespace fileindex_test

@@ -2,6 +2,7 @@
 // What is not to fail goes on to the C library.
 #undef _FORTIFY_SOURCE  // its inline open and realpath would clash with the definitions below
 
+#include "fake_daemon.h"
 #include "script.h"
 
 #include <dlfcn.h>
@@ -17,9 +18,7 @@
 #include <cstdarg>
 #include <cstdlib>
 #include <ctime>
-#include <mutex>
 #include <new>
-#include <set>
 #include <string>
 
 using fileindex_test::Script;
@@ -72,27 +71,6 @@ void RecordLock(const std::string &path, int operation) {
                                                         : "lock " + name + (exclusive ? " exclusive" : " shared"));
 }
 
-class Connections {
-public:
-    void Add(int fd) {
-        const std::lock_guard guard(mutex_);
-        descriptors_.insert(fd);
-    }
-    bool Remove(int fd) {
-        const std::lock_guard guard(mutex_);
-        return descriptors_.erase(fd) != 0;
-    }
-
-private:
-    std::mutex mutex_;
-    std::set<int> descriptors_;
-};
-
-Connections &OpenConnections() {
-    static auto &connections = *new Connections;  // for ever, as the script
-    return connections;
-}
-
 /// `position`: the offset, for pwrite.
 template <typename... Position>
 ssize_t Write(const char *name, int fd, const void *data, size_t size, Position... position) {
@@ -126,12 +104,9 @@ int open(const char *path, int flags, ...) {
 
 /// A close that fails has closed all the same.
 int close(int fd) {
-    const bool connection = OpenConnections().Remove(fd);
     const auto fault = Script::Current().Take("close", PathOf(fd));
     const int result = CallNext<int>("close", fd);
-    if (connection) {
-        Script::Current().HungUp();
-    }
+    fileindex_test::FakeDaemon::Closed(fd);
     if (fault) {
         errno = fault->error;
         return -1;
@@ -155,7 +130,7 @@ int flock(int fd, int operation) noexcept {
     const std::string path = PathOf(fd);
     const int result = Call<int>("flock", path, fd, operation);
     const int error = errno;
-    if (result == 0) {
+    if (result == 0 || (operation & LOCK_UN) != 0) {  // what closes the file unlocks it all the same
         RecordLock(path, operation);
     }
     errno = error;
@@ -200,11 +175,11 @@ int socket(int domain, int type, int protocol) noexcept {
 }
 
 int connect(int fd, const struct sockaddr *address, socklen_t length) {
-    const int result = Call<int>("connect", std::to_string(length), fd, address, length);
-    if (result == 0) {
-        OpenConnections().Add(fd);
+    if (const auto fault = Script::Current().Take("connect", std::to_string(length))) {
+        errno = fault->error;
+        return -1;
     }
-    return result;
+    return fileindex_test::FakeDaemon::Connect(fd, address);
 }
 
 int setsockopt(int fd, int level, int option, const void *value, socklen_t length) noexcept {

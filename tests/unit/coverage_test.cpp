@@ -116,13 +116,5 @@ TEST_F(Coverage, AnswersNoToANullPointer) {
     EXPECT_EQ(0, FILEIDXIsShareIndexed(nullptr));
 }
 
-TEST_F(Coverage, TakesNoLock) {
-    const LockAgent writer(kFolderLock);
-    EXPECT_TRUE(IndexMgr::IsPathIndexed("/photo/2019"));
-    EXPECT_TRUE(IndexMgr::IsFullPathIndexed("/vol1/photo/2019"));
-    EXPECT_TRUE(IndexMgr::IsShareIndexed("photo"));
-    EXPECT_EQ(0, Script::Current().Calls("flock", kFolderLock));
-}
-
 }  // namespace
 }  // namespace fileindex_test

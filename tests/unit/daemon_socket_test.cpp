@@ -2,8 +2,6 @@
 #include "fixture.h"
 
 #include <sys/socket.h>
-#include <sys/un.h>
-#include <unistd.h>
 
 #include <cerrno>
 #include <csignal>
@@ -119,20 +117,9 @@ TEST_F(DaemonSocket, AWriteOfMinusOneMovesBackByOneByte) {
 
 TEST_F(DaemonSocket, IgnoresTheSignalOfADaemonThatHangsUp) {
     ASSERT_NE(SIG_ERR, std::signal(SIGPIPE, SIG_DFL));
-    daemon_.Start(FakeDaemon::Mood::kHangingUp);
+    daemon_.Start(/*hangsUp=*/true);
     EXPECT_FALSE(SendCammandToDaemon("large", std::string(4000000, 'x')));
     EXPECT_EQ(SIG_IGN, std::signal(SIGPIPE, SIG_IGN));
-}
-
-TEST_F(DaemonSocket, ReturnsFromADaemonWhoseBacklogIsFull) {
-    daemon_.Start(FakeDaemon::Mood::kDeaf);
-    sockaddr_un address{};
-    address.sun_family = AF_UNIX;
-    std::strncpy(address.sun_path, "/var/run/fileindexd.sock", sizeof address.sun_path - 1);
-    const int waiting = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
-    ASSERT_EQ(0, ::connect(waiting, reinterpret_cast<const sockaddr *>(&address), sizeof address));
-    EXPECT_FALSE(SendPause());
-    ::close(waiting);
 }
 
 class NoSpaceNotification : public FileIndexTest {};

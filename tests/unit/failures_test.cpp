@@ -44,7 +44,7 @@ std::string LocationFrom(int (*get)(const char *, char *, int)) {
 
 const std::pair<const char *, std::function<std::string()>> kOperations[] = {
     {"Upsert",
-     [] { return YesNo(IndexMgr::Upsert(Parse(R"([{"path":"/photo/b","video":true},{"path":"/music/c"}])"))); }},
+     [] { return YesNo(IndexMgr::Upsert(Parse(R"([{"path":"/photo/a","video":true},{"path":"/music/c"}])"))); }},
     {"Delete", [] { return YesNo(IndexMgr::Delete(Parse(R"(["/photo/a","/music"])"))); }},
     {"Delete of the last", [] { return YesNo(IndexMgr::Delete(Parse(R"(["/photo/a"])"))); }},
     {"Reindex", [] { return YesNo(IndexMgr::Reindex(Parse(R"(["/photo/a","/music"])"))); }},
@@ -73,17 +73,17 @@ const std::pair<const char *, std::function<std::string()>> kOperations[] = {
     {"Updater_zol60_beta2", [] { return YesNo(Updater_zol60_beta2()); }},
     {"Pause", [] { return YesNo(StatusMgr::Pause(2)); }},
     {"Resume", [] { return YesNo(StatusMgr::Resume()); }},
-    {"ShareRevive", Ask(StatusMgr::ShareRevive, "photo")},
-    {"ShareSetNoSpace", [] { return YesNo(StatusMgr::ShareSetNoSpace("music", true)); }},
-    {"ShareSetNeedReindex", [] { return YesNo(StatusMgr::ShareSetNeedReindex("music", true)); }},
+    {"ShareRevive", Ask(StatusMgr::ShareRevive, "music")},
+    {"ShareSetNoSpace", [] { return YesNo(StatusMgr::ShareSetNoSpace("photo", true)); }},
+    {"ShareSetNeedReindex", [] { return YesNo(StatusMgr::ShareSetNeedReindex("photo", true)); }},
     {"SetUpdated", Ask(StatusMgr::SetUpdated, "once")},
-    {"ShareIsNoSpace", Ask(StatusMgr::ShareIsNoSpace, "photo")},
+    {"ShareIsNoSpace", Ask(StatusMgr::ShareIsNoSpace, "music")},
     {"GetStatus",
      [] {
          std::string status;
          return StatusMgr::GetStatus(status) ? status : "no";
      }},
-    {"GetFolderStatus", [] { return StatusMgr::GetFolderStatus("/music"); }},
+    {"GetFolderStatus", [] { return StatusMgr::GetFolderStatus("/photo/a"); }},
     {"CanPathBeIndexed", Ask(CanPathBeIndexed, "/photo/a")},
     {"IsSkipIndex", Ask(IsSkipIndex, "/vol1/photo/a")},
     {"IsShareSpaceEnough", Ask(IsShareSpaceEnough, "photo")},
@@ -135,13 +135,16 @@ protected:
             fs::create_directories(std::string(directory) + "/b");
         }
         const std::string name = kOperations[GetParam()].first;
-        std::vector<std::string> folders = {FolderRecord("/photo/a", "", "d"), FolderRecord("/photo/b", "", "p"),
-                                            FolderRecord("/music", "", "a")};
-        folders.resize(name.ends_with(" of none") ? 0 : name.ends_with(" of the last") ? 1 : 3);
-        Platform::Current().searchOn = folders.size() == 1;
+        std::vector<std::string> folders = {FolderRecord("/photo/a", "", "d"), FolderRecord("/music", "", "a"),
+                                            FolderRecord("/photo/b", "", "p")};
+        folders.resize(name.ends_with(" of none")                   ? 0
+                       : name == "Delete"                           ? 3
+                       : name == "Reindex" || name == "ShareRemove" ? 2
+                                                                    : 1);
+        Platform::Current().searchOn = name.ends_with(" of the last");
         GivenFolders(folders);
-        GivenStatusConf(R"({"no_space":{"photo":true}})");
-        GivenQueue("music", "{\"event\":1,\"path\":\"/vol2/music/x\"}\n");
+        GivenStatusConf(R"({"no_space":{"music":true}})");
+        GivenQueue("photo", "{\"event\":1,\"path\":\"/vol1/photo/a/x\"}\n");
         Script::Current().now = 1700000000;
         Script::Current().ClearJournal();
         Left();
@@ -231,8 +234,8 @@ TEST_P(Failures, OfEachCallEndAsTheTableSays) {
     for (const auto &[outcome, calls] : outcomes) {
         std::string line;
         for (const auto &[call, numbers] : calls) {
-            line += (line.empty() ? "" : ", ") + call.first + (call.second.empty() ? "" : " ") + call.second +
-                    " " + Ranges(numbers);
+            line.append(line.empty() ? "" : ", ").append(call.first).append(call.second.empty() ? "" : " ");
+            line.append(call.second).append(" ").append(Ranges(numbers));
         }
         table += line + " | " + outcome + "\n";
     }

@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <filesystem>
 #include <new>
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -25,6 +26,10 @@ struct Location {
     const char *outName;
     int argumentLine, shareLine, metadataLine;
 };
+
+void PrintTo(const Location &location, std::ostream *out) {
+    *out << location.name;
+}
 
 class StorageLocation : public FileIndexTest, public testing::WithParamInterface<Location> {
 protected:
