@@ -1,6 +1,7 @@
 // How far indexing has got: overall, for one folder, and as an additional fact of a folder's record.
 #include "fixture.h"
 
+#include <cerrno>
 #include <filesystem>
 #include <string>
 #include <vector>
@@ -111,6 +112,10 @@ TEST_F(Progress, OfAFolderIsSeenInTheEventsAtOrBelowIt) {
         {"only in the companion", "", EventLine("/vol1/photo/a"), "processing", 0},
         {"moved to it", RenameLine("/vol1/photo/a", R"("/vol1/photo/z")"), "", "processing", 0},
         {"moved from it", RenameLine("/vol1/photo/z", R"("/vol1/photo/a/x")"), "", "processing", 0},
+        {"moved from it, in another order", R"({"path_old":"/vol1/photo/a","event":256,"path":"/z"})", "",
+         "processing", 0},
+        {"an event beyond 32 bits", R"({"event":4294967296,"path":"/vol1/photo/a"})", "", "finished", 1},
+        {"a path with a NUL", std::string("{\"event\":2,\"path\":\"/vol1/photo/a\0\"}", 35), "", "finished", 1},
         {"moved elsewhere", RenameLine("/vol1/photo/z", R"("/vol1/photo/y")"), "", "finished", 0},
         {"an old path without a rename", R"({"event":2,"path":"/z","path_old":"/vol1/photo/a"})", "", "finished",
          0},
@@ -133,6 +138,32 @@ TEST_F(Progress, OfAFolderIsSeenInTheEventsAtOrBelowIt) {
     GivenQueue("photo", "not json\n");
     StatusMgr::GetFolderStatus("/photo/a");
     EXPECT_EQ("0 status_mgr.cpp:47 Malformed command: not json", Left());
+}
+
+TEST_F(Progress, CountsALineOnlyWhenItIsWhole) {
+    for (const char *data :
+         {"", R"("data":null,)", R"("data":{"audio":true,"document":false,"photo":true,"video":true},)"}) {
+        const std::string line =
+            std::string("{") + data + R"("event":256,"path":"/vol1/photo/a","path_old":"/vol1/photo/b"})";
+        for (size_t size = 1; size <= line.size(); ++size) {
+            GivenQueue("photo", line.substr(0, size));
+            EXPECT_EQ(size == line.size() ? "processing" : "finished", StatusMgr::GetFolderStatus("/photo/a"))
+                << size;
+            Forget();
+        }
+    }
+}
+
+TEST_F(Progress, SeesAQueueThatIsReadWithTroubleAsFarAsItGoes) {
+    GivenQueue("photo", EventLine("/vol1/photo/a"));
+    Fail({.call = "pread", .about = kQueue, .error = EINTR});
+    EXPECT_EQ("processing", StatusMgr::GetFolderStatus("/photo/a"));
+    Fail({.call = "pread", .about = kQueue, .error = EIO});
+    EXPECT_EQ("finished", StatusMgr::GetFolderStatus("/photo/a"));
+    Fail({.call = "open", .about = kQueue, .action = [] { fs::remove(kQueue), fs::create_directory(kQueue); }});
+    EXPECT_EQ("finished", StatusMgr::GetFolderStatus("/photo/a"));
+    EXPECT_EQ(std::string("0 status_mgr.cpp:37 Failed to open queue=") + kQueue + ", reason=Invalid argument",
+              Left());
 }
 
 TEST_F(Progress, OfAShareWithoutSpaceIsAnErrorWhateverIsQueued) {
