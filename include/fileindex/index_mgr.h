@@ -71,7 +71,8 @@ public:
     /// \name Changes
     /// @{
 
-    /// Adds folders, or changes the given members of existing ones: all of the batch or none is saved.
+    /// Adds folders, or changes the given members of existing ones: all of the batch or none is saved. Takes the
+    /// lock.
     ///
     /// `folders` is an array of objects with at least "path" (share path); "name", "document", "audio",
     /// "video" and "photo" as wanted. Then, in this order: the monitor of each share is registered anew, the
@@ -89,16 +90,16 @@ public:
     /// neither read nor locked. Unknown share: FILEINDEX_ERR_PATH.
     FILEINDEX_API static bool Update(const std::string &path, const Json::Value &data);
 
-    /// Removes folders: `paths` is an array of share paths; one that is not indexed is no error. A share left
-    /// without folders loses its queue, index database and monitor; when no folder is left anywhere, the
-    /// daemon is stopped and the search setting switched off. A folder whose share is gone is removed and saved,
-    /// but the call fails where its event cannot be queued or its share not be cleaned.
-    /// Codes: BAD_PARAM, LOCK, LOAD_JSON, MALFORMED_CONFIG, SAVE_JSON, PATH; as for Upsert, those who refuse set
-    /// none.
+    /// Removes folders: `paths` is an array of share paths; one that is not indexed is no error. Takes the lock. A
+    /// share left without folders loses its queue, index database and monitor; when no folder is left anywhere,
+    /// the daemon is stopped and the search setting switched off. A folder whose share is gone is removed and
+    /// saved, but the call fails where its event cannot be queued or its share not be cleaned. Codes: BAD_PARAM,
+    /// LOCK, LOAD_JSON, MALFORMED_CONFIG, SAVE_JSON, PATH; as for Upsert, those who refuse set none.
     FILEINDEX_API static bool Delete(const Json::Value &paths);
 
     /// Queues a reindex of each share path of the array, whose shares must be indexed, and revives shares that
     /// were out of space. Takes no folder.conf lock. A share that is not indexed: false without a record.
+    /// Codes: BAD_PARAM, PATH.
     FILEINDEX_API static bool Reindex(const Json::Value &jsArrPath);
     /// @}
 
