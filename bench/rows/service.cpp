@@ -64,19 +64,19 @@ Row OneCommand() {
     return row;
 }
 
-Row ServiceStatus() {
-    const auto paths = SharePaths(1000, 10);
+Row ServiceStatus(std::size_t folders, std::size_t shares) {
+    const auto paths = SharePaths(folders, shares);
     const auto prepare = [=] {
         WriteFolderConf(paths);
         for (const std::string &path : paths) {
             std::filesystem::create_directories(FullPath(path));
         }
-        for (int share = 0; share < 10; ++share) {
+        for (std::size_t share = 0; share < shares; ++share) {
             std::filesystem::remove(QueuePath("share" + std::to_string(share)));
         }
     };
     Row row;
-    row.name = "GetStatus/1000 folders in 10 shares";
+    row.name = "GetStatus/" + std::to_string(folders) + " folders in " + std::to_string(shares) + " shares";
     row.library = [=] {
         prepare();
         return [] {
@@ -86,7 +86,7 @@ Row ServiceStatus() {
     };
     row.floor = [=] {
         prepare();
-        return [paths] {
+        return [=] {
             struct stat status = {};
             lstat(kFolderConf, &status);
             ReadBytes(kFolderConf);
@@ -94,7 +94,7 @@ Row ServiceStatus() {
             for (const std::string &path : paths) {
                 Require(realpath(FullPath(path).c_str(), resolved) != nullptr, "realpath");
             }
-            for (int share = 0; share < 10; ++share) {
+            for (std::size_t share = 0; share < shares; ++share) {
                 const std::string queue = std::string(kVolume) + "/share" + std::to_string(share) + "/queue";
                 lstat(queue.c_str(), &status);
                 lstat((queue + ".tmp").c_str(), &status);
@@ -108,7 +108,7 @@ Row ServiceStatus() {
 }  // namespace
 
 std::vector<Row> ServiceRows() {
-    return {OneCommand(), ServiceStatus()};
+    return {OneCommand(), ServiceStatus(100, 10), ServiceStatus(1000, 10), ServiceStatus(1000, 100)};
 }
 
 }  // namespace bench
