@@ -17,8 +17,9 @@ namespace FILEINDEX {
 /// full path.
 ///
 /// True when the line is queued, when a reindex of exactly this path is queued already (any event is redundant
-/// then), and when the queue stayed locked for three attempts (the event is dropped). False when it cannot be
-/// queued; the share is then marked as waiting to be reindexed whole. Sets no code of its own.
+/// then), when the queue stayed locked for three attempts (the event is dropped), and when the disk takes the line
+/// only in part or not at all. False when the queue cannot be used; the share is then marked as waiting to be
+/// reindexed whole. Sets no code of its own.
 FILEINDEX_API bool AddCustomEvent(const int &type, const std::string &fullPath, const Json::Value &data);
 
 /// Sends {"type": command, "data": data} to the daemon on /var/run/fileindexd.sock. True when all of it was

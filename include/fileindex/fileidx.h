@@ -9,7 +9,7 @@
  *  3. The questions answer 1 or 0. They answer 0 to a null pointer and when folder.conf cannot be read.
  *  4. The locations answer the length of the text written, without its NUL, or -1. A text that does not fit
  *     is cut to the buffer and always NUL-terminated; the length is that of the cut text.
- *  5. No lock is taken, and no exception leaves a function.
+ *  5. The lock files are not touched, and no exception leaves a function.
  *
  * The class interface is in <fileindex/fileindex.h>.
  */

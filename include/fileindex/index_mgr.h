@@ -26,7 +26,8 @@ namespace FILEINDEX {
 class IndexMgr {
 public:
     /// \name Questions
-    /// Plain byte comparison on component boundaries; nothing is normalised, a trailing "/" is harmless. The
+    /// Plain byte comparison on component boundaries; nothing is normalised. A trailing "/" of the path
+    /// asked for is harmless, except in IsPathContainIndexed, which looks for folders behind it. The
     /// one-argument forms read folder.conf without a lock and answer false when it cannot be read; the others
     /// ask a list that the caller holds (from List).
     /// @{

@@ -19,7 +19,8 @@ namespace FILEINDEX {
 FILEINDEX_API bool IsSystemPreservedFileName(const std::string &name);
 
 /// Must the indexer pass over this full path: a system name, inside a share's recycle bin or a snapshot, or on
-/// a remote, image or pseudo file system? A file system of unknown type is not skipped.
+/// a remote, image or pseudo file system? A path without "/" is passed over too; a file
+/// system of unknown type is not.
 FILEINDEX_API bool IsSkipIndex(const std::string &fullPath);
 
 /// May a user have this folder (share path) indexed? Unknown share: one record and FILEINDEX_ERR_PATH.

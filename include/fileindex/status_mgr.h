@@ -56,7 +56,8 @@ public:
     ///
     /// Inferred from the queue files of the shares that have an indexable folder: one that exists, even empty,
     /// is work left; only then does a pause show. False, `status` untouched, when a configuration file cannot
-    /// be read. Folders whose share is away do not count.
+    /// be read, a folder's path is empty or a share's queue cannot be located. Folders whose share is away do not
+    /// count.
     FILEINDEX_API static bool GetStatus(std::string &status);
 
     /// One folder (share path): "finished", "paused", "processing" or "err_no_space".

@@ -12,6 +12,7 @@
 
 #include <cerrno>
 #include <cstdlib>
+#include <new>
 
 namespace VORK {
 namespace FILEINDEX {
@@ -63,17 +64,22 @@ void Config::Unlock() {
 }
 
 bool Config::LoadJson() {
-    unparsed_.clear();
-    return internal::LoadConfig(
-        GetPath(), [this](const std::string &text) { return internal::JsonReader().Parse(text, document_); });
+    return internal::LoadConfig(GetPath(), [this](const std::string &text) {
+        unparsed_.clear();
+        return internal::JsonReader().Parse(text, document_);
+    });
 }
 
 bool Config::SaveJson() {
-    if (!unparsed_.empty()) {
-        internal::JsonReader().Parse(unparsed_, document_);
-        unparsed_.clear();
-    }
-    return internal::SaveConfig(GetPath(), [this] { return internal::ToString(document_) + '\n'; });
+    return internal::SaveConfig(GetPath(), [this] {
+        if (!unparsed_.empty()) {
+            if (!internal::JsonReader().Parse(unparsed_, document_)) {
+                throw std::bad_alloc();  // it has been parsed before; an empty document must not take its place
+            }
+            unparsed_.clear();
+        }
+        return internal::ToString(document_) + '\n';
+    });
 }
 
 }  // namespace FILEINDEX

@@ -110,16 +110,18 @@ bool Folders::Load() {
 }
 
 bool Folders::Save() {
-    std::string text;
-    for (const auto &[path, folder] : folders_) {
-        text += text.empty() ? '{' : ',';
-        internal::AppendQuoted(text, path);
-        text += ':';
-        AppendRecord(text, folder);
-    }
-    text += text.empty() ? "{}\n" : "}\n";
-    unparsed_ = std::move(text);
-    return internal::SaveConfig(GetPath(), [this]() -> const std::string & { return unparsed_; });
+    return internal::SaveConfig(GetPath(), [this]() -> const std::string & {
+        std::string text;
+        for (const auto &[path, folder] : folders_) {
+            text += text.empty() ? '{' : ',';
+            internal::AppendQuoted(text, path);
+            text += ':';
+            AppendRecord(text, folder);
+        }
+        text += text.empty() ? "{}\n" : "}\n";
+        unparsed_ = std::move(text);
+        return unparsed_;
+    });
 }
 
 }  // namespace FILEINDEX

@@ -1,5 +1,6 @@
 #include "folder_access.h"
 #include "names.h"
+#include "no_throw.h"
 
 #include <fileindex/folders.h>
 
@@ -45,32 +46,34 @@ void Sort(Sorted &folders, const std::string &sortBy) {
 
 bool Folders::List(Json::Value &out, unsigned long offset, unsigned long limit, const std::string &sort_by,
                    const std::string &sort_direction, const Json::Value &additional) {
-    Sorted sorted;
-    sorted.reserve(folders_.size());
-    for (const auto &[path, folder] : folders_) {
-        sorted.push_back(&folder);
-    }
-    Sort(sorted, sort_by);
+    return internal::NoThrow([&] {
+        Sorted sorted;
+        sorted.reserve(folders_.size());
+        for (const auto &[path, folder] : folders_) {
+            sorted.push_back(&folder);
+        }
+        Sort(sorted, sort_by);
 
-    const unsigned long total = sorted.size();
-    const unsigned long count = offset > total ? 0 : std::min(total - offset, limit);
-    Json::Value page(Json::arrayValue);
-    if (sort_direction == "DESC") {
-        // Counted from the start, whatever the offset: user interfaces rely on it for their last page.
-        for (unsigned long i = count; i-- > 0;) {
-            page.append(sorted[i]->asJson(additional));
+        const unsigned long total = sorted.size();
+        const unsigned long count = offset > total ? 0 : std::min(total - offset, limit);
+        Json::Value page(Json::arrayValue);
+        if (sort_direction == "DESC") {
+            // Counted from the start, whatever the offset: user interfaces rely on it for their last page.
+            for (unsigned long i = count; i-- > 0;) {
+                page.append(sorted[i]->asJson(additional));
+            }
+        } else {
+            for (unsigned long i = offset; i < offset + count; ++i) {
+                page.append(sorted[i]->asJson(additional));
+            }
         }
-    } else {
-        for (unsigned long i = offset; i < offset + count; ++i) {
-            page.append(sorted[i]->asJson(additional));
-        }
-    }
-    Json::Value result(Json::objectValue);
-    result["total"] = static_cast<Json::Int>(total);
-    result["offset"] = static_cast<Json::UInt64>(offset);
-    result["folder"] = std::move(page);
-    out = std::move(result);
-    return true;
+        Json::Value result(Json::objectValue);
+        result["total"] = static_cast<Json::Int>(total);
+        result["offset"] = static_cast<Json::UInt64>(offset);
+        result["folder"] = std::move(page);
+        out = std::move(result);
+        return true;
+    });
 }
 
 }  // namespace FILEINDEX

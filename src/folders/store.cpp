@@ -2,6 +2,7 @@
 #include "folder_access.h"
 #include "json/text.h"
 #include "names.h"
+#include "no_throw.h"
 
 #include <fileindex/error.h>
 #include <fileindex/folders.h>
@@ -105,14 +106,16 @@ std::string Folders::GetPath() const {
 }
 
 bool Folders::Get(Json::Value &out, const std::string &path) {
-    const auto found = folders_.find(path);
-    if (found == folders_.end()) {
-        syslog(LOG_ERR, "%s:%d No such folder: %s", kFoldersModule, __LINE__, path.c_str());
-        ErrorHandler::SetError(FILEINDEX_ERR_NO_SUCH_FOLDER);
-        return false;
-    }
-    out = found->second.asJson();
-    return true;
+    return internal::NoThrow([&] {
+        const auto found = folders_.find(path);
+        if (found == folders_.end()) {
+            syslog(LOG_ERR, "%s:%d No such folder: %s", kFoldersModule, __LINE__, path.c_str());
+            ErrorHandler::SetError(FILEINDEX_ERR_NO_SUCH_FOLDER);
+            return false;
+        }
+        out = found->second.asJson();
+        return true;
+    });
 }
 
 bool Folders::List(std::vector<Folder> &out) {
@@ -120,64 +123,70 @@ bool Folders::List(std::vector<Folder> &out) {
 }
 
 bool Folders::List(std::vector<Folder> &out, const std::string &share) {
-    const std::string wanted = share;  // may be a field of the list that is cleared now
-    out.clear();
-    for (const auto &[path, folder] : folders_) {
-        std::string owner;
-        if (wanted.empty() || (GetShareNameByPath(owner, folder.path) && owner == wanted)) {
-            out.push_back(folder);
+    return internal::NoThrow([&] {
+        const std::string wanted = share;  // may be a field of the list that is cleared now
+        out.clear();
+        for (const auto &[path, folder] : folders_) {
+            std::string owner;
+            if (wanted.empty() || (GetShareNameByPath(owner, folder.path) && owner == wanted)) {
+                out.push_back(folder);
+            }
         }
-    }
-    return true;
+        return true;
+    });
 }
 
 bool Folders::Upsert(Json::Value &out, const Json::Value &folder) {
-    std::string path;
-    std::string fullPath;
-    if (!RetrieveStringFromJsonObj(path, internal::kPathKey, folder) || !GetFullPath(fullPath, path)) {
-        syslog(LOG_ERR, "%s:%d Bad param: %s", kFoldersModule, __LINE__, ToString(folder).c_str());
-        ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);  // over the path error: the request is what is wrong
-        return false;
-    }
-    const auto found = folders_.find(path);
-    const bool known = found != folders_.end();
-    Folder updated = known ? found->second : Folder();
-    if (known) {
-        updated.Load(path, folder);
-    } else {
-        updated.Reload(path, folder);
-        folders_.emplace(path, updated);
-        if (folders_.size() > internal::kMaxFolders) {
-            syslog(LOG_ERR, "%s:%d Exceed max folder size", kFoldersModule, __LINE__);
-            ErrorHandler::SetError(FILEINDEX_ERR_EXCEED_MAX_FOLDER);
+    return internal::NoThrow([&] {
+        std::string path;
+        std::string fullPath;
+        if (!RetrieveStringFromJsonObj(path, internal::kPathKey, folder) || !GetFullPath(fullPath, path)) {
+            syslog(LOG_ERR, "%s:%d Bad param: %s", kFoldersModule, __LINE__, ToString(folder).c_str());
+            ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);  // over the path error: the request is what is wrong
             return false;
         }
-    }
-    const StoreWith asItWas(folders_, path, known ? &found->second : nullptr);
-    // After the change the record itself counts, even where a folder later in the list governs the path.
-    out = ChangeReport(asItWas.Governing(fullPath, unresolved_ == 0), &updated);
-    unresolved_ += IsUnresolved(updated) ? 1 : 0;
-    if (known) {
-        unresolved_ -= IsUnresolved(found->second) ? 1 : 0;
-        found->second = std::move(updated);
-    }
-    return true;
+        const auto found = folders_.find(path);
+        const bool known = found != folders_.end();
+        Folder updated = known ? found->second : Folder();
+        if (known) {
+            updated.Load(path, folder);
+        } else {
+            updated.Reload(path, folder);
+            folders_.emplace(path, updated);
+            if (folders_.size() > internal::kMaxFolders) {
+                syslog(LOG_ERR, "%s:%d Exceed max folder size", kFoldersModule, __LINE__);
+                ErrorHandler::SetError(FILEINDEX_ERR_EXCEED_MAX_FOLDER);
+                return false;
+            }
+        }
+        const StoreWith asItWas(folders_, path, known ? &found->second : nullptr);
+        // After the change the record itself counts, even where a folder later in the list governs the path.
+        out = ChangeReport(asItWas.Governing(fullPath, unresolved_ == 0), &updated);
+        unresolved_ += IsUnresolved(updated) ? 1 : 0;
+        if (known) {
+            unresolved_ -= IsUnresolved(found->second) ? 1 : 0;
+            found->second = std::move(updated);
+        }
+        return true;
+    });
 }
 
 bool Folders::Delete(Json::Value &out, const std::string &path) {
-    const bool allResolved = unresolved_ == 0;
-    const auto removed = folders_.extract(path);
-    const Folder *own = removed ? &removed.mapped() : nullptr;
-    unresolved_ -= own != nullptr && IsUnresolved(*own) ? 1 : 0;
-    std::string fullPath;
-    if (!GetFullPath(fullPath, path)) {
-        return true;  // a folder of a share that is gone can still be removed
-    }
-    const Folder *before = StoreWith(folders_, path, own).Governing(fullPath, allResolved);
-    const Folder *after = StoreWith(folders_, path, nullptr).Governing(fullPath, unresolved_ == 0);
-    out = Json::Value(Json::objectValue);
-    out[path] = ChangeReport(before, after);
-    return true;
+    return internal::NoThrow([&] {
+        const bool allResolved = unresolved_ == 0;
+        const auto removed = folders_.extract(path);
+        const Folder *own = removed ? &removed.mapped() : nullptr;
+        unresolved_ -= own != nullptr && IsUnresolved(*own) ? 1 : 0;
+        std::string fullPath;
+        if (!GetFullPath(fullPath, path)) {
+            return true;  // a folder of a share that is gone can still be removed
+        }
+        const Folder *before = StoreWith(folders_, path, own).Governing(fullPath, allResolved);
+        const Folder *after = StoreWith(folders_, path, nullptr).Governing(fullPath, unresolved_ == 0);
+        out = Json::Value(Json::objectValue);
+        out[path] = ChangeReport(before, after);
+        return true;
+    });
 }
 
 Json::Value GetMostSuitableCfg(std::vector<Folder> folders, const std::string &path) {

@@ -26,52 +26,108 @@ std::unique_ptr<Json::CharReader> NewReader() {
     return std::unique_ptr<Json::CharReader>(builder.newCharReader());
 }
 
-/// Too few brackets to nest too deep, no NUL, and a member's first character right behind each comma: settles most
-/// texts in one pass without looking at their structure. False: look closer.
-bool IsPlainlyWithinDialect(std::string_view text) {
-    int openers = 0;
-    bool suspect = false;
-    char last = 0;
-    for (const char c : text) {
-        openers += (c | 0x20) == '{' ? 1 : 0;  // '[' too
-        suspect |= c == '\0' || (last == ',' && (c == ']' || c == '}' || static_cast<unsigned char>(c) <= ' '));
-        last = c;
-    }
-    return !suspect && openers <= kMaxDepth;
+bool IsDigit(char c) {
+    return c >= '0' && c <= '9';
 }
 
-/// Sees to what the parser is lenient about: a NUL ends its text whatever follows, and a comma may trail a member
-/// without a name. Counts arrays and objects, which the parser cannot tell from other values.
-bool IsWithinDialect(std::string_view text) {
-    int depth = 0;
-    bool inString = false;
-    char last = 0;  // the last character that is no blank; one inside a string is followed by its quote
-    for (std::size_t i = 0; i < text.size(); ++i) {
-        const char c = text[i];
-        if (c == '\0') {
+/// Sees to what the parser is lenient about: comments, which it skips in places even where they are not allowed; a
+/// comma that trails a member without a name; numbers like "-", "007" and "1."; a NUL, which ends its text
+/// whatever follows. Counts arrays and objects, which the parser cannot tell from other values. Everything else is
+/// left to it.
+class DialectCheck {
+public:
+    explicit DialectCheck(std::string_view text) : rest_(text) {}
+
+    bool Passes() {
+        if (rest_.find('\0') != std::string_view::npos) {
             return false;
         }
-        if (inString) {
-            i += c == '\\' ? 1 : 0;
-            inString = c != '"';
-        } else if (c == '"') {
-            inString = true;
-        } else if (c == '[' || c == '{') {
-            if (++depth > kMaxDepth) {
+        char last = 0;  // the last character outside strings that is no blank
+        while (!rest_.empty()) {
+            const char c = rest_.front();
+            if (c == '"') {
+                SkipString();
+            } else if (IsDigit(c) || c == '-') {
+                if (!SkipNumber()) {
+                    return false;
+                }
+            } else if (!TakeOther(c, last)) {
                 return false;
             }
-        } else if (c == ']' || c == '}') {
-            if (last == ',') {
-                return false;
-            }
-            --depth;
+            last = c == ' ' || c == '\t' || c == '\n' || c == '\r' ? last : c;
         }
-        if (c != ' ' && c != '\t' && c != '\n' && c != '\r') {
-            last = c;
+        return true;
+    }
+
+private:
+    /// An unfinished one ends the text.
+    void SkipString() {
+        rest_.remove_prefix(1);
+        for (;;) {
+            const std::size_t quote = rest_.find('"');
+            const std::size_t escape = rest_.substr(0, quote).find('\\');
+            if (escape == std::string_view::npos) {
+                rest_.remove_prefix(std::min(quote, rest_.size() - 1) + 1);
+                return;
+            }
+            rest_.remove_prefix(std::min(escape + 2, rest_.size()));
         }
     }
-    return true;
-}
+
+    bool SkipNumber() {
+        Take("-");
+        const bool zero = rest_.starts_with('0');
+        const std::size_t digits = SkipDigits();
+        if (digits == 0 || (zero && digits > 1)) {
+            return false;
+        }
+        if (Take(".") && SkipDigits() == 0) {
+            return false;
+        }
+        if (Take("e") || Take("E")) {
+            if (!Take("+")) {
+                Take("-");
+            }
+            return SkipDigits() > 0;
+        }
+        return true;
+    }
+
+    std::size_t SkipDigits() {
+        const auto end = std::find_if_not(rest_.begin(), rest_.end(), IsDigit);
+        const auto count = static_cast<std::size_t>(end - rest_.begin());
+        rest_.remove_prefix(count);
+        return count;
+    }
+
+    bool TakeOther(char c, char last) {
+        rest_.remove_prefix(1);
+        switch (c) {
+            case '/':
+            case '+':
+            case '.':
+                return false;
+            case '[':
+            case '{':
+                return ++depth_ <= kMaxDepth;
+            case ']':
+            case '}':
+                --depth_;
+                return last != ',';
+            default:
+                return true;
+        }
+    }
+
+    bool Take(std::string_view literal) {
+        const bool there = rest_.starts_with(literal);
+        rest_.remove_prefix(there ? literal.size() : 0);
+        return there;
+    }
+
+    std::string_view rest_;
+    int depth_ = 0;
+};
 
 bool NeedsEscape(char c) {
     return static_cast<unsigned char>(c) < 0x20 || c == '"' || c == '\\';
@@ -173,7 +229,7 @@ void Append(std::string &out, const Json::Value &value) {
 JsonReader::JsonReader() : reader_(NewReader()) {}
 
 bool JsonReader::Parse(std::string_view text, Json::Value &out) const {
-    if (!IsPlainlyWithinDialect(text) && !IsWithinDialect(text)) {
+    if (!DialectCheck(text).Passes()) {
         return false;
     }
     try {

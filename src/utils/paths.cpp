@@ -21,7 +21,9 @@ bool GetFullPath(std::string &out, const std::string &sharePath) {
         syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", kUtilsModule, 389, sharePath.c_str());
         return false;
     }
-    const internal::Share share = internal::FindShare(shareName);
+    // The platform would see the path up to a NUL only, and so another one.
+    const bool named = sharePath.find('\0') == std::string::npos;
+    const internal::Share share = named ? internal::FindShare(shareName) : internal::Share();
     if (!share) {
         ErrorHandler::SetError(FILEINDEX_ERR_PATH);
         return false;

@@ -116,6 +116,8 @@ TEST_F(Progress, OfAFolderIsSeenInTheEventsAtOrBelowIt) {
          "processing", 0},
         {"an event beyond 32 bits", R"({"event":4294967296,"path":"/vol1/photo/a"})", "", "finished", 1},
         {"a path with a NUL", std::string("{\"event\":2,\"path\":\"/vol1/photo/a\0\"}", 35), "", "finished", 1},
+        {"a comment", R"({"event":2,"path":"/vol1/photo/a" /* c */})", "", "finished", 1},
+        {"an event that is no number", R"({"event":-,"path":"/vol1/photo/a"})", "", "finished", 1},
         {"moved elsewhere", RenameLine("/vol1/photo/z", R"("/vol1/photo/y")"), "", "finished", 0},
         {"an old path without a rename", R"({"event":2,"path":"/z","path_old":"/vol1/photo/a"})", "", "finished",
          0},

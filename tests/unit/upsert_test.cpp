@@ -69,8 +69,9 @@ TEST_F(IndexUpsert, OfWhatIsNoArrayDoesNothing) {
 TEST_F(IndexUpsert, WithOneBadElementSavesAndTellsNothing) {
     GivenFolders({FolderRecord("/photo/a", "A", "d")});
     const std::string conf = ReadFile(kFolderConf);
-    for (const char *element : {R"({"path":"/none/x"})", R"({"name":"x"})", "{}", "5", R"("/photo/c")", "null",
-                                R"(["/photo/c"])", R"({"path":["/photo/c"]})", R"({"path":""})"}) {
+    for (const char *element :
+         {R"({"path":"/none/x"})", R"({"name":"x"})", "{}", "5", R"("/photo/c")", "null", R"(["/photo/c"])",
+          R"({"path":["/photo/c"]})", R"({"path":""})", R"({"path":"/photo/c\u0000d"})"}) {
         SCOPED_TRACE(element);
         Forget();
         EXPECT_FALSE(
