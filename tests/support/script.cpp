@@ -12,7 +12,6 @@ Script &Script::Current() {
 }
 
 void Script::Reset() {
-    const std::lock_guard guard(mutex_);
     rules_.clear();
     calls_.clear();
     journal_.clear();
@@ -20,13 +19,7 @@ void Script::Reset() {
     random.reset();
 }
 
-void Script::Fail(Fault fault) {
-    const std::lock_guard guard(mutex_);
-    rules_.push_back({std::move(fault)});
-}
-
 std::vector<std::string> Script::Finish() {
-    const std::lock_guard guard(mutex_);
     std::vector<std::string> unused;
     for (const Rule &rule : rules_) {
         if (rule.seen < rule.fault.nth) {
@@ -39,17 +32,14 @@ std::vector<std::string> Script::Finish() {
 
 std::optional<Fault> Script::Take(std::string_view call, std::string_view about) {
     std::optional<Fault> taken;
-    {
-        const std::lock_guard guard(mutex_);
-        calls_.emplace_back(call, about);
-        for (Rule &rule : rules_) {
-            if (rule.fault.call != call || about.find(rule.fault.about) == std::string_view::npos) {
-                continue;
-            }
-            ++rule.seen;
-            if (!taken && rule.seen >= rule.fault.nth && rule.seen - rule.fault.nth < rule.fault.times) {
-                taken = rule.fault;
-            }
+    calls_.emplace_back(call, about);
+    for (Rule &rule : rules_) {
+        if (rule.fault.call != call || about.find(rule.fault.about) == std::string_view::npos) {
+            continue;
+        }
+        ++rule.seen;
+        if (!taken && rule.seen >= rule.fault.nth && rule.seen - rule.fault.nth < rule.fault.times) {
+            taken = rule.fault;
         }
     }
     if (taken && taken->action) {
@@ -60,29 +50,12 @@ std::optional<Fault> Script::Take(std::string_view call, std::string_view about)
 }
 
 int Script::Calls(std::string_view call, std::string_view about) const {
-    const std::lock_guard guard(mutex_);
     return static_cast<int>(std::count_if(calls_.begin(), calls_.end(), [&](const auto &made) {
         return made.first == call && made.second.find(about) != std::string::npos;
     }));
 }
 
-std::vector<std::pair<std::string, std::string>> Script::Calls() const {
-    const std::lock_guard guard(mutex_);
-    return calls_;
-}
-
-void Script::Record(std::string effect) {
-    const std::lock_guard guard(mutex_);
-    journal_.push_back(std::move(effect));
-}
-
-std::vector<std::string> Script::Journal() const {
-    const std::lock_guard guard(mutex_);
-    return journal_;
-}
-
 void Script::ClearJournal() {
-    const std::lock_guard guard(mutex_);
     calls_.clear();
     journal_.clear();
 }

@@ -1,13 +1,13 @@
 /// \file
 /// What a test tells the replaced functions to do, and the one journal they all write to.
 ///
-/// The platform and several C functions are replaced in every unit test (platform.h, system_calls.cpp). Each
-/// call is counted here, may be told to fail, and what it changes in the world is one line of the journal.
+/// The platform and several C functions are replaced in every unit test (platform.h, system_calls.cpp), all of
+/// which run in one thread. Each call is counted here, may be told to fail, and what it changes in the world is
+/// one line of the journal.
 #pragma once
 
 #include <functional>
 #include <limits>
-#include <mutex>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -36,7 +36,7 @@ public:
     /// Forgets all rules, counts and the journal.
     void Reset();
 
-    void Fail(Fault fault);
+    void Fail(Fault fault) { rules_.push_back({std::move(fault)}); }
     /// Ends all rules; a rule that never matched its call is returned by name.
     std::vector<std::string> Finish();
 
@@ -44,10 +44,10 @@ public:
     std::optional<Fault> Take(std::string_view call, std::string_view about = {});
     [[nodiscard]] int Calls(std::string_view call, std::string_view about = {}) const;
     /// All calls in order, each by its name and what it was about.
-    [[nodiscard]] std::vector<std::pair<std::string, std::string>> Calls() const;
+    [[nodiscard]] std::vector<std::pair<std::string, std::string>> Calls() const { return calls_; }
 
-    void Record(std::string effect);
-    [[nodiscard]] std::vector<std::string> Journal() const;
+    void Record(std::string effect) { journal_.push_back(std::move(effect)); }
+    [[nodiscard]] std::vector<std::string> Journal() const { return journal_; }
     void ClearJournal();
 
     /// Fixed answers of time() and rand(), while set.
@@ -60,7 +60,6 @@ private:
         int seen = 0;
     };
 
-    mutable std::mutex mutex_;
     std::vector<Rule> rules_;
     std::vector<std::pair<std::string, std::string>> calls_;
     std::vector<std::string> journal_;
