@@ -258,7 +258,7 @@ TEST_P(Failures, OfEachCallEndAsTheTableSays) {
             line.append(line.empty() ? "" : ", ").append(call.first).append(call.second.empty() ? "" : " ");
             line.append(call.second).append(" ").append(Ranges(numbers));
         }
-        table += line + " | " + outcome + "\n";
+        table.append(line).append(" | ").append(outcome).append("\n");
     }
     EXPECT_EQ(Expected(name), table) << table;
 }

@@ -12,7 +12,6 @@ namespace fs = std::filesystem;
 namespace fileindex_test {
 namespace {
 
-constexpr char kPhotoQueue[] = "/vol1/photo/@eaDir/VORK@file_index_queue";
 class ShareLifecycle : public FileIndexTest {
 protected:
     void SetUp() override {
