@@ -3,6 +3,7 @@
 #ifndef FILEINDEXCTL_DAEMON_H
 #define FILEINDEXCTL_DAEMON_H
 
+#include <optional>
 #include <string>
 
 namespace fileindexctl {
@@ -19,9 +20,10 @@ enum class DaemonCondition {
 };
 
 struct DaemonState {
-    bool reachable;
+    bool reachable;  ///< by this user
     std::string text;
     DaemonCondition condition;
+    std::optional<bool> listens;  ///< nothing when it cannot be told
 };
 
 /// Asks the kernel who listens. Only when it sees nobody, a connection is tried, without sending anything: a

@@ -94,7 +94,7 @@ StepReport PerformUpsert(const Json::Value &records) {
 ExitStatus AddFolder(const Arguments &arguments, Output &output) {
     const Folders folders = ReadFolders();
     Json::Value record(Json::objectValue);
-    const std::string path = RequireNewPath(arguments.One("PATH"), folders);
+    const std::string path = RequirePlain(arguments.One("PATH"), folders).path;
     if (std::any_of(folders.begin(), folders.end(), [&](const Folder &folder) { return folder.path == path; })) {
         throw Failure(ExitStatus::Usage, "\"" + path + "\" is indexed already; \"fileindexctl set\" changes it");
     }

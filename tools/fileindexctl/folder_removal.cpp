@@ -179,7 +179,9 @@ ExitStatus RemoveFolders(const Arguments &arguments, Output &output) {
     report.Show(output);
     StateRest(removed, output);
     if (report.Status() != ExitStatus::Done) {
-        output.Error(report.Status(), "the folders are removed, but not everybody knows");
+        output.Error(report.Status(),
+                     "the folders are removed, but not everybody knows; once the cause is mended: \"fileindexctl "
+                     "monitor refresh\", and \"fileindexctl share clean\" for a share without folders");
     }
     return report.Status();
 }

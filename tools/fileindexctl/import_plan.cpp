@@ -23,7 +23,7 @@ void RequireUsable(const FolderChange &change, const Folders &folders, const std
     try {
         if (!change.from.isNull()) {
             RequireShare(ShareOf(path));
-        } else if (RequireNewPath(path, folders) != path) {
+        } else if (RequirePlain(path, folders).path != path) {
             throw Failure(ExitStatus::Usage, "\"" + path + "\" is to be written without the \"/\" at its end");
         }
     } catch (const Failure &failure) {

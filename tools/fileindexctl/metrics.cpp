@@ -103,7 +103,9 @@ Metrics Measure() {
     if (status.resumeTime > 0) {
         metrics.pauseEnd.Add({}, status.resumeTime);
     }
-    metrics.daemon.Add({}, ProbeDaemon().reachable ? 1 : 0);
+    if (const auto listens = ProbeDaemon().listens) {
+        metrics.daemon.Add({}, *listens ? 1 : 0);
+    }
     return metrics;
 }
 

@@ -73,8 +73,17 @@ private:
     // A word that is no command is not what the parser complains about first.
     std::string Explain(const CLI::ParseError &error) const {
         const auto words = app_.remaining(true);
-        const bool unknown = app_.get_subcommands().empty() && !words.empty() && !words.front().starts_with("-");
-        return unknown ? "there is no command \"" + words.front() + "\"" : error.what();
+        if (words.empty() || words.front().starts_with("-")) {
+            return error.what();
+        }
+        const auto parsed = app_.get_subcommands();
+        if (parsed.empty()) {
+            return "there is no command \"" + words.front() + "\"";
+        }
+        const bool inGroup = groups_.count(parsed.front()->get_name()) > 0;
+        const bool unknown = inGroup && parsed.front()->get_subcommands().empty();
+        return unknown ? "there is no command \"" + parsed.front()->get_name() + " " + words.front() + "\""
+                       : error.what();
     }
 
     CLI::App &ParentOf(const Command &command) {

@@ -1,6 +1,7 @@
 #include "paths.h"
 
 #include "failure.h"
+#include "platform_file.h"
 #include "share_record.h"
 
 #include <fileindex/folders.h>
@@ -101,6 +102,11 @@ std::string RequireShare(const std::string &share) {
     switch (VLIBCErrGet()) {
         case VORK_ERR_NO_SUCH_SHARE:
         case VORK_ERR_BAD_PARAMETER:
+            if (ConfiguredShares().empty()) {
+                throw Failure(
+                    ExitStatus::NotConfigured,
+                    std::string("the platform knows no shares: none is to be found in ") + kPlatformFile);
+            }
             throw Failure(ExitStatus::NoSuchFolder, "there is no share \"" + share + "\"; " + kWhereSharesAre);
         case VORK_ERR_SHARE_DIRECTORY_NAME:
             throw Failure(ExitStatus::NotConfigured,
@@ -155,8 +161,8 @@ const Folder &RequireFolder(const std::string &given, const Folders &folders) {
     throw Failure(ExitStatus::NoSuchFolder, message + "; \"fileindexctl list\" shows them");
 }
 
-std::string RequireNewPath(const std::string &given, const Folders &folders) {
-    const Place place = Locate(given, folders);
+Place RequirePlain(const std::string &given, const Folders &folders) {
+    Place place = Locate(given, folders);
     RequireSharePath(place);
     if (place.path.empty() || !IsPlain(place.path)) {
         throw Failure(ExitStatus::Usage,
@@ -165,7 +171,7 @@ std::string RequireNewPath(const std::string &given, const Folders &folders) {
                           "\"/\", beginning with a share's name");
     }
     RequireShare(ShareOf(place.path));
-    return place.path;
+    return place;
 }
 
 bool LiesIn(const std::string &path, const std::string &top) {

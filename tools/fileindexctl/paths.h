@@ -37,9 +37,9 @@ const VORK::FILEINDEX::Folder &RequireFolder(const std::string &given, const Fol
 /// Throws Failure, which names the share path, for a full path.
 void RequireSharePath(const Place &place);
 
-/// The share path for a new folder: on a share that exists, without trailing slashes, spelt plainly. Throws
+/// The place that a share path names: on a share that exists, without trailing slashes, spelt plainly. Throws
 /// Failure.
-std::string RequireNewPath(const std::string &given, const Folders &folders);
+Place RequirePlain(const std::string &given, const Folders &folders);
 
 /// The directory of the share. Throws Failure, which says why the share cannot be used.
 std::string RequireShare(const std::string &share);

@@ -13,7 +13,6 @@ namespace fileindexctl {
 
 namespace {
 
-constexpr const char *kFile = "/usr/vork/etc/vorknotifyd/registrations.json";
 constexpr unsigned kMask = 0xFFCE;
 constexpr const char *kIgnored = "@eaDir";
 
@@ -31,18 +30,18 @@ Watches::value_type WatchOf(Json::Value entry) {
 
 Json::Value ReadDocument() {
     errno = 0;
-    std::ifstream file(kFile);
+    std::ifstream file(kRegistrationsFile);
     if (!file && errno == ENOENT) {
         return Json::Value(Json::objectValue);
     }
     if (!file) {
         throw Failure(ExitStatus::Permission,
-                      std::string("no permission for ") + kFile + "; run this as the administrator");
+                      std::string("no permission for ") + kRegistrationsFile + "; run this as the administrator");
     }
     Json::Value document;
     std::string errors;
     if (!Json::parseFromStream(Json::CharReaderBuilder(), file, &document, &errors)) {
-        throw Failure(ExitStatus::Malformed, std::string(kFile) + " cannot be read as JSON");
+        throw Failure(ExitStatus::Malformed, std::string(kRegistrationsFile) + " cannot be read as JSON");
     }
     return document;
 }
@@ -63,7 +62,7 @@ std::map<std::string, Watches> ReadRegistrations() try {
     }
     return registrations;
 } catch (const Json::Exception &) {
-    throw Failure(ExitStatus::Malformed, std::string(kFile) + " does not hold registrations");
+    throw Failure(ExitStatus::Malformed, std::string(kRegistrationsFile) + " does not hold registrations");
 }
 
 Watches::value_type ExpectedWatch(const std::string &fullPath) {

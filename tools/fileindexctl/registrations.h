@@ -12,6 +12,8 @@ namespace fileindexctl {
 /// The name under which the library registers.
 inline constexpr const char *kRegistration = "fileindex";
 
+inline constexpr const char *kRegistrationsFile = "/usr/vork/etc/vorknotifyd/registrations.json";
+
 /// By full path, how it is watched: the rest of its entry, as text.
 using Watches = std::map<std::string, std::string>;
 

@@ -2,6 +2,7 @@
 #include "handlers.h"
 #include "paths.h"
 #include "queue.h"
+#include "status_file.h"
 #include "steps.h"
 #include "text.h"
 
@@ -28,10 +29,8 @@ constexpr std::string_view kIndexMgr = "index_mgr.cpp";
 std::vector<Place> Requested(const Arguments &arguments, const Folders &folders, Output &output) {
     std::vector<Place> places;
     for (const auto &given : arguments.All("PATH")) {
-        const Place place = Locate(given, folders);
-        RequireSharePath(place);
+        const Place place = RequirePlain(given, folders);
         const std::string share = ShareOf(place.path);
-        RequireShare(share);
         if (!IndexMgr::IsShareIndexed(share)) {
             throw Failure(ExitStatus::NoSuchFolder, "no folder of the share \"" + share + "\" is indexed");
         }
@@ -41,7 +40,9 @@ std::vector<Place> Requested(const Arguments &arguments, const Folders &folders,
             continue;
         }
         if (Covering(AsFullPath(place), folders).empty()) {
-            output.Warn("\"" + place.path + "\" lies in no indexed folder");
+            const auto inside = Contained(AsFullPath(place), folders);
+            output.Warn(Quoted(place.path) + " lies in no indexed folder" +
+                        (inside.empty() ? "" : ", but holds " + Enumerate(inside)));
         }
         places.push_back(place);
     }
@@ -109,8 +110,21 @@ struct Revival {
     std::string trouble;
 };
 
+// The library does not say what it found wrong with the marks.
+void RequireMarks() {
+    StatusFile file;
+    ForgetErrors();
+    if (!file.Load()) {
+        throw FailureOf(file);
+    }
+    const Json::Value marks = file.Document().get("no_space", Json::objectValue);
+    if (!marks.isObject() && !marks.isNull()) {
+        throw Failure(ExitStatus::Malformed,
+                      file.GetPath() + ": \"no_space\" is no object; \"fileindexctl doctor --fix\" mends it");
+    }
+}
+
 Revival ReviveOne(const std::string &share, StepReport &all) {
-    RequireShare(share);
     if (!VORK::FILEINDEX::IsShareSpaceEnough(share)) {
         return {ExitStatus::CannotSave, "the share \"" + share + "\" still has no room for index data (10 MiB)"};
     }
@@ -149,6 +163,10 @@ ExitStatus ReindexPaths(const Arguments &arguments, Output &output) {
 ExitStatus ReviveShares(const Arguments &arguments, Output &output) {
     StepReport report;
     std::vector<ExitStatus> results;
+    for (const auto &share : arguments.All("SHARE")) {
+        RequireShare(share);
+    }
+    RequireMarks();
     for (const auto &share : arguments.All("SHARE")) {
         Revival revival{ExitStatus::Done, {}};
         try {

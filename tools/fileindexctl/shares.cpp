@@ -1,5 +1,6 @@
 #include "config_lock.h"
 #include "confirm.h"
+#include "daemon.h"
 #include "failure.h"
 #include "handlers.h"
 #include "paths.h"
@@ -55,11 +56,11 @@ void StateShare(const std::string &share, Output &output) {
     output.Line(Printable("share " + share + ": " + (paths.empty() ? "no folder is indexed" : Enumerate(paths))));
 }
 
-ExitStatus Finish(const StepReport &report, const std::string &trouble, Output &output) {
-    if (report.Status() != ExitStatus::Done) {
-        output.Error(report.Status(), trouble);
+ExitStatus Finish(ExitStatus status, const std::string &trouble, Output &output) {
+    if (status != ExitStatus::Done) {
+        output.Error(status, trouble);
     }
-    return report.Status();
+    return status;
 }
 
 void WarnOfOverwriting(const std::vector<std::string> &paths, const std::string &newShare, const Folders &folders,
@@ -108,6 +109,11 @@ void RefreshMonitor(const std::string &oldShare, const std::string &newShare, St
                withdrawn ? "" : "it could not be withdrawn");
 }
 
+// Nothing was reached: for lack of permission?
+ExitStatus StatusOf(const StepReport &report, bool isDenied) {
+    return report.Status() == ExitStatus::Unreachable && isDenied ? ExitStatus::Permission : report.Status();
+}
+
 bool Exists(const std::string &path) {
     struct stat status {};
     return lstat(path.c_str(), &status) == 0;
@@ -130,7 +136,7 @@ ExitStatus RenameShare(const Arguments &arguments, Output &output) {
     RefreshMonitor(oldShare, newShare, report);
     report.Show(output);
     StateShare(newShare, output);
-    return Finish(report,
+    return Finish(report.Status(),
                   "the folders are moved, but the monitor is not in step; \"fileindexctl share resume " +
                       ShellWord(newShare) + "\" registers it",
                   output);
@@ -176,7 +182,8 @@ ExitStatus PauseShare(const Arguments &arguments, Output &output) {
         StepReport::Perform(plan, VORK::FILEINDEX::Folders(), [&] { return IndexMgr::SharePause(share); });
     report.Show(output);
     StateShare(share, output);
-    return Finish(report, "the share \"" + share + "\" is not wholly at rest", output);
+    const bool isDenied = ProbeDaemon().condition == DaemonCondition::Denied;
+    return Finish(StatusOf(report, isDenied), "the share \"" + share + "\" is not wholly at rest", output);
 }
 
 ExitStatus ResumeShare(const Arguments &arguments, Output &output) {
@@ -190,7 +197,8 @@ ExitStatus ResumeShare(const Arguments &arguments, Output &output) {
         StepReport::Perform(plan, VORK::FILEINDEX::Folders(), [&] { return IndexMgr::ShareResume(share); });
     report.Show(output);
     StateShare(share, output);
-    return Finish(report, "the share \"" + share + "\" is not wholly at work", output);
+    return Finish(StatusOf(report, MayNotWrite(kRegistrationsFile)),
+                  "the share \"" + share + "\" is not wholly at work", output);
 }
 
 ExitStatus CleanShare(const Arguments &arguments, Output &output) {
