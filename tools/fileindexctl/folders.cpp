@@ -65,6 +65,18 @@ void ShowTable(const Json::Value &page, bool status, Output &output) {
     }
 }
 
+// A share without folders may also be one that is not there.
+std::string WhyEmpty(const Arguments &arguments, std::size_t total) {
+    if (total > 0) {
+        return "no folder on this page";
+    }
+    if (!arguments.Has("--share")) {
+        return "no folder is indexed";
+    }
+    RequireShare(arguments.One("--share"));
+    return "no folder of the share " + Quoted(arguments.One("--share")) + " is indexed";
+}
+
 }  // namespace
 
 ExitStatus ListFolders(const Arguments &arguments, Output &output) {
@@ -82,12 +94,13 @@ ExitStatus ListFolders(const Arguments &arguments, Output &output) {
     output.Data()["offset"] = static_cast<Json::UInt64>(offset);
     output.Data()["folder"] = page;
     if (page.empty()) {
-        output.Note(total == 0 ? "no folder is indexed" : "no folder on this page");
+        output.Note(WhyEmpty(arguments, total));
         return ExitStatus::Done;
     }
     if (arguments.Has("--paths")) {
         for (const auto &record : page) {
-            output.Line(record["path"].asString());
+            const std::string path = record["path"].asString();
+            output.Line(output.Width() > 0 ? Printable(path) : path);  // a terminal would obey what is in it
         }
         return ExitStatus::Done;
     }

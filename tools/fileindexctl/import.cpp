@@ -117,7 +117,12 @@ void StateConfiguration(Output &output) {
     const std::size_t total = ReadFolders().size();
     output.Data()["total"] = static_cast<Json::UInt64>(total);
     output.Line(std::to_string(total) + (total == 1 ? " folder is indexed" : " folders are indexed"));
-    output.Line(PauseText(StoredStatus().resumeTime));
+    long long resumeTime = -1;
+    if (StatusMgr::GetPauseInfo(resumeTime)) {
+        output.Line(PauseText(resumeTime));
+    } else {
+        output.Warn("whether indexing is paused cannot be told; \"fileindexctl doctor\" says why");
+    }
 }
 
 }  // namespace

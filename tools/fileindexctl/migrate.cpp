@@ -1,13 +1,20 @@
+#include "daemon.h"
 #include "failure.h"
 #include "handlers.h"
 #include "paths.h"
+#include "queue.h"
+#include "queue_files.h"
 #include "steps.h"
 #include "text.h"
 
 #include <fileindex/folders.h>
 #include <fileindex/updater.h>
 
+#include <vork/search.h>
+
 #include <set>
+#include <string>
+#include <vector>
 
 namespace fileindexctl {
 
@@ -27,13 +34,40 @@ std::vector<PlannedStep> Plan(const Folders &folders) {
     };
 }
 
-void State(const Folders &folders, Output &output) {
-    std::set<std::string> shares;
-    output.Data()["folders"] = Json::Value(Json::arrayValue);
-    for (const auto &folder : folders) {
-        shares.insert(ShareOf(folder.path));
-        output.Data()["folders"].append(folder.path);
+std::string Listed(const std::vector<std::string> &items) {
+    return items.empty() ? "none" : Enumerate(items);
+}
+
+// What holds afterwards, whatever the steps came to.
+void StateEffect(const Folders &folders, Output &output) {
+    std::set<std::string> waiting;
+    for (const auto &share : SharesOf(folders)) {
+        QueueFiles(QueuePathOf(share)).Visit([&](const QueueEvent *event) {
+            if (event != nullptr && event->type == kReindexEvent) {
+                waiting.insert(event->path);
+            }
+        });
     }
+    std::vector<std::string> queued;
+    for (const auto &folder : folders) {
+        if (waiting.count(folder.GetFullPath()) > 0) {
+            queued.push_back(folder.path);
+        }
+    }
+    const DaemonState daemon = ProbeDaemon();
+    const bool search = VORKSMBIsEnableSpotlight() != 0;
+    output.Data()["daemon"] = daemon.reachable;
+    output.Data()["search"] = search;
+    output.Data()["queued"] = ToArray(queued);
+    for (const auto &line : Align({{"daemon", daemon.text},
+                                   {"search", search ? "on" : "off"},
+                                   {"queued to be reindexed", Listed(queued)}},
+                                  0)) {
+        output.Line(line);
+    }
+}
+
+void StatePlan(const Folders &folders, Output &output) {
     if (folders.empty()) {
         output.Line("no folder is indexed: fileindexd is to stand still");
         return;
@@ -42,6 +76,7 @@ void State(const Folders &folders, Output &output) {
     for (const auto &folder : folders) {
         output.Line("  " + Printable(folder.path));
     }
+    const auto shares = SharesOf(folders);
     output.Line("watched for changes: " + Printable(Enumerate({shares.begin(), shares.end()})));
 }
 
@@ -50,8 +85,12 @@ void State(const Folders &folders, Output &output) {
 ExitStatus Migrate(const Arguments &arguments, Output &output) {
     const Folders folders = ReadFolders();
     output.Data()["dry_run"] = arguments.Has("--dry-run");
+    output.Data()["folders"] = Json::Value(Json::arrayValue);
+    for (const auto &folder : folders) {
+        output.Data()["folders"].append(folder.path);
+    }
     if (arguments.Has("--dry-run")) {
-        State(folders, output);
+        StatePlan(folders, output);
         output.Note("nothing was done");
         return ExitStatus::Done;
     }
@@ -59,7 +98,7 @@ ExitStatus Migrate(const Arguments &arguments, Output &output) {
                                             [] { return VORK::FILEINDEX::Updater_zol60_beta2(); });
     MarkDroppedEvents(report);
     report.Show(output);
-    State(folders, output);
+    StateEffect(folders, output);
     if (report.Status() != ExitStatus::Done) {
         output.Error(report.Status(), "this is not done whole; once the cause is mended, repeat the command");
     }

@@ -15,11 +15,14 @@ namespace {
 
 // The share that was asked for, or all with folders.
 std::set<std::string> Shares(const Arguments &arguments) {
-    if (arguments.Has("SHARE")) {
-        RequireShare(arguments.One("SHARE"));
-        return {arguments.One("SHARE")};
+    auto indexed = SharesOf(ReadFolders());
+    if (!arguments.Has("SHARE")) {
+        return indexed;
     }
-    return SharesOf(ReadFolders());
+    if (indexed.count(arguments.One("SHARE")) == 0) {
+        RequireShare(arguments.One("SHARE"));
+    }
+    return {arguments.One("SHARE")};
 }
 
 std::string Padded(std::string name) {
@@ -43,14 +46,23 @@ public:
                 ++leftOut_;
             } else {
                 --left_;
+                ++shown_;
                 ShowEvent(share, *event);
             }
         });
     }
 
+    void PassOver(const std::string &share) {
+        isAnyAway_ = true;
+        output_.Warn("the share \"" + share + "\" is away");
+    }
+
     void Finish() {
         output_.Data()["left_out"] = static_cast<Json::UInt64>(leftOut_);
         output_.Data()["malformed"] = static_cast<Json::UInt64>(malformed_);
+        if (shown_ + leftOut_ + malformed_ == 0 && !isAnyAway_) {
+            output_.Note("nothing waits");
+        }
         if (leftOut_ > 0) {
             output_.Note("left out: " + std::to_string(leftOut_));
         }
@@ -80,6 +92,8 @@ private:
     }
 
     unsigned long left_;
+    unsigned long shown_ = 0;
+    bool isAnyAway_ = false;
     unsigned long leftOut_ = 0;
     unsigned long malformed_ = 0;
     Output &output_;
@@ -104,7 +118,7 @@ ExitStatus ShowQueue(const Arguments &arguments, Output &output) {
     for (const auto &share : shares) {
         const std::string path = QueuePathOf(share);
         if (path.empty()) {
-            output.Warn("the share \"" + share + "\" is away");
+            listing.PassOver(share);
             continue;
         }
         listing.Show(share, QueueFiles(path));
@@ -116,7 +130,8 @@ ExitStatus ShowQueue(const Arguments &arguments, Output &output) {
 ExitStatus CountQueue(const Arguments &arguments, Output &output) {
     std::vector<std::vector<std::string>> rows = {{"SHARE", "EVENT", "LINES", "OLDEST"}};
     output.Data()["share"] = Json::Value(Json::arrayValue);
-    for (const auto &share : Shares(arguments)) {
+    const auto shares = Shares(arguments);
+    for (const auto &share : shares) {
         const auto backlog = ReadBacklog(share, "");
         Json::Value entry(Json::objectValue);
         entry["name"] = share;
@@ -128,8 +143,10 @@ ExitStatus CountQueue(const Arguments &arguments, Output &output) {
             output.Warn("the share \"" + share + "\" is away");
         }
     }
-    if (rows.size() == 1) {
+    if (shares.empty()) {
         output.Note("no folder is indexed");
+    }
+    if (rows.size() == 1) {
         return ExitStatus::Done;
     }
     for (const auto &line : Align(rows, output.Width())) {

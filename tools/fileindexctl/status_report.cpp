@@ -135,7 +135,9 @@ StatusReport ReportService(const std::string &onlyShare, Output &output) {
         shares[ShareOf(folder.path)].push_back(folder);
     }
     if (!onlyShare.empty()) {
-        RequireShare(onlyShare);
+        if (shares.count(onlyShare) == 0) {
+            RequireShare(onlyShare);
+        }
         shares = {{onlyShare, shares[onlyShare]}};
     }
     report.shares = {{"SHARE", "FOLDERS", "QUEUED", "OLDEST", "EVENTS"}};
