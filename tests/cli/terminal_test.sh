@@ -37,11 +37,13 @@ expect "NO_COLOR" 0 "$(NO_COLOR=1 on_terminal '' 'fileindexctl pause' | grep -c 
 expect "an empty NO_COLOR" 1 "$(NO_COLOR='' on_terminal '' 'fileindexctl pause' | grep -c "$escape\[31m")"
 expect "no colour in a pipe" 0 "$(on_terminal '' 'fileindexctl pause | cat' | grep -c "$escape")"
 
-for answer in '' n no maybe; do
-    on_terminal "$answer"$'\n' "fileindexctl remove $folder" >/tmp/refused
+for answer in $'\n' $'n\n' $'no\n' $'maybe\n' $'\004'; do
+    on_terminal "$answer" "fileindexctl remove $folder" >/tmp/refused
     expect "status of the answer \"$answer\"" 1 $?
     expect "the question" 1 "$(grep -c "^fileindexctl: this removes $folder .*Go on" /tmp/refused)"
 done
+expect "the line behind no answer" 1 "$(grep -c "^fileindexctl: nothing was changed" /tmp/refused)"
+expect "a path on a terminal" '/photo/\x1b[31m' "$(on_terminal '' "fileindexctl add '/photo/${escape}[31m' >/dev/null 2>&1; fileindexctl list --paths" | grep 31m)"
 expect "after the refusals" 1 "$(fileindexctl list | grep -c "$folder")"
 on_terminal $'y\n' "fileindexctl remove $folder" >/dev/null
 expect "after the consent" 0 "$(fileindexctl list 2>/dev/null | grep -c "$folder")"

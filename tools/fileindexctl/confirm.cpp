@@ -19,7 +19,9 @@ void RequireConsent(const Arguments &arguments, const std::string &consequence) 
     }
     std::fprintf(stderr, "fileindexctl: %s. Go on? [y/N] ", Printable(consequence).c_str());
     std::string answer;
-    std::getline(std::cin, answer);
+    if (!std::getline(std::cin, answer)) {
+        std::fputc('\n', stderr);  // nobody typed the end of the line
+    }
     if (answer != "y" && answer != "Y" && answer != "yes") {
         throw Failure(ExitStatus::No, "nothing was changed");
     }

@@ -4,6 +4,7 @@
 #define FILEINDEXCTL_FAILURE_H
 
 #include "exit_status.h"
+#include "text.h"
 
 #include <fileindex/config.h>
 
@@ -14,7 +15,9 @@ namespace fileindexctl {
 
 class Failure : public std::runtime_error {
 public:
-    Failure(ExitStatus status, const std::string &message) : std::runtime_error(message), status_(status) {}
+    // Escaped here, because what() would end at a NUL that a name brought along.
+    Failure(ExitStatus status, const std::string &message)
+        : std::runtime_error(Printable(message)), status_(status) {}
 
     ExitStatus Status() const { return status_; }
 
