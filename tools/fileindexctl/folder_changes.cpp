@@ -103,7 +103,8 @@ ExitStatus AddFolder(const Arguments &arguments, Output &output) {
     SetMedia(record, arguments.Has("--media") ? arguments.One("--media") : "all");
     WarnOfNesting(path, folders, output);
     if (!VORK::FILEINDEX::CanPathBeIndexed(path)) {
-        output.Warn("\"" + path + "\" is saved, but cannot be indexed at present");
+        output.Warn(Quoted(path) + " cannot be indexed at present; \"fileindexctl explain " + ShellWord(path) +
+                    "\" says why");
     }
     return Upsert(record, output);
 }

@@ -42,7 +42,10 @@ Json::Value FolderRecord(const Json::Value &record) {
 }
 
 std::string StatusText(const Json::Value &facts) {
-    return facts["is_valid"].asBool() ? facts["status"].asString() : "not indexable at present";
+    if (!facts["is_valid"].asBool()) {
+        return "not indexable at present";
+    }
+    return facts["status"].isNull() ? "unknown: no permission for the queue" : facts["status"].asString();
 }
 
 }  // namespace fileindexctl

@@ -2,6 +2,7 @@
 #include "folder_text.h"
 #include "handlers.h"
 #include "paths.h"
+#include "queue_files.h"
 #include "text.h"
 
 #include <fileindex/folders.h>
@@ -39,6 +40,15 @@ std::vector<Json::Value> Sorted(const Arguments &arguments) {
     return records;
 }
 
+bool IsQueueReadable(const std::string &share) {
+    try {
+        const QueueFiles files(QueuePathOf(share));
+        return true;
+    } catch (const Failure &) {
+        return false;
+    }
+}
+
 // Facts are computed for the page alone: each of them reads a queue.
 Json::Value WithFacts(Json::Value record) {
     Folder folder;
@@ -46,7 +56,12 @@ Json::Value WithFacts(Json::Value record) {
     Json::Value keys(Json::arrayValue);
     keys.append("status");
     keys.append("is_valid");
-    return folder.asJson(keys);
+    Json::Value result = folder.asJson(keys);
+    Json::Value &status = result["additional"]["status"];
+    if (status == "finished" && !IsQueueReadable(ShareOf(folder.path))) {
+        status = Json::Value();  // the library takes a queue that it may not read for none
+    }
+    return result;
 }
 
 void ShowTable(const Json::Value &page, bool status, Output &output) {

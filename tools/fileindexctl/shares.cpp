@@ -47,13 +47,24 @@ std::vector<std::string> RequireIndexed(const std::string &share, const Folders 
     return paths;
 }
 
+bool IsWatched(const std::string &share) {
+    try {
+        return ReadRegistrations().count(QueuePathOf(share)) > 0;
+    } catch (const Failure &) {
+        return false;  // nobody can read the file, the monitor neither
+    }
+}
+
 void StateShare(const std::string &share, Output &output) {
     const auto paths = PathsOf(share, ReadFolders());
     output.Data()["folders"] = Json::Value(Json::arrayValue);
     for (const auto &path : paths) {
         output.Data()["folders"].append(path);
     }
-    output.Line(Printable("share " + share + ": " + (paths.empty() ? "no folder is indexed" : Enumerate(paths))));
+    const bool isWatched = IsWatched(share);
+    output.Data()["watched"] = isWatched;
+    output.Line(Printable("share " + share + ": " + (paths.empty() ? "no folder is indexed" : Enumerate(paths)) +
+                          (isWatched ? ", watched for changes" : ", not watched for changes")));
 }
 
 ExitStatus Finish(ExitStatus status, const std::string &trouble, Output &output) {
@@ -183,7 +194,9 @@ ExitStatus PauseShare(const Arguments &arguments, Output &output) {
     report.Show(output);
     StateShare(share, output);
     const bool isDenied = ProbeDaemon().condition == DaemonCondition::Denied;
-    return Finish(StatusOf(report, isDenied), "the share \"" + share + "\" is not wholly at rest", output);
+    return Finish(
+        StatusOf(report, isDenied),
+        "the share \"" + share + "\" is not wholly at rest; once the cause is mended, repeat the command", output);
 }
 
 ExitStatus ResumeShare(const Arguments &arguments, Output &output) {
@@ -197,8 +210,9 @@ ExitStatus ResumeShare(const Arguments &arguments, Output &output) {
         StepReport::Perform(plan, VORK::FILEINDEX::Folders(), [&] { return IndexMgr::ShareResume(share); });
     report.Show(output);
     StateShare(share, output);
-    return Finish(StatusOf(report, MayNotWrite(kRegistrationsFile)),
-                  "the share \"" + share + "\" is not wholly at work", output);
+    return Finish(
+        StatusOf(report, MayNotWrite(kRegistrationsFile)),
+        "the share \"" + share + "\" is not wholly at work; once the cause is mended, repeat the command", output);
 }
 
 ExitStatus CleanShare(const Arguments &arguments, Output &output) {
