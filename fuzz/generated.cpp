@@ -64,10 +64,15 @@ int Seeds(const std::string &dir) {
         const char *target;
         Make make;
     } rows[] = {
-        {"json_differential", &NearValid::QueueLine}, {"json_differential", &NearValid::FolderConf},
-        {"json_differential", &NearValid::Document},  {"queue_file", &NearValid::Queue},
-        {"folder_conf", &NearValid::FolderConf},      {"status_conf", &NearValid::Document},
+        {"json_differential", &NearValid::QueueLine},
+        {"json_differential", &NearValid::FolderConf},
+        {"json_differential", &NearValid::Document},
+        {"queue_file", &NearValid::Queue},
+        {"folder_conf", &NearValid::FolderConf},
+        {"status_conf", &NearValid::Document},
         {"requests", &NearValid::FolderConf},
+        {"paths", &NearValid::QueueLine},
+        {"operations", &NearValid::Queue},
     };
     constexpr unsigned kSeeds = 40;
     unsigned number = 0;

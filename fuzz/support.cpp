@@ -57,12 +57,18 @@ std::string QueueOf(const std::string &share) {
     return "/vol1/" + share + "/" + names::kMetadataDir + "/" + names::kQueueFile;
 }
 
-void ResetMachine() {
+void ForgetCalls() {
     fileindex_test::Script::Current().Reset();
     fileindex_test::SyslogCapture::Clear();
+}
+
+void ResetMachine() {
+    ForgetCalls();
     auto &platform = fileindex_test::Platform::Current();
     platform = {};
     platform.searchOn = true;
+    platform.recycleBins = {"/vol1/a/#recycle"};
+    platform.snapshots = {"/vol1/a/#snapshot"};
     for (const char *share : kShares) {
         platform.shares[share] = {.path = std::string("/vol1/") + share,
                                   .readOnly = std::string_view(share) == "ro"};

@@ -22,8 +22,11 @@ inline constexpr const char *kShares[] = {"a", "b", "photo", "ro"};
 
 std::string QueueOf(const std::string &share);
 
-/// Removes what the library may have left: configuration files, the shares' index data, records. Makes the shares'
-/// directories when they are missing.
+/// Forgets what the platform and the log have kept of earlier inputs.
+void ForgetCalls();
+
+/// That, and removes what the library may have left: configuration files and the shares' index data. Makes the
+/// shares' directories when they are missing.
 void ResetMachine();
 
 /// The commands the daemon got since the last time, as {"type", "data"}; malformed frames end the program.
