@@ -1,4 +1,5 @@
 #include "names.h"
+#include "no_throw.h"
 #include "scoped.h"
 
 #include <fileindex/error.h>
@@ -83,83 +84,96 @@ bool IsSystemPreservedFileName(const std::string &name) {
 }
 
 bool IsSkipIndex(const std::string &fullPath) {
-    const int type = VORKGetFSType(fullPath.c_str(), 0);
-    const std::size_t slash = fullPath.rfind('/');
-    if (slash == std::string::npos || IsSystemPreservedFileName(fullPath.substr(slash + 1)) ||
-        IsInRecycleBin(fullPath) || IsInSnapshot(fullPath)) {
-        return true;
-    }
-    // Unlike CanFullPathBeIndexed: skipping a file for want of an answer would leave it out of the index for good.
-    return type != kUnknownFileSystem && IsForeignFileSystem(type);
+    return internal::NoThrow([&] {
+        const int type = VORKGetFSType(fullPath.c_str(), 0);
+        const std::size_t slash = fullPath.rfind('/');
+        if (slash == std::string::npos || IsSystemPreservedFileName(fullPath.substr(slash + 1)) ||
+            IsInRecycleBin(fullPath) || IsInSnapshot(fullPath)) {
+            return true;
+        }
+        // Unlike CanFullPathBeIndexed: skipping a file for want of an answer would leave it out of the index for
+        // good.
+        return type != kUnknownFileSystem && IsForeignFileSystem(type);
+    });
 }
 
 bool CanPathBeIndexed(const std::string &sharePath) {
-    std::string fullPath;
-    if (!GetFullPath(fullPath, sharePath)) {
-        syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", kUtilsModule, 191, sharePath.c_str());
-        ErrorHandler::SetError(FILEINDEX_ERR_PATH);
-        return false;
-    }
-    return CanFullPathBeIndexed(fullPath);
+    return internal::NoThrow([&] {
+        std::string fullPath;
+        if (!GetFullPath(fullPath, sharePath)) {
+            syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", kUtilsModule, 191, sharePath.c_str());
+            ErrorHandler::SetError(FILEINDEX_ERR_PATH);
+            return false;
+        }
+        return CanFullPathBeIndexed(fullPath);
+    });
 }
 
 bool CanFullPathBeIndexed(const std::string &fullPath) {
-    if (IsInRecycleBin(fullPath) || IsInSnapshot(fullPath)) {
-        return false;
-    }
-    const int type = VORKGetFSType(fullPath.c_str(), 0);
-    if (type == kUnknownFileSystem || IsForeignFileSystem(type)) {
-        return false;
-    }
-    std::string shareName;
-    std::string sharePath;
-    if (!GetShareNamePathByFullPath(shareName, sharePath, fullPath)) {
-        syslog(LOG_ERR, "%s:%d GetShareNamePathByFullPath failed, path=%s", kUtilsModule, 239, fullPath.c_str());
-        return false;
-    }
-    const internal::Share share = internal::FindShare(shareName);
-    if (!share) {
-        syslog(LOG_ERR, "%s:%d VORKShareGet failed, share=%s", kUtilsModule, 245, shareName.c_str());
-        return false;
-    }
-    if (!CanShareBeIndexed(share.get())) {
-        return false;
-    }
-    if (IsForeignMountPoint(fullPath, share.get())) {
-        syslog(LOG_ERR, "%s:%d Mount point[%s] is not allowed to be indexed", kUtilsModule, 256, fullPath.c_str());
-        return false;
-    }
-    if (!IsRealPath(fullPath)) {
-        syslog(LOG_ERR, "%s:%d check realpath failed, path=%s", kUtilsModule, 263, fullPath.c_str());
-        return false;
-    }
-    return true;
+    return internal::NoThrow([&] {
+        if (IsInRecycleBin(fullPath) || IsInSnapshot(fullPath)) {
+            return false;
+        }
+        const int type = VORKGetFSType(fullPath.c_str(), 0);
+        if (type == kUnknownFileSystem || IsForeignFileSystem(type)) {
+            return false;
+        }
+        std::string shareName;
+        std::string sharePath;
+        if (!GetShareNamePathByFullPath(shareName, sharePath, fullPath)) {
+            syslog(LOG_ERR, "%s:%d GetShareNamePathByFullPath failed, path=%s", kUtilsModule, 239,
+                   fullPath.c_str());
+            return false;
+        }
+        const internal::Share share = internal::FindShare(shareName);
+        if (!share) {
+            syslog(LOG_ERR, "%s:%d VORKShareGet failed, share=%s", kUtilsModule, 245, shareName.c_str());
+            return false;
+        }
+        if (!CanShareBeIndexed(share.get())) {
+            return false;
+        }
+        if (IsForeignMountPoint(fullPath, share.get())) {
+            syslog(LOG_ERR, "%s:%d Mount point[%s] is not allowed to be indexed", kUtilsModule, 256,
+                   fullPath.c_str());
+            return false;
+        }
+        if (!IsRealPath(fullPath)) {
+            syslog(LOG_ERR, "%s:%d check realpath failed, path=%s", kUtilsModule, 263, fullPath.c_str());
+            return false;
+        }
+        return true;
+    });
 }
 
 bool CanShareBeIndexed(_tag_VORKSHARE *share) {
-    if (share == nullptr || share->szName == nullptr || Contains(kSkippedShares, share->szName)) {
-        return false;
-    }
-    int encrypted = 0;
-    int readOnly = 0;
-    if (VLIBShareIsEncryptedGet(share, &encrypted) < 0 || VLIBShareIsReadOnlyGet(share, &readOnly) < 0) {
-        return false;
-    }
-    return encrypted == 0 && readOnly == 0;
+    return internal::NoThrow([&] {
+        if (share == nullptr || share->szName == nullptr || Contains(kSkippedShares, share->szName)) {
+            return false;
+        }
+        int encrypted = 0;
+        int readOnly = 0;
+        if (VLIBShareIsEncryptedGet(share, &encrypted) < 0 || VLIBShareIsReadOnlyGet(share, &readOnly) < 0) {
+            return false;
+        }
+        return encrypted == 0 && readOnly == 0;
+    });
 }
 
 bool IsShareSpaceEnough(const std::string &shareName) {
-    const internal::Share share = internal::FindShare(shareName);
-    if (!share) {
-        syslog(LOG_ERR, "%s:%d VORKShareGet failed, share=%s", kUtilsModule, 361, shareName.c_str());
-        return false;
-    }
-    if (VORKQuotaIsEnough(0, share->szPath, kRequiredSpace) != 0) {
-        return true;
-    }
-    // A check that failed for another reason must not stop indexing.
-    const int error = VLIBCErrGet();
-    return error != internal::kPlatformNoSpace && error != internal::kPlatformQuota;
+    return internal::NoThrow([&] {
+        const internal::Share share = internal::FindShare(shareName);
+        if (!share) {
+            syslog(LOG_ERR, "%s:%d VORKShareGet failed, share=%s", kUtilsModule, 361, shareName.c_str());
+            return false;
+        }
+        if (VORKQuotaIsEnough(0, share->szPath, kRequiredSpace) != 0) {
+            return true;
+        }
+        // A check that failed for another reason must not stop indexing.
+        const int error = VLIBCErrGet();
+        return error != internal::kPlatformNoSpace && error != internal::kPlatformQuota;
+    });
 }
 
 }  // namespace FILEINDEX

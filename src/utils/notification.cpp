@@ -1,3 +1,5 @@
+#include "no_throw.h"
+
 #include <fileindex/daemon.h>
 
 #include <vork/process.h>
@@ -23,7 +25,7 @@ bool NotifyNoSpace() {
         "</a>",
         nullptr,
     };
-    return VLIBCExecv(kTool, argv, 1, 0) == 0;
+    return internal::NoThrow([&] { return VLIBCExecv(kTool, argv, 1, 0) == 0; });
 }
 
 }  // namespace FILEINDEX
