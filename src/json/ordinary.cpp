@@ -6,6 +6,7 @@
 #include <simdjson.h>
 
 #include <algorithm>
+#include <cmath>
 #include <cstdint>
 #include <iterator>
 #include <limits>
@@ -20,16 +21,23 @@ using simdjson::dom::object;
 
 constexpr std::size_t kMaxDepth = 16;  // far below the exact reader's limit
 
-/// The two readers may differ about \u escapes of surrogates. One search settles it for most texts.
-bool HasUnicodeEscape(std::string_view text) {
-    return text.find('\\') != std::string_view::npos && text.find("\\u") != std::string_view::npos;
+/// The two readers may differ about halves of surrogate pairs. One search settles it for most texts.
+bool MayHaveSurrogates(std::string_view text) {
+    return text.find('\\') != std::string_view::npos &&
+           (text.find("\\ud") != std::string_view::npos || text.find("\\uD") != std::string_view::npos);
 }
 
-/// Free of reals: their range is where the two readers may differ.
+/// Both readers accept it: far from the ends of the range, where one of them may give up.
+bool IsPlainReal(double value) {
+    constexpr double kLargest = 1e300;
+    const double magnitude = std::abs(value);
+    return magnitude < kLargest && magnitude > 1 / kLargest;
+}
+
 bool IsPlain(const element &value) {
     switch (value.type()) {
         case element_type::DOUBLE:
-            return false;
+            return IsPlainReal(value.get_double().value_unsafe());
         case element_type::ARRAY:
             for (const element child : simdjson::dom::array(value.get_array().value_unsafe())) {
                 if (!IsPlain(child)) {
@@ -92,7 +100,7 @@ struct OrdinaryReader::Parser {
 
     /// The text's top-level object; it is kept in the parser until the next text.
     bool Parse(std::string_view text, object &root) {
-        return !text.empty() && !HasUnicodeEscape(text) && HasRoomFor(text.size()) &&
+        return !text.empty() && !MayHaveSurrogates(text) && HasRoomFor(text.size()) &&
                parser.parse(text.data(), text.size(), false).get_object().get(root) == simdjson::SUCCESS;
     }
 
@@ -123,31 +131,26 @@ bool OrdinaryReader::ReadEvent(std::string_view line, OrdinaryEvent &event) {
     if (!parser_->Parse(line, root)) {
         return false;
     }
+    // Of repeated members the last one counts, whatever the others are.
     std::uint64_t type = 0;
-    int types = 0;
-    int paths = 0;
-    int oldPaths = 0;
+    bool hasType = false;
+    bool hasPath = false;
     event.oldPath = {};
     for (const auto member : root) {
-        if (member.key == kEventKey) {
-            ++types;
-            if (member.value.get_uint64().get(type) != simdjson::SUCCESS) {
-                return false;
-            }
-        } else if (member.key == kPathKey) {
-            ++paths;
-            if (member.value.get_string().get(event.path) != simdjson::SUCCESS) {
-                return false;
-            }
-        } else if (member.key == kOldPathKey && member.value.is_string()) {
-            ++oldPaths;
-            event.oldPath = member.value.get_string().value_unsafe();
-        } else if (member.key == kOldPathKey || !IsPlain(member.value)) {
+        if (!IsPlain(member.value)) {
             return false;
+        }
+        if (member.key == kEventKey) {
+            hasType = member.value.get_uint64().get(type) == simdjson::SUCCESS;
+        } else if (member.key == kPathKey) {
+            hasPath = member.value.get_string().get(event.path) == simdjson::SUCCESS;
+        } else if (member.key == kOldPathKey) {
+            const bool isText = member.value.get_string().get(event.oldPath) == simdjson::SUCCESS;
+            event.oldPath = isText ? event.oldPath : std::string_view();
         }
     }
     event.type = static_cast<unsigned>(type);
-    return types == 1 && paths == 1 && oldPaths <= 1 && type <= std::numeric_limits<unsigned>::max();
+    return hasType && hasPath && type <= std::numeric_limits<unsigned>::max();
 }
 
 bool OrdinaryReader::ReadFolders(std::string_view text, std::vector<FolderRecord> &records) {

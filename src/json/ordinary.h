@@ -2,8 +2,8 @@
 /// A fast reader for ordinary JSON: what this library and the other writers of its files really write.
 ///
 /// It decides only what it is sure of and leaves everything else to JsonReader, so that its answers are never
-/// different: repeated or unsorted members, reals, unusual nesting, \u escapes, text that is not UTF-8 or not
-/// JSON at all. A differential fuzz target keeps the two in step.
+/// different: members that are unsorted or of unusual types, extreme reals, deep nesting, escaped surrogates, text
+/// that is not UTF-8 or not JSON at all. A differential fuzz target keeps the two in step.
 #ifndef FILEINDEX_SRC_JSON_ORDINARY_H
 #define FILEINDEX_SRC_JSON_ORDINARY_H
 

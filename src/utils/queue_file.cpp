@@ -5,8 +5,6 @@
 #include "names.h"
 #include "scoped.h"
 
-#include <fileindex/json_access.h>
-
 #include <json/value.h>
 
 #include <fcntl.h>
@@ -185,25 +183,38 @@ private:
         if (!exact_) {
             exact_.emplace();
         }
-        Json::Value record;
-        path_.clear();
-        old_path_.clear();
-        if (!exact_->Parse(line, record) || !RetrieveStringFromJsonObj(path_, kPathKey, record)) {
+        if (!exact_->Parse(line, record_) || !record_.isObject()) {
             return false;
         }
-        const Json::Value *type = record.find(std::begin(kEventKey), std::end(kEventKey) - 1);
-        if (type == nullptr || !type->isConvertibleTo(Json::uintValue)) {
+        const Json::Value *type = Member(kEventKey);
+        std::string_view path;
+        if (type == nullptr || !type->isConvertibleTo(Json::uintValue) || !ReadText(kPathKey, path)) {
             return false;
         }
-        RetrieveStringFromJsonObj(old_path_, kOldPathKey, record);
-        event_ = {type->asUInt(), path_, old_path_};
+        std::string_view oldPath;
+        ReadText(kOldPathKey, oldPath);
+        event_ = {type->asUInt(), path, oldPath};
+        return true;
+    }
+
+    const Json::Value *Member(std::string_view key) const {
+        return record_.find(key.data(), key.data() + key.size());
+    }
+
+    bool ReadText(std::string_view key, std::string_view &text) const {
+        const Json::Value *member = Member(key);
+        char const *begin = nullptr;
+        char const *end = nullptr;
+        if (member == nullptr || !member->getString(&begin, &end)) {
+            return false;
+        }
+        text = {begin, static_cast<std::size_t>(end - begin)};
         return true;
     }
 
     OrdinaryReader ordinary_;
     std::optional<JsonReader> exact_;
-    std::string path_;
-    std::string old_path_;
+    Json::Value record_;
     QueueEvent event_;
 };
 
