@@ -14,7 +14,14 @@
 namespace fileindexctl {
 
 /// What comes behind a parameter's name; for a positional argument, how often it may stand.
-enum class Takes { Nothing, One, Number, Optional, Many };
+enum class Takes {
+    Nothing,
+    One,
+    Number,
+    Optional,
+    Many,
+    Rest,  ///< all that follows, whatever it looks like
+};
 
 /// A positional argument ("PATH") or an option ("--share").
 struct Parameter {

@@ -38,6 +38,8 @@ constexpr Parameter kQuestion[] = {{"PATH", Takes::One, "", "a share path (/SHAR
 constexpr Parameter kPause[] = {
     {"HOURS", Takes::Optional, "", "for how long: 8h or 8; 0 or nothing: without an end"},
     {"--until", Takes::One, "HH:MM", "until this local time comes next"},
+    {"--run", Takes::Rest, "COMMAND ...",
+     "while this command, the rest of the line, runs; its exit status is kept"},
 };
 constexpr Parameter kStatus[] = {
     {"PATH", Takes::Optional, "", "only this indexed folder"},

@@ -130,6 +130,10 @@ Pause until the next morning:
 .Pp
 .Dl fileindexctl pause --until 07:00
 .Pp
+Pause while something else needs the disks; 127 means that it was not found, 126 that it could not be run:
+.Pp
+.Dl fileindexctl pause --run backup --all
+.Pp
 Move the configuration to another machine; the first command on it only looks:
 .Pp
 .Dl fileindexctl export -o fileindex.json

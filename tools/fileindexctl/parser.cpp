@@ -48,8 +48,9 @@ public:
 
     Invocation Run(int argc, const char *const argv[]) {
         Invocation invocation;
+        const auto own = SplitOff(argc, argv);
         try {
-            app_.parse(argc, argv);
+            app_.parse(static_cast<int>(own.size()), own.data());
         } catch (const CLI::CallForHelp &) {
             invocation.help = app_.help();
             return invocation;
@@ -70,6 +71,31 @@ public:
     }
 
 private:
+    // The part of the line that is for this program. Of what is behind an option that takes the rest, the first
+    // word stays there, so that the option has a value.
+    std::vector<const char *> SplitOff(int argc, const char *const argv[]) {
+        std::vector<const char *> own;
+        for (int i = 0; i < argc && rest_.empty(); ++i) {
+            own.push_back(argv[i]);
+            if (i + 1 < argc && TakesRest(argv[i])) {
+                rest_.assign(argv + i + 1, argv + argc);
+                own.push_back(argv[i + 1]);
+            }
+        }
+        return own;
+    }
+
+    static bool TakesRest(std::string_view word) {
+        for (const auto &command : Commands()) {
+            for (const auto &parameter : command.parameters) {
+                if (parameter.takes == Takes::Rest && parameter.name == word) {
+                    return true;
+                }
+            }
+        }
+        return false;
+    }
+
     // A word that is no command is not what the parser complains about first.
     std::string Explain(const CLI::ParseError &error) const {
         const auto words = app_.remaining(true);
@@ -133,7 +159,7 @@ private:
         }
     }
 
-    static Arguments ArgumentsOf(const Command &command, const CLI::App &app) {
+    Arguments ArgumentsOf(const Command &command, const CLI::App &app) const {
         Arguments arguments;
         for (const auto &parameter : command.parameters) {
             const CLI::Option *option = app.get_option(std::string(parameter.name));
@@ -141,13 +167,15 @@ private:
                 continue;
             }
             const bool flag = parameter.takes == Takes::Nothing;
-            arguments.Set(parameter.name, flag ? std::vector<std::string>() : option->results());
+            const bool rest = parameter.takes == Takes::Rest && !rest_.empty();
+            arguments.Set(parameter.name, flag ? std::vector<std::string>() : rest ? rest_ : option->results());
         }
         return arguments;
     }
 
     CLI::App app_;
     bool json_ = false;
+    std::vector<std::string> rest_;
     std::map<std::string_view, CLI::App *> groups_;
     std::vector<std::pair<const Command *, CLI::App *>> commands_;
 };

@@ -161,8 +161,14 @@ bool IsPaused(long long resumeTime) {
 }
 
 ExitStatus PauseIndexing(const Arguments &arguments, Output &output) {
-    if (arguments.Has("HOURS") && arguments.Has("--until")) {
-        throw Failure(ExitStatus::Usage, "give a number of hours or --until, not both");
+    if (arguments.Has("HOURS") + arguments.Has("--until") + arguments.Has("--run") > 1) {
+        throw Failure(ExitStatus::Usage, "give a number of hours, --until or --run, not several of them");
+    }
+    if (arguments.Has("--run")) {
+        if (arguments.All("--run").front().starts_with("-")) {
+            throw Failure(ExitStatus::Usage, "--run: a command is expected, not an option");
+        }
+        return PauseWhile(arguments.All("--run"), output);
     }
     if (arguments.Has("--until")) {
         const long long resumeTime = ParseUntil(arguments.One("--until"));

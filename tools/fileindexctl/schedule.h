@@ -7,6 +7,7 @@
 
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace fileindexctl {
 
@@ -19,6 +20,10 @@ std::string PauseText(long long resumeTime);
 
 /// How long ago that was: "12 min"; "-" when it is not known.
 std::string AgeText(const std::optional<long long> &since);
+
+/// "pause --run": pauses while the command runs, and ends with its exit status. Throws Failure when indexing
+/// cannot be paused; the command is not run then.
+ExitStatus PauseWhile(const std::vector<std::string> &command, Output &output);
 
 /// Does a pause with such an end hold now?
 bool IsPaused(long long resumeTime);

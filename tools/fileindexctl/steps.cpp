@@ -139,7 +139,8 @@ ExitStatus StepReport::Status() const {
     return Has(StepResult::Done) ? ExitStatus::Partly : ExitStatus::Unreachable;
 }
 
-void StepReport::Show(Output &output) const {
+// Fills "steps", and gives the lines.
+std::vector<std::string> StepReport::Tell(Output &output) const {
     std::vector<std::vector<std::string>> rows;
     auto &list = output.Data()["steps"];
     for (const auto &step : steps_) {
@@ -151,7 +152,17 @@ void StepReport::Show(Output &output) const {
         entry["detail"] = step.detail;
         list.append(entry);
     }
-    const auto lines = Align(rows, 0);
+    return Align(rows, 0);
+}
+
+void StepReport::Note(Output &output) const {
+    for (const auto &line : Tell(output)) {
+        output.Note(line);
+    }
+}
+
+void StepReport::Show(Output &output) const {
+    const auto lines = Tell(output);
     for (std::size_t i = 0; i < lines.size(); ++i) {
         output.Line(output.Paint(WordingOf(steps_[i].result).colour, lines[i]));
     }

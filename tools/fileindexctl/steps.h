@@ -77,12 +77,18 @@ public:
     /// Lines for people, "steps" for programs, a warning for each failure that the library does not count.
     void Show(Output &output) const;
 
+    /// The same on stderr, when stdout is another program's.
+    void Note(Output &output) const;
+
 private:
     struct Step {
         std::string name;
         StepResult result;
         std::string detail;
     };
+
+    std::vector<std::string> Tell(Output &output) const;
+
     std::vector<Step> steps_;
 };
 
