@@ -6,6 +6,7 @@
 #include "queue.h"
 #include "rules.h"
 #include "schedule.h"
+#include "status_file.h"
 #include "text.h"
 
 #include <fileindex/folders.h>
@@ -28,6 +29,7 @@ struct ShareFlags {
     bool noSpace = false;      // marked
     bool hasRoom = true;       // measured
     bool needReindex = false;  // marked
+    bool areMarksKnown = true;
 };
 
 struct Explanation {
@@ -93,6 +95,8 @@ std::string FirstPassedOver(const std::string &top, const std::string &path) {
 ShareFlags FlagsOf(const std::string &share) {
     ShareFlags flags{share};
     if (!share.empty()) {
+        StatusFile status;
+        flags.areMarksKnown = status.Load() && (status.Document().isObject() || status.Document().isNull());
         flags.noSpace = StatusMgr::ShareIsNoSpace(share);
         flags.needReindex = StatusMgr::ShareIsNeedReindex(share);
         flags.hasRoom = !IsSharePresent(share) || VORK::FILEINDEX::IsShareSpaceEnough(share);
@@ -165,6 +169,9 @@ std::string RemedyFor(const Explanation &explanation) {
     if (!explanation.share.hasRoom) {
         return "make room on the volume of the share (10 MiB), then \"fileindexctl revive " + share + "\"";
     }
+    if (!explanation.share.areMarksKnown) {
+        return "\"fileindexctl doctor\" tells what is wrong with the status file";
+    }
     if (explanation.share.noSpace) {
         return "\"fileindexctl revive " + share + "\", as there is room again";
     }
@@ -200,6 +207,9 @@ std::string FlagsText(const ShareFlags &flags) {
     }
     if (flags.needReindex) {
         items.emplace_back("waiting for a reindex");
+    }
+    if (!flags.areMarksKnown) {
+        items.emplace_back("its marks cannot be told");
     }
     return flags.name + (items.empty() ? "" : ": " + Enumerate(items));
 }
@@ -287,12 +297,13 @@ void FillData(const Explanation &explanation, const std::string &remedy, Json::V
     data["passed_over"] = Text(explanation.passedOver);
     data["queue"] = explanation.backlog ? BacklogJson(*explanation.backlog) : Json::Value();
     data["reindexed_with"] = ToArray(explanation.reindexed);
+    const auto mark = [&](bool set) { return explanation.share.areMarksKnown ? Json::Value(set) : Json::Value(); };
     auto &share = data["share"];
     if (!explanation.share.name.empty()) {
         share["name"] = explanation.share.name;
-        share["no_space"] = explanation.share.noSpace;
+        share["no_space"] = mark(explanation.share.noSpace);
         share["has_room"] = explanation.share.hasRoom;
-        share["need_reindex"] = explanation.share.needReindex;
+        share["need_reindex"] = mark(explanation.share.needReindex);
     }
     data["resume_time"] =
         explanation.isPauseKnown ? Json::Value(static_cast<Json::Int64>(explanation.resumeTime)) : Json::Value();

@@ -10,8 +10,12 @@
 
 #include <vork/error.h>
 
+#include <fcntl.h>
+#include <unistd.h>
+
 #include <algorithm>
 #include <array>
+#include <cerrno>
 
 namespace fileindexctl {
 
@@ -114,6 +118,10 @@ std::string RequireShare(const std::string &share) {
                               "\" cannot be indexed: its directory has another name than the share. Rename "
                               "one of them, or bind mount the directory under the share's name");
         default:
+            if (faccessat(AT_FDCWD, kPlatformFile, R_OK, AT_EACCESS) != 0 && errno == EACCES) {
+                throw Failure(ExitStatus::Permission, std::string("no permission for ") + kPlatformFile +
+                                                          "; run this as the administrator");
+            }
             throw Failure(ExitStatus::NotConfigured,
                           "the share \"" + share + "\" cannot be looked up; " + kWhereSharesAre);
     }

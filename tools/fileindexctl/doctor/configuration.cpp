@@ -88,6 +88,11 @@ bool IsPauseReadable(const Json::Value &document) {
     return file.GetPauseInfo(resumeTime);
 }
 
+// The library leaves null behind when it takes a mark back that was not there.
+bool IsFlag(const Json::Value &member) {
+    return member.isObject() || member.isNull();
+}
+
 struct MemberRule {
     const char *name;
     bool (*holds)(const Json::Value &document);
@@ -98,12 +103,10 @@ struct MemberRule {
 constexpr MemberRule kMembers[] = {
     {"resume_time", IsPauseReadable, "a number",
      "whether indexing is paused cannot be told, and reports of the state fail"},
-    {"no_space",
-     [](const Json::Value &document) { return document.get("no_space", Json::objectValue).isObject(); },
-     "an object", "no share can be marked as out of space, nor revived"},
-    {"need_reindex",
-     [](const Json::Value &document) { return document.get("need_reindex", Json::objectValue).isObject(); },
-     "an object", "no share can be marked to be reindexed"},
+    {"no_space", [](const Json::Value &document) { return IsFlag(document["no_space"]); }, "an object",
+     "no share can be marked as out of space, nor revived"},
+    {"need_reindex", [](const Json::Value &document) { return IsFlag(document["need_reindex"]); }, "an object",
+     "no share can be marked to be reindexed"},
 };
 
 Findings CheckMembers(const std::string &path, const Json::Value &document) {
@@ -133,8 +136,9 @@ Findings CheckPlatform() {
         ReadPlatformFile();
         return {};
     } catch (const Failure &failure) {
+        const bool isDenied = failure.Status() == ExitStatus::Permission;
         return {{failure.what(), "without it the platform knows no shares, and nothing can be indexed",
-                 "mend it with an editor, or write a new one"}};
+                 isDenied ? "run this as the administrator" : "mend it with an editor, or write a new one"}};
     }
 }
 

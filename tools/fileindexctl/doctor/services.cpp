@@ -63,6 +63,16 @@ Finding Standstill(const std::string &what) {
     return finding;
 }
 
+// Otherwise the setting reads as off, and there is another finding.
+bool IsPlatformReadable() {
+    try {
+        ReadPlatformFile();
+        return true;
+    } catch (const Failure &) {
+        return false;
+    }
+}
+
 void SwitchSearchOn() {
     if (VORKSMBSetSpotlight(1) < 0) {
         throw Failure(ExitStatus::CannotSave, "the search setting could not be changed");
@@ -124,7 +134,7 @@ Findings CheckServices(const Facts &facts) {
 }
 
 Findings CheckSearch(const Facts &facts) {
-    if (facts.folders.empty() || VORKSMBIsEnableSpotlight() != 0) {
+    if (facts.folders.empty() || VORKSMBIsEnableSpotlight() != 0 || !IsPlatformReadable()) {
         return {};
     }
     Finding finding{"the search setting is off", "folders are indexed, but clients cannot search them",
