@@ -7,9 +7,11 @@
 #include <vork/error.h>
 
 #include <fcntl.h>
+#include <sys/statvfs.h>
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstring>
 
 namespace fileindexctl {
 
@@ -35,10 +37,6 @@ bool MayNotOpenLock(const std::string &path) {
 
 bool MayNot(const std::string &path, int mode) {
     return faccessat(AT_FDCWD, path.c_str(), mode, AT_EACCESS) != 0 && IsDenied(errno);
-}
-
-Failure Denied(const std::string &path) {
-    return {ExitStatus::Permission, "no permission for " + path + "; run this as the administrator"};
 }
 
 Failure LockFailure(const std::string &path) {
@@ -67,6 +65,15 @@ Failure SaveFailure(const std::string &path) {
 }
 
 }  // namespace
+
+Failure Denied(const std::string &path) {
+    struct statvfs status {};
+    const std::string directory = path.substr(0, path.rfind('/') + 1);
+    if (statvfs(directory.c_str(), &status) == 0 && (status.f_flag & ST_RDONLY) != 0 && !MayNot(path, R_OK)) {
+        return {ExitStatus::Permission, path + " cannot be written: " + std::strerror(EROFS)};
+    }
+    return {ExitStatus::Permission, "no permission for " + path + "; run this as the administrator"};
+}
 
 bool MayNotWrite(const std::string &path) {
     return MayNot(path, W_OK) ||

@@ -32,6 +32,9 @@ void ForgetErrors();
 /// Is it for lack of permission that the file cannot be written, or made in its directory?
 bool MayNotWrite(const std::string &path);
 
+/// What to say when a file may not be read or written.
+Failure Denied(const std::string &path);
+
 /// The library's last error code in words and as an exit status, for an operation on the file of `config`.
 Failure FailureOf(const VORK::FILEINDEX::Config &config);
 

@@ -13,6 +13,7 @@
 #include <cerrno>
 #include <csignal>
 #include <cstring>
+#include <ctime>
 #include <optional>
 #include <vector>
 
@@ -94,6 +95,22 @@ int Run(const std::vector<std::string> &command, const HeldSignals &signals, Out
     return WIFEXITED(status) ? WEXITSTATUS(status) : kSignalled + WTERMSIG(status);
 }
 
+// The library gives a taken lock up within milliseconds. Other programs hold it longer, and a pause that is left
+// behind is worse than a wait.
+StepReport SetPausePatiently(long long resumeTime) {
+    constexpr timespec kInterval = {0, 100'000'000};
+    for (int left = 100;; --left) {
+        try {
+            return SetPause(resumeTime, "end saved");
+        } catch (const Failure &failure) {
+            if (failure.Status() != ExitStatus::Busy || left == 0) {
+                throw;
+            }
+        }
+        nanosleep(&kInterval, nullptr);
+    }
+}
+
 // What is to hold afterwards; nothing when somebody has changed the pause meanwhile, or it was without an end
 // before.
 std::optional<long long> WhatToRestore(long long before) {
@@ -107,7 +124,7 @@ std::optional<long long> WhatToRestore(long long before) {
 ExitStatus Restore(long long before, Output &output) {
     try {
         if (const auto resumeTime = WhatToRestore(before)) {
-            const StepReport report = SetPause(*resumeTime, "end saved");
+            const StepReport report = SetPausePatiently(*resumeTime);
             report.Note(output);
             if (report.Status() != ExitStatus::Done) {
                 output.Error(report.Status(),

@@ -102,7 +102,7 @@ Failure WhyNotQueued(const std::vector<Place> &places, bool anyQueued) {
     std::array<char, 4096> queue{};
     FILEIDXQueuePathGet(ShareOf(places.front().path).c_str(), queue.data(), queue.size());
     const std::string path = queue.data();
-    return {MayNotWrite(path) ? ExitStatus::Permission : ExitStatus::CannotSave, path + " cannot be written"};
+    return MayNotWrite(path) ? Denied(path) : Failure(ExitStatus::CannotSave, path + " cannot be written");
 }
 
 struct Revival {
