@@ -39,10 +39,10 @@ void CheckPath(const std::string &path) {
     Require(share == (path.empty() ? "untouched" : ShareOf(path)), "another share name", path);
 
     std::string full = "untouched";
-    const bool known = IsShare(ShareOf(path));
+    const bool known = IsShare(ShareOf(path)) && path.find('\0') == std::string::npos;
     Require(GetFullPath(full, path) == known, "full path", path);
     Require(full == (known ? "/vol1" + path : "untouched"), "another full path", path);
-    if (known && path[0] == '/' && path.find('\0') == std::string::npos) {
+    if (known && path[0] == '/') {
         std::string name;
         std::string directory;
         Require(GetShareNamePathByFullPath(name, directory, full), "the way back", path);

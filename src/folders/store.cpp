@@ -124,7 +124,8 @@ bool Folders::List(std::vector<Folder> &out) {
 
 bool Folders::List(std::vector<Folder> &out, const std::string &share) {
     return internal::NoThrow([&] {
-        const std::string wanted = share;  // may be a field of the list that is cleared now
+        // May be a field of the list that is cleared now.
+        const std::string wanted = share;  // NOLINT(performance-unnecessary-copy-initialization)
         out.clear();
         for (const auto &[path, folder] : folders_) {
             std::string owner;
@@ -189,6 +190,8 @@ bool Folders::Delete(Json::Value &out, const std::string &path) {
     });
 }
 
+// Taken by value since the first release; programs are linked with it.
+// NOLINTNEXTLINE(performance-unnecessary-value-param)
 Json::Value GetMostSuitableCfg(std::vector<Folder> folders, const std::string &path) {
     internal::Governing governing(path);
     for (const Folder &folder : folders) {

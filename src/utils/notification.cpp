@@ -9,6 +9,9 @@ namespace FILEINDEX {
 
 bool NotifyNoSpace() {
     constexpr char kTool[] = "/usr/vork/bin/vorkzolnotify";
+    constexpr char kLink[] =
+        "<a data-vork-app=\"VORK.KDX.AdminCenter.Application\" "
+        "data-vork-fn=\"VORK.KDX.AdminCenter.MediaIndex.Main\" data-vork-tab=\"fileIndex\">";
     // Title and message are keys that the desktop translates; the link opens the index page of the
     // administration application.
     const char *const argv[] = {
@@ -20,8 +23,7 @@ bool NotifyNoSpace() {
         "@administrators",
         "fileindex:fileindex_title",
         "fileindex:notify_no_space",
-        "<a data-vork-app=\"VORK.KDX.AdminCenter.Application\" "
-        "data-vork-fn=\"VORK.KDX.AdminCenter.MediaIndex.Main\" data-vork-tab=\"fileIndex\">",
+        kLink,
         "</a>",
         nullptr,
     };

@@ -178,6 +178,7 @@ TEST_F(MonitorQueueTest, TakesRegistrationsFromManyProcesses) {
     constexpr int kProcesses = 8;
     constexpr int kRounds = 25;
     std::vector<pid_t> children;
+    children.reserve(kProcesses);
     for (int process = 0; process < kProcesses; ++process) {
         children.push_back(Fork([process] {
             const std::string queue = "/q" + std::to_string(process);

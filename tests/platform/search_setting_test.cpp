@@ -12,7 +12,6 @@ using platform_test::Fork;
 using platform_test::kConfiguration;
 using platform_test::Parse;
 using platform_test::ReadText;
-using platform_test::WaitFor;
 using platform_test::WriteFile;
 
 namespace {

@@ -207,7 +207,11 @@ TEST_F(SharesTest, ReadsTheFileOnceForAThousandShares) {
     std::string shares = "{";
     for (int i = 0; i < 1000; ++i) {
         const std::string name = "share" + std::to_string(i);
-        shares += (i == 0 ? "" : ",") + ("\"" + name + "\": {\"path\": \"/vol1/" + name + "\"}");
+        shares.append(i == 0 ? "\"" : ",\"")
+            .append(name)
+            .append("\": {\"path\": \"/vol1/")
+            .append(name)
+            .append("\"}");
     }
     Configure(shares + "}");
     // A file just written is read again until its times can be told from the next change's.
@@ -219,8 +223,9 @@ TEST_F(SharesTest, ReadsTheFileOnceForAThousandShares) {
     }
     for (int i = 0; i < 1000; ++i) {
         const std::string name = "share" + std::to_string(i);
-        ASSERT_EQ(PathOf(name), "/vol1/" + name);
-        ASSERT_EQ(HolderOf("/vol1/" + name + "/x"), name + " /vol1/" + name);
+        const std::string path = "/vol1/" + name;
+        ASSERT_EQ(PathOf(name), path);
+        ASSERT_EQ(HolderOf(path + "/x"), std::string(name).append(" ").append(path));
     }
     EXPECT_EQ(configurationReads, before);
 }
