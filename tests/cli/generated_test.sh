@@ -45,7 +45,7 @@ onlyBash=(
     'remove --yes /music /photo/$|/photo/$(touch /tmp/hacked)'
     'show /photo/a\ |/photo/a b'
     'show "/photo/a|/photo/a b'
-    'resume |--help,--json'
+    'resume |--help,--json,--wait'
 )
 
 # shellcheck disable=SC1090,SC2001,SC2034  # the function reads COMP_WORDS

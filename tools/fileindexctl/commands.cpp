@@ -11,6 +11,10 @@ constexpr Parameter kMedia = {"--media", Takes::One, "KINDS",
                               "what to index: document, audio, video and photo, with commas between; all; none"};
 constexpr Parameter kName = {"--name", Takes::One, "NAME", "the name that people are shown"};
 
+constexpr Parameter kWait = {
+    "--wait", Takes::Number, "SECONDS",
+    "how long to go on trying while another program holds a lock, before exit status 75; 0 if not given"};
+
 constexpr Parameter kList[] = {
     {"--share", Takes::One, "SHARE", "only the folders of this share"},
     {"--sort", Takes::One, "FIELD", "order by path (if not given), name or a kind of file", kSortFields},
@@ -26,20 +30,25 @@ constexpr Parameter kAdd[] = {
     {"--name", Takes::One, "NAME", "the name that people are shown; if not given, the last part of the path"},
     {"--media", Takes::One, "KINDS",
      "what to index: document, audio, video and photo, with commas between; all (if not given); none"},
+    kWait,
 };
-constexpr Parameter kSet[] = {{"PATH", Takes::One, "", "the indexed folder: /SHARE/..."}, kName, kMedia};
+constexpr Parameter kSet[] = {{"PATH", Takes::One, "", "the indexed folder: /SHARE/..."}, kName, kMedia, kWait};
 constexpr Parameter kYes = {"--yes", Takes::Nothing, "", "delete without asking"};
 constexpr Parameter kRemove[] = {
     {"PATH", Takes::Many, "", "indexed folders"},
     {"--force", Takes::Nothing, "", "also folders whose share is away"},
     kYes,
+    kWait,
 };
 constexpr Parameter kQuestion[] = {{"PATH", Takes::One, "", "a share path (/SHARE/...) or a full path"}};
 constexpr Parameter kPause[] = {
     {"HOURS", Takes::Optional, "", "for how long: 8h or 8; 0 or nothing: without an end"},
     {"--until", Takes::One, "HH:MM", "until this local time comes next"},
+    kWait,
     {"--run", Takes::Rest, "COMMAND ...",
-     "while this command, the rest of the line, runs; its exit status is kept"},
+     "while this command, the rest of the line, runs; its exit status is kept; SIGKILL leaves the pause behind, "
+     "and "
+     "of several runs at once the first to begin ends it for all"},
 };
 constexpr Parameter kStatus[] = {
     {"PATH", Takes::Optional, "", "only this indexed folder"},
@@ -52,17 +61,23 @@ constexpr Parameter kDoctor[] = {
     {"--fix", Takes::Nothing, "",
      "mend what can be mended: shows the difference first, and keeps copies of files"},
     {"--yes", Takes::Nothing, "", "mend without asking"},
+    kWait,
 };
-constexpr Parameter kReindex[] = {{"PATH", Takes::Many, "", "share paths in or of indexed folders"}};
-constexpr Parameter kRevive[] = {{"SHARE", Takes::Many, "", "names of shares"}};
+constexpr Parameter kReindex[] = {{"PATH", Takes::Many, "", "share paths in or of indexed folders"}, kWait};
+constexpr Parameter kRevive[] = {{"SHARE", Takes::Many, "", "names of shares"}, kWait};
 constexpr Parameter kShare[] = {{"SHARE", Takes::One, "", "the name of the share"}};
 constexpr Parameter kShareRename[] = {
     {"OLD", Takes::One, "", "the name that the share had"},
     {"NEW", Takes::One, "", "the name that the share has now"},
+    {"--yes", Takes::Nothing, "", "overwrite the settings of folders that both names have without asking"},
+    kWait,
 };
-constexpr Parameter kShareDelete[] = {{"SHARE", Takes::One, "", "the name of the share"}, kYes};
+constexpr Parameter kShareRemove[] = {{"SHARE", Takes::One, "", "the name of the share"}, kYes, kWait};
+constexpr Parameter kShareClean[] = {{"SHARE", Takes::One, "", "the name of the share"}, kYes};
 constexpr Parameter kOneShare = {"SHARE", Takes::Optional, "", "only this share"};
-constexpr Parameter kMonitor[] = {kOneShare};
+constexpr Parameter kMonitorShow[] = {kOneShare};
+constexpr Parameter kMonitorRefresh[] = {kOneShare, kWait};
+constexpr Parameter kResume[] = {kWait};
 constexpr Parameter kQueueShow[] = {kOneShare, {"--limit", Takes::Number, "N", "show at most N events"}};
 constexpr Parameter kQueueCount[] = {kOneShare};
 constexpr std::string_view kShells[] = {"bash", "zsh", "fish"};
@@ -75,6 +90,7 @@ constexpr Parameter kImport[] = {
     {"--dry-run", Takes::Nothing, "", "only say what would be done"},
     {"--replace", Takes::Nothing, "", "also remove the folders that are not in the file"},
     kYes,
+    kWait,
 };
 constexpr Parameter kMigrate[] = {{"--dry-run", Takes::Nothing, "", "only say what would be done"}};
 
@@ -100,16 +116,16 @@ constexpr Command kCommands[] = {
     {"", "doctor", "Find out what is wrong, and mend it; exit status 1 while something is", kDoctor,
      ExamineSystem},
     {"", "pause", "Pause indexing", kPause, PauseIndexing},
-    {"", "resume", "Go on with indexing", {}, ResumeIndexing},
+    {"", "resume", "Go on with indexing", kResume, ResumeIndexing},
     {"", "reindex", "Have paths indexed again", kReindex, ReindexPaths},
     {"", "revive", "Go on with shares that were out of space", kRevive, ReviveShares},
     {"share", "rename", "Move the indexed folders of a share that was renamed", kShareRename, RenameShare},
-    {"share", "remove", "Forget the indexed folders of a share", kShareDelete, RemoveShare},
+    {"share", "remove", "Forget the indexed folders of a share", kShareRemove, RemoveShare},
     {"share", "pause", "Stop the worker and the monitor of a share", kShare, PauseShare},
     {"share", "resume", "Start the monitor and the worker of a share again", kShare, ResumeShare},
-    {"share", "clean", "Delete the queue and the index database of a share", kShareDelete, CleanShare},
-    {"monitor", "show", "Compare what is watched with what should be", kMonitor, ShowMonitor},
-    {"monitor", "refresh", "Have watched what should be, also on shares that are paused", kMonitor,
+    {"share", "clean", "Delete the queue and the index database of a share", kShareClean, CleanShare},
+    {"monitor", "show", "Compare what is watched with what should be", kMonitorShow, ShowMonitor},
+    {"monitor", "refresh", "Have watched what should be, also on shares that are paused", kMonitorRefresh,
      RefreshMonitors},
     {"queue", "show", "Show the events that wait, the oldest first", kQueueShow, ShowQueue},
     {"queue", "count", "Count the events that wait", kQueueCount, CountQueue},

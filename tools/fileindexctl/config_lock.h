@@ -3,13 +3,21 @@
 #ifndef FILEINDEXCTL_CONFIG_LOCK_H
 #define FILEINDEXCTL_CONFIG_LOCK_H
 
+#include "failure.h"
+#include "patience.h"
+
 #include <fileindex/config.h>
 
 namespace fileindexctl {
 
 class ConfigLock {
 public:
-    explicit ConfigLock(VORK::FILEINDEX::Config &config) : config_(config), held_(config.Lock(true)) {}
+    ConfigLock(VORK::FILEINDEX::Config &config, Patience &patience) : config_(config), held_(config.Lock(true)) {
+        while (!held_ && FailureOf(config_).Status() == ExitStatus::Busy && patience.Again()) {
+            config_.Unlock();
+            held_ = config_.Lock(true);
+        }
+    }
     ~ConfigLock() { config_.Unlock(); }
 
     ConfigLock(const ConfigLock &) = delete;

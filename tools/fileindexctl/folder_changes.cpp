@@ -50,11 +50,11 @@ void StateFolder(const std::string &path, Output &output) {
     output.Line(Printable(path + " is indexed as \"" + found->name + "\": " + MediaText(record)));
 }
 
-ExitStatus Upsert(const Json::Value &record, Output &output) {
+ExitStatus Upsert(const Json::Value &record, Patience patience, Output &output) {
     const std::string path = record["path"].asString();
     Json::Value request(Json::arrayValue);
     request.append(record);
-    const StepReport report = PerformUpsert(request);
+    const StepReport report = PerformUpsert(request, patience);
     report.Show(output);
     StateFolder(path, output);
     if (report.Status() != ExitStatus::Done) {
@@ -80,10 +80,10 @@ void WarnOfNesting(const std::string &path, const Folders &folders, Output &outp
 
 }  // namespace
 
-StepReport PerformUpsert(const Json::Value &records) {
+StepReport PerformUpsert(const Json::Value &records, Patience &patience) {
     const bool searchWasOn = VORKSMBIsEnableSpotlight() != 0;
-    StepReport report =
-        StepReport::Perform(UpsertPlan(), VORK::FILEINDEX::Folders(), [&] { return IndexMgr::Upsert(records); });
+    StepReport report = StepReport::Perform(UpsertPlan(), VORK::FILEINDEX::Folders(), patience,
+                                            [&] { return IndexMgr::Upsert(records); });
     if (searchWasOn) {
         report.Correct("search setting", StepResult::Already);
     }
@@ -92,6 +92,7 @@ StepReport PerformUpsert(const Json::Value &records) {
 }
 
 ExitStatus AddFolder(const Arguments &arguments, Output &output) {
+    const Patience patience(arguments);
     const Folders folders = ReadFolders();
     Json::Value record(Json::objectValue);
     const std::string path = RequirePlain(arguments.One("PATH"), folders).path;
@@ -106,10 +107,11 @@ ExitStatus AddFolder(const Arguments &arguments, Output &output) {
         output.Warn(Quoted(path) + " cannot be indexed at present; \"fileindexctl explain " + ShellWord(path) +
                     "\" says why");
     }
-    return Upsert(record, output);
+    return Upsert(record, patience, output);
 }
 
 ExitStatus SetFolder(const Arguments &arguments, Output &output) {
+    const Patience patience(arguments);
     const Folders folders = ReadFolders();
     const Folder &folder = RequireFolder(arguments.One("PATH"), folders);
     RequireShare(ShareOf(folder.path));
@@ -121,7 +123,7 @@ ExitStatus SetFolder(const Arguments &arguments, Output &output) {
     if (arguments.Has("--media")) {
         SetMedia(record, arguments.One("--media"));
     }
-    return Upsert(record, output);
+    return Upsert(record, patience, output);
 }
 
 }  // namespace fileindexctl

@@ -14,7 +14,7 @@
 namespace fileindexctl {
 
 /// Adds or changes the folders of an array of records, all or none. Throws Failure when nothing was done.
-StepReport PerformUpsert(const Json::Value &records);
+StepReport PerformUpsert(const Json::Value &records, Patience &patience);
 
 /// Folders to be removed.
 struct Removal {
@@ -31,7 +31,8 @@ std::string ConsequenceOf(const Removal &removal, const Folders &folders);
 
 /// Removes the folders; the names of steps that save begin with `saved`. Those on shares that are away come last,
 /// and only when everything before succeeded: `removed` says what was tried. Throws Failure when nothing was done.
-StepReport PerformRemoval(const std::string &saved, const Removal &removal, std::vector<std::string> &removed);
+StepReport PerformRemoval(const std::string &saved, const Removal &removal, std::vector<std::string> &removed,
+                          Patience &patience);
 
 }  // namespace fileindexctl
 

@@ -89,14 +89,15 @@ std::vector<PlannedStep> Plan(const std::string &saved, const Paths &removed, co
     return plan;
 }
 
-StepReport Remove(const std::string &saved, const Paths &removed, const Folders &folders) {
+StepReport Remove(const std::string &saved, const Paths &removed, const Folders &folders, Patience &patience) {
     Json::Value request(Json::arrayValue);
     for (const auto &path : removed) {
         request.append(path);
     }
     const bool searchWasOn = VORKSMBIsEnableSpotlight() != 0;
-    StepReport report = StepReport::Perform(Plan(saved, removed, Without(folders, removed)),
-                                            VORK::FILEINDEX::Folders(), [&] { return IndexMgr::Delete(request); });
+    StepReport report =
+        StepReport::Perform(Plan(saved, removed, Without(folders, removed)), VORK::FILEINDEX::Folders(), patience,
+                            [&] { return IndexMgr::Delete(request); });
     if (!searchWasOn) {
         report.Correct("search setting", StepResult::Already);
     }
@@ -155,14 +156,14 @@ std::string ConsequenceOf(const Removal &removal, const Folders &folders) {
 }
 
 // Two requests: the library stops at the first folder whose share is away, and must not leave the others undone.
-StepReport PerformRemoval(const std::string &saved, const Removal &removal, Paths &removed) {
+StepReport PerformRemoval(const std::string &saved, const Removal &removal, Paths &removed, Patience &patience) {
     StepReport report;
     removed = removal.present;
     if (!removal.present.empty()) {
-        report = Remove(saved, removal.present, ReadFolders());
+        report = Remove(saved, removal.present, ReadFolders(), patience);
     }
     if (!removal.away.empty() && report.Status() == ExitStatus::Done) {
-        StepReport away = Remove(saved + " (share away)", removal.away, ReadFolders());
+        StepReport away = Remove(saved + " (share away)", removal.away, ReadFolders(), patience);
         away.Excuse("the share is away");
         report.Append(away);
         removed = removal.All();
@@ -171,11 +172,12 @@ StepReport PerformRemoval(const std::string &saved, const Removal &removal, Path
 }
 
 ExitStatus RemoveFolders(const Arguments &arguments, Output &output) {
+    Patience patience(arguments);
     const Folders folders = ReadFolders();
     const Removal removal = Requested(arguments, folders, output);
     RequireConsent(arguments, ConsequenceOf(removal, folders));
     Paths removed;
-    const StepReport report = PerformRemoval("saved", removal, removed);
+    const StepReport report = PerformRemoval("saved", removal, removed, patience);
     report.Show(output);
     StateRest(removed, output);
     if (report.Status() != ExitStatus::Done) {

@@ -45,18 +45,19 @@ private:
     bool stopped_ = false;
 };
 
-StepReport Apply(const FlagChange &flag) {
+StepReport Apply(const FlagChange &flag, Patience &patience) {
     std::vector<PlannedStep> plan = {SaveStep(flag.member + " " + flag.Text())};
     if (flag.member == "no_space" && flag.value) {
         plan.push_back(
             {"administrators told", "the administrators could not be notified", {}, {{"status.cpp", 88}}});
-        return StepReport::Perform(plan, Status(), [&] { return StatusMgr::ShareSetNoSpace(flag.name, true); });
+        return StepReport::Perform(plan, Status(), patience,
+                                   [&] { return StatusMgr::ShareSetNoSpace(flag.name, true); });
     }
     if (flag.member == "no_space") {
         plan.push_back({"daemon told", "fileindexd cannot be reached", {{"status_mgr.cpp", 321}}});
-        return StepReport::Perform(plan, Status(), [&] { return StatusMgr::ShareRevive(flag.name); });
+        return StepReport::Perform(plan, Status(), patience, [&] { return StatusMgr::ShareRevive(flag.name); });
     }
-    return StepReport::Perform(plan, Status(), [&] {
+    return StepReport::Perform(plan, Status(), patience, [&] {
         return flag.member == "need_reindex" ? StatusMgr::ShareSetNeedReindex(flag.name, flag.value)
                                              : StatusMgr::SetUpdated(flag.name);
     });
@@ -69,7 +70,7 @@ bool RemovesFirst(const ImportPlan &plan) {
 
 // Folders first: the first of them starts the daemon, which then can be told of the rest. They are added before
 // others are removed, so that the daemon is not stopped on the way from one list to another.
-StepReport Apply(const ImportPlan &plan) {
+StepReport Apply(const ImportPlan &plan, Patience patience) {
     Json::Value records(Json::arrayValue);
     for (const auto &change : plan.folders) {
         records.append(change.to);
@@ -77,23 +78,24 @@ StepReport Apply(const ImportPlan &plan) {
     Sequence sequence;
     const auto upsert = [&] {
         if (!records.empty()) {
-            sequence.Do("saved", [&] { return PerformUpsert(records); });
+            sequence.Do("saved", [&] { return PerformUpsert(records, patience); });
         }
     };
     const auto remove = [&] {
         if (!plan.removal.All().empty()) {
             std::vector<std::string> removed;
-            sequence.Do("removal saved", [&] { return PerformRemoval("removal saved", plan.removal, removed); });
+            sequence.Do("removal saved",
+                        [&] { return PerformRemoval("removal saved", plan.removal, removed, patience); });
         }
     };
     const bool removesFirst = RemovesFirst(plan);
     removesFirst ? remove() : upsert();
     removesFirst ? upsert() : remove();
     if (plan.pause) {
-        sequence.Do("pause saved", [&] { return SetPause(*plan.pause, "pause saved"); });
+        sequence.Do("pause saved", [&] { return SetPause(*plan.pause, "pause saved", patience); });
     }
     for (const auto &flag : plan.flags) {
-        sequence.Do(flag.member + " " + flag.Text(), [&] { return Apply(flag); });
+        sequence.Do(flag.member + " " + flag.Text(), [&] { return Apply(flag, patience); });
     }
     return sequence.Report();
 }
@@ -128,6 +130,7 @@ void StateConfiguration(Output &output) {
 }  // namespace
 
 ExitStatus ImportConfiguration(const Arguments &arguments, Output &output) {
+    const Patience patience(arguments);
     const std::string file = arguments.One("FILE");
     const std::string source = file == "-" ? "standard input" : file;
     const Configuration wanted = ParseConfiguration(ReadWhole(file), source);
@@ -145,7 +148,7 @@ ExitStatus ImportConfiguration(const Arguments &arguments, Output &output) {
     }
     output.Flush();
     AskForRemoval(arguments, plan);
-    const StepReport report = Apply(plan);
+    const StepReport report = Apply(plan, patience);
     report.Show(output);
     StateConfiguration(output);
     if (report.Status() != ExitStatus::Done) {

@@ -40,7 +40,7 @@ also take full paths,
 A change is saved first, then everybody is told.
 Each step is listed with what became of it; when a step fails, those behind it are not reached, and the message says how
 to go on.
-What deletes asks first on a terminal, and needs
+What deletes or overwrites asks first on a terminal, and needs
 .Fl -yes
 without one.
 .Pp

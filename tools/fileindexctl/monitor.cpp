@@ -156,9 +156,10 @@ ExitStatus ShowMonitor(const Arguments &arguments, Output &output) {
 }
 
 ExitStatus RefreshMonitors(const Arguments &arguments, Output &output) {
+    Patience patience(arguments);
     VORK::FILEINDEX::Folders store;
     ForgetErrors();
-    const ConfigLock lock(store);  // so that no newer registration is replaced by an older one
+    const ConfigLock lock(store, patience);  // so that no newer registration is replaced by an older one
     if (!lock.IsHeld()) {
         throw FailureOf(store);
     }

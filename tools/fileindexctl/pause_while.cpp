@@ -10,10 +10,11 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
+#include <chrono>
 #include <csignal>
 #include <cstring>
-#include <ctime>
 #include <optional>
 #include <vector>
 
@@ -25,6 +26,9 @@ using VORK::FILEINDEX::StatusMgr;
 
 constexpr long long kNotPaused = -1;
 constexpr long long kWithoutEnd = 0;
+// Other programs hold a lock for moments, and a pause that is left behind is worse than a wait.
+constexpr std::chrono::seconds kLeastPatience(10);
+
 constexpr int kCannotRun = 126;
 constexpr int kNotFound = 127;
 constexpr int kSignalled = 128;
@@ -95,22 +99,6 @@ int Run(const std::vector<std::string> &command, const HeldSignals &signals, Out
     return WIFEXITED(status) ? WEXITSTATUS(status) : kSignalled + WTERMSIG(status);
 }
 
-// The library gives a taken lock up within milliseconds. Other programs hold it longer, and a pause that is left
-// behind is worse than a wait.
-StepReport SetPausePatiently(long long resumeTime) {
-    constexpr timespec kInterval = {0, 100'000'000};
-    for (int left = 100;; --left) {
-        try {
-            return SetPause(resumeTime, "end saved");
-        } catch (const Failure &failure) {
-            if (failure.Status() != ExitStatus::Busy || left == 0) {
-                throw;
-            }
-        }
-        nanosleep(&kInterval, nullptr);
-    }
-}
-
 // What is to hold afterwards; nothing when somebody has changed the pause meanwhile, or it was without an end
 // before.
 std::optional<long long> WhatToRestore(long long before) {
@@ -121,10 +109,10 @@ std::optional<long long> WhatToRestore(long long before) {
     return IsPaused(before) ? before : kNotPaused;
 }
 
-ExitStatus Restore(long long before, Output &output) {
+ExitStatus Restore(long long before, Patience patience, Output &output) {
     try {
         if (const auto resumeTime = WhatToRestore(before)) {
-            const StepReport report = SetPausePatiently(*resumeTime);
+            const StepReport report = SetPause(*resumeTime, "end saved", patience);
             report.Note(output);
             if (report.Status() != ExitStatus::Done) {
                 output.Error(report.Status(),
@@ -143,13 +131,14 @@ ExitStatus Restore(long long before, Output &output) {
 
 }  // namespace
 
-ExitStatus PauseWhile(const std::vector<std::string> &command, Output &output) {
+ExitStatus PauseWhile(const std::vector<std::string> &command, Patience patience, Output &output) {
     long long resumeTime = kNotPaused;
     StatusMgr::GetPauseInfo(resumeTime);
     const HeldSignals signals;
-    SetPause(kWithoutEnd, "pause saved").Note(output);
+    patience.HeedHeldSignals();  // they end the program if the wait is in vain
+    SetPause(kWithoutEnd, "pause saved", patience).Note(output);
     const int result = Run(command, signals, output);
-    const ExitStatus restored = Restore(resumeTime, output);
+    const ExitStatus restored = Restore(resumeTime, Patience(std::max(patience.Time(), kLeastPatience)), output);
     output.Data()["exit_status"] = result;
     if (result != 0 && output.IsJson() && !output.Data().isMember("error")) {
         output.Error(static_cast<ExitStatus>(result),

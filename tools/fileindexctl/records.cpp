@@ -43,11 +43,19 @@ void RecordLog::Clear() {
     records_.clear();
 }
 
+bool RecordLog::Record::Fits(const Mark &mark) const {
+    return place == std::string(mark.module) + ":" + std::to_string(mark.line) &&
+           std::string_view(message).ends_with(mark.ending);
+}
+
+std::size_t RecordLog::Count(const Mark &mark) const {
+    return static_cast<std::size_t>(
+        std::count_if(records_.begin(), records_.end(), [&](const Record &record) { return record.Fits(mark); }));
+}
+
 const std::string *RecordLog::Find(const Mark &mark) const {
-    const std::string place = std::string(mark.module) + ":" + std::to_string(mark.line);
-    const auto found = std::find_if(records_.rbegin(), records_.rend(), [&](const Record &record) {
-        return record.place == place && std::string_view(record.message).ends_with(mark.ending);
-    });
+    const auto found =
+        std::find_if(records_.rbegin(), records_.rend(), [&](const Record &record) { return record.Fits(mark); });
     return found == records_.rend() ? nullptr : &found->message;
 }
 

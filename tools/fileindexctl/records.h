@@ -7,6 +7,7 @@
 #ifndef FILEINDEXCTL_RECORDS_H
 #define FILEINDEXCTL_RECORDS_H
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -28,6 +29,9 @@ public:
     /// The message of the last record that fits, without module and line; null when there is none.
     const std::string *Find(const Mark &mark) const;
 
+    /// How many records fit.
+    std::size_t Count(const Mark &mark) const;
+
     /// The message of the last record of all.
     std::string Last() const;
 
@@ -35,6 +39,8 @@ private:
     struct Record {
         std::string place;  // "index_mgr.cpp:598"
         std::string message;
+
+        bool Fits(const Mark &mark) const;
     };
     std::vector<Record> records_;
 };

@@ -93,10 +93,10 @@ long long ParseUntil(const std::string &text) {
 }
 
 // StatusMgr::Pause counts in whole hours from now; for a time of day its steps are taken one by one.
-StepReport PauseUntil(long long resumeTime, const std::string &saved = "saved") {
+StepReport PauseUntil(long long resumeTime, const std::string &saved, Patience &patience) {
     ForgetErrors();
     Status status;
-    const ConfigLock lock(status);
+    const ConfigLock lock(status, patience);
     if (!lock.IsHeld() || !status.Load() || !status.Pause(resumeTime) || !status.Save()) {
         throw FailureOf(status);
     }
@@ -126,21 +126,21 @@ ExitStatus Report(const StepReport &report, Output &output) {
 
 }  // namespace
 
-StepReport SetPause(long long resumeTime, const std::string &saved) {
+StepReport SetPause(long long resumeTime, const std::string &saved, Patience &patience) {
     if (resumeTime == kNotPaused) {
-        return StepReport::Perform(Plan(221, saved), Status(), [] { return StatusMgr::Resume(); });
+        return StepReport::Perform(Plan(221, saved), Status(), patience, [] { return StatusMgr::Resume(); });
     }
     if (resumeTime == kWithoutEnd) {
-        return StepReport::Perform(Plan(198, saved), Status(), [] { return StatusMgr::Pause(0); });
+        return StepReport::Perform(Plan(198, saved), Status(), patience, [] { return StatusMgr::Pause(0); });
     }
-    return PauseUntil(resumeTime, saved);
+    return PauseUntil(resumeTime, saved, patience);
 }
 
 std::string PauseText(long long resumeTime) {
     if (resumeTime == kWithoutEnd) {
         return "indexing is paused without an end";
     }
-    if (resumeTime == kNotPaused) {
+    if (resumeTime < kWithoutEnd) {  // the files may hold other such numbers than -1
         return "indexing is not paused";
     }
     if (resumeTime <= std::time(nullptr)) {
@@ -161,6 +161,7 @@ bool IsPaused(long long resumeTime) {
 }
 
 ExitStatus PauseIndexing(const Arguments &arguments, Output &output) {
+    Patience patience(arguments);
     if (arguments.Has("HOURS") + arguments.Has("--until") + arguments.Has("--run") > 1) {
         throw Failure(ExitStatus::Usage, "give a number of hours, --until or --run, not several of them");
     }
@@ -168,18 +169,20 @@ ExitStatus PauseIndexing(const Arguments &arguments, Output &output) {
         if (arguments.All("--run").front().starts_with("-")) {
             throw Failure(ExitStatus::Usage, "--run: a command is expected, not an option");
         }
-        return PauseWhile(arguments.All("--run"), output);
+        return PauseWhile(arguments.All("--run"), patience, output);
     }
     if (arguments.Has("--until")) {
         const long long resumeTime = ParseUntil(arguments.One("--until"));
-        return Report(PauseUntil(resumeTime), output);
+        return Report(PauseUntil(resumeTime, "saved", patience), output);
     }
     const int hours = arguments.Has("HOURS") ? ParseHours(arguments.One("HOURS")) : 0;
-    return Report(StepReport::Perform(Plan(198), Status(), [&] { return StatusMgr::Pause(hours); }), output);
+    return Report(StepReport::Perform(Plan(198), Status(), patience, [&] { return StatusMgr::Pause(hours); }),
+                  output);
 }
 
-ExitStatus ResumeIndexing(const Arguments & /*arguments*/, Output &output) {
-    return Report(StepReport::Perform(Plan(221), Status(), [] { return StatusMgr::Resume(); }), output);
+ExitStatus ResumeIndexing(const Arguments &arguments, Output &output) {
+    Patience patience(arguments);
+    return Report(StepReport::Perform(Plan(221), Status(), patience, [] { return StatusMgr::Resume(); }), output);
 }
 
 }  // namespace fileindexctl

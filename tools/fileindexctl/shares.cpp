@@ -19,6 +19,7 @@
 
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <array>
 
 namespace fileindexctl {
@@ -74,16 +75,21 @@ ExitStatus Finish(ExitStatus status, const std::string &trouble, Output &output)
     return status;
 }
 
-void WarnOfOverwriting(const std::vector<std::string> &paths, const std::string &newShare, const Folders &folders,
+// Folders that both names have keep the settings of the old one only.
+void AskForOverwriting(const Arguments &arguments, const std::vector<std::string> &paths, const Folders &folders,
                        Output &output) {
+    std::vector<std::string> overwritten;
     for (const auto &path : paths) {
-        const std::string target = VORK::FILEINDEX::ReplaceShareName(path, newShare);
-        for (const auto &folder : folders) {
-            if (folder.path == target) {
-                output.Warn(Quoted(target) + " was indexed already; it has the settings of " + Quoted(path) +
-                            " now");
-            }
+        const std::string target = VORK::FILEINDEX::ReplaceShareName(path, arguments.One("NEW"));
+        if (std::any_of(folders.begin(), folders.end(),
+                        [&](const VORK::FILEINDEX::Folder &folder) { return folder.path == target; })) {
+            overwritten.push_back(target);
         }
+    }
+    output.Data()["overwritten"] = ToArray(overwritten);
+    if (!overwritten.empty()) {
+        RequireConsent(arguments, "this overwrites the settings of " + Enumerate(overwritten) +
+                                      " with those of the share " + Quoted(arguments.One("OLD")));
     }
 }
 
@@ -105,9 +111,12 @@ bool WithdrawFormer(const std::string &oldShare, const std::string &newShare) {
 }
 
 // The library leaves the monitor as it was.
-void RefreshMonitor(const std::string &oldShare, const std::string &newShare, StepReport &report) {
+void RefreshMonitor(const std::string &oldShare, const std::string &newShare, Patience &patience,
+                    StepReport &report) {
     VORK::FILEINDEX::Folders store;
-    const ConfigLock lock(store);  // so that no other writer's newer registration is replaced by an older one
+    ForgetErrors();
+    const ConfigLock lock(store,
+                          patience);  // so that no other writer's newer registration is replaced by an older one
     if (!lock.IsHeld()) {
         report.Add("monitor of " + newShare, StepResult::Failed, "folder.conf is locked by another program");
         return;
@@ -133,6 +142,7 @@ bool Exists(const std::string &path) {
 }  // namespace
 
 ExitStatus RenameShare(const Arguments &arguments, Output &output) {
+    Patience patience(arguments);
     const std::string oldShare = arguments.One("OLD");
     const std::string newShare = arguments.One("NEW");
     const Folders folders = ReadFolders();
@@ -141,10 +151,10 @@ ExitStatus RenameShare(const Arguments &arguments, Output &output) {
     if (oldShare == newShare) {
         throw Failure(ExitStatus::Usage, "both names are \"" + newShare + "\"");
     }
-    StepReport report = StepReport::Perform({SaveStep()}, VORK::FILEINDEX::Folders(),
+    AskForOverwriting(arguments, paths, folders, output);
+    StepReport report = StepReport::Perform({SaveStep()}, VORK::FILEINDEX::Folders(), patience,
                                             [&] { return IndexMgr::ShareRename(oldShare, newShare); });
-    WarnOfOverwriting(paths, newShare, folders, output);
-    RefreshMonitor(oldShare, newShare, report);
+    RefreshMonitor(oldShare, newShare, patience, report);
     report.Show(output);
     StateShare(newShare, output);
     return Finish(report.Status(),
@@ -154,6 +164,7 @@ ExitStatus RenameShare(const Arguments &arguments, Output &output) {
 }
 
 ExitStatus RemoveShare(const Arguments &arguments, Output &output) {
+    Patience patience(arguments);
     const std::string share = arguments.One("SHARE");
     const Folders folders = ReadFolders();
     const auto paths = RequireIndexed(share, folders);
@@ -167,8 +178,8 @@ ExitStatus RemoveShare(const Arguments &arguments, Output &output) {
                         {{kIndexMgr, 540}, {kIndexMgr, 542}}});
     }
     const bool searchWasOn = VORKSMBIsEnableSpotlight() != 0;
-    StepReport report =
-        StepReport::Perform(plan, VORK::FILEINDEX::Folders(), [&] { return IndexMgr::ShareRemove(share); });
+    StepReport report = StepReport::Perform(plan, VORK::FILEINDEX::Folders(), patience,
+                                            [&] { return IndexMgr::ShareRemove(share); });
     if (!searchWasOn) {
         report.Correct("search setting", StepResult::Already);
     }

@@ -93,6 +93,19 @@ StepReport StepReport::Perform(const std::vector<PlannedStep> &plan, const VORK:
     return report;
 }
 
+StepReport StepReport::Perform(const std::vector<PlannedStep> &plan, const VORK::FILEINDEX::Config &config,
+                               Patience &patience, const std::function<bool()> &call) {
+    for (;;) {
+        try {
+            return Perform(plan, config, call);
+        } catch (const Failure &failure) {
+            if (failure.Status() != ExitStatus::Busy || !patience.Again()) {
+                throw;
+            }
+        }
+    }
+}
+
 void MarkDroppedEvents(StepReport &report) {
     if (Records().Find({"utils.cpp", 516}) != nullptr) {
         report.Correct("events queued", StepResult::Failed, "the queue stayed locked, and the event was dropped");

@@ -10,6 +10,7 @@
 
 #include "exit_status.h"
 #include "output.h"
+#include "patience.h"
 #include "records.h"
 
 #include <fileindex/config.h>
@@ -58,6 +59,11 @@ public:
     /// Makes the call and traces it. Throws Failure when nothing was done because of the file of `config`.
     static StepReport Perform(const std::vector<PlannedStep> &plan, const VORK::FILEINDEX::Config &config,
                               const std::function<bool()> &call);
+
+    /// The same for a plan that begins with a SaveStep. The call is made again, for as long as `patience` lasts,
+    /// while it ends because another program holds that step's lock: nothing has been done then.
+    static StepReport Perform(const std::vector<PlannedStep> &plan, const VORK::FILEINDEX::Config &config,
+                              Patience &patience, const std::function<bool()> &call);
 
     void Add(const std::string &name, StepResult result, const std::string &detail = std::string());
 

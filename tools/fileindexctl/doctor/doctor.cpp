@@ -131,7 +131,7 @@ Json::Value DifferenceJson(const Repairs &repairs) {
 }
 
 // What is left afterwards.
-Report Fix(const Report &before, const Arguments &arguments, Output &output) {
+Report Fix(const Report &before, const Arguments &arguments, Patience patience, Output &output) {
     const Repairs repairs = before.AllRepairs();
     output.Data()["fixes"] = DifferenceJson(repairs);
     if (repairs.empty()) {
@@ -142,7 +142,7 @@ Report Fix(const Report &before, const Arguments &arguments, Output &output) {
     ShowDifference(repairs, output);
     output.Flush();
     RequireConsent(arguments, "this makes the changes above, and keeps copies of files beside them");
-    CarryOut(repairs, output);
+    CarryOut(repairs, patience, output);
     Report after = Examine();
     output.Data()["remaining"] = FindingsJson(after);
     output.Line("");
@@ -156,12 +156,13 @@ Report Fix(const Report &before, const Arguments &arguments, Output &output) {
 }  // namespace doctor
 
 ExitStatus ExamineSystem(const Arguments &arguments, Output &output) {
+    const Patience patience(arguments);
     doctor::Report report = doctor::Examine();
     output.Data()["findings"] = doctor::FindingsJson(report);
     doctor::ShowSummary(report, output);
     doctor::ShowFindings(report, output);
     if (arguments.Has("--fix")) {
-        report = doctor::Fix(report, arguments, output);
+        report = doctor::Fix(report, arguments, patience, output);
     }
     return report.Count() == 0 ? ExitStatus::Done : ExitStatus::No;
 }

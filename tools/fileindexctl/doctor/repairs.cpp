@@ -51,10 +51,10 @@ void Report(const std::string &target, const std::string &copy, Output &output) 
 }
 
 // All edits of status.conf, on what it holds now.
-void Edit(const Repairs &repairs, Output &output) {
+void Edit(const Repairs &repairs, Patience &patience, Output &output) {
     StatusFile file;
     ForgetErrors();
-    const ConfigLock lock(file);
+    const ConfigLock lock(file, patience);
     if (!lock.IsHeld()) {
         throw FailureOf(file);
     }
@@ -107,14 +107,14 @@ void ShowDifference(const Repairs &repairs, Output &output) {
     }
 }
 
-void CarryOut(const Repairs &repairs, Output &output) {
+void CarryOut(const Repairs &repairs, Patience &patience, Output &output) {
     // Directories, owners and modes come first: saving needs them.
     for (const auto &repair : repairs) {
         if (repair.act) {
             Try([&] { Act(repair, output); }, output);
         }
     }
-    Try([&] { Edit(repairs, output); }, output);
+    Try([&] { Edit(repairs, patience, output); }, output);
 }
 
 }  // namespace fileindexctl::doctor

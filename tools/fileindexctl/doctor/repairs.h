@@ -4,6 +4,7 @@
 #define FILEINDEXCTL_DOCTOR_REPAIRS_H
 
 #include "../output.h"
+#include "../patience.h"
 #include "finding.h"
 
 #include <vector>
@@ -17,7 +18,7 @@ void ShowDifference(const Repairs &repairs, Output &output);
 
 /// Changes it, keeping a copy beside each file whose content changes. A repair that fails is reported as a
 /// warning, and the others go on.
-void CarryOut(const Repairs &repairs, Output &output);
+void CarryOut(const Repairs &repairs, Patience &patience, Output &output);
 
 }  // namespace fileindexctl::doctor
 
