@@ -38,6 +38,7 @@ rows=(
     'check o|one file'
     'export -o t|two'
     'import |one file,two'
+    'add /photo --media a|all,audio'
     'nonsense |'
 )
 onlyBash=(
@@ -67,6 +68,7 @@ check_rows() {
     for row in "${@:2}"; do
         expect "$shell: fileindexctl ${row%%|*}" "$(tr , '\n' <<<"${row#*|}")" "$("in_$shell" "${row%%|*}" | LC_ALL=C sort)"
     done
+    expect "$shell: one more kind" document,video "$("in_$shell" 'set /photo --media document,v')"
 }
 
 check_rows bash "${rows[@]}" "${onlyBash[@]}"

@@ -3,6 +3,7 @@
 #include "handlers.h"
 
 #include <algorithm>
+#include <array>
 
 namespace fileindexctl {
 
@@ -18,8 +19,9 @@ std::string OfferFor(const Parameter &parameter) {
     if (placeholder == "OLD" || placeholder == "NEW") {
         return "SHARE";
     }
-    return placeholder == "PATH" || placeholder == "SHARE" || placeholder == "FILE" ? std::string(placeholder)
-                                                                                    : std::string();
+    constexpr std::array<std::string_view, 4> kOffered = {"PATH", "SHARE", "FILE", "KINDS"};
+    const bool isOffered = std::find(kOffered.begin(), kOffered.end(), placeholder) != kOffered.end();
+    return isOffered ? std::string(placeholder) : std::string();
 }
 
 std::string FullName(const Command &command) {

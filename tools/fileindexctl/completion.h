@@ -18,8 +18,12 @@ std::string FishCompletion();
 /// \name For the three of them
 /// @{
 
-/// What a parameter takes: "PATH", "SHARE", "FILE", or its choices with blanks between; empty: nothing to offer.
+/// What a parameter takes: "PATH", "SHARE", "FILE", "KINDS" (kKinds, with commas
+/// between), or its choices with blanks between; empty: nothing to offer.
 std::string OfferFor(const Parameter &parameter);
+
+/// The kinds of files.
+inline constexpr const char *kKinds = "document audio video photo";
 
 /// "share rename"; "list".
 std::string FullName(const Command &command);

@@ -8,6 +8,7 @@ namespace {
 constexpr const char *kHead = R"bash(# bash completion for fileindexctl, made by "fileindexctl completion bash".
 
 _fileindexctl_offer() {
+    local kind
     case $1 in
     PATH)
         fileindexctl list --paths 2>/dev/null
@@ -15,6 +16,14 @@ _fileindexctl_offer() {
         ;;
     SHARE) fileindexctl list --paths 2>/dev/null | cut -d / -f 2 | sort -u ;;
     FILE) compgen -f -- "$2" ;;
+    KINDS)
+        [[ $2 == *,* ]] || printf '%s\n' all none
+        for kind in )bash";
+
+constexpr const char *kBehindKinds = R"bash(; do
+            printf '%s\n' "${2%"${2##*,}"}$kind"
+        done
+        ;;
     *) tr ' ' '\n' <<<"$1" ;;
     esac
 }
@@ -126,7 +135,7 @@ std::string BashCompletion() {
     for (const Command *command : OfferedCommands()) {
         cases += CaseOf(*command);
     }
-    return kHead + groups + kMiddle + cases + kTail;
+    return std::string(kHead) + kKinds + kBehindKinds + groups + kMiddle + cases + kTail;
 }
 
 }  // namespace fileindexctl

@@ -47,6 +47,9 @@ std::string OfferOf(const Parameter &parameter) {
     if (offer == "SHARE") {
         return " -a '(__fileindexctl_shares)'";
     }
+    if (offer == "KINDS") {
+        return " -a 'all none (__fish_append , " + std::string(kKinds) + ")'";
+    }
     if (offer == "FILE") {
         return " -F";
     }

@@ -54,6 +54,9 @@ std::string ActionOf(const Parameter &parameter) {
     if (offer == "SHARE") {
         return "_fileindexctl_shares";
     }
+    if (offer == "KINDS") {
+        return " _values -s , kinds all none " + std::string(kKinds);
+    }
     if (offer == "FILE") {
         return "_files";
     }
