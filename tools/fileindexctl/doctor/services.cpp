@@ -2,6 +2,7 @@
 // of them has to be there.
 #include "../daemon.h"
 #include "../failure.h"
+#include "../patience.h"
 #include "../platform_file.h"
 #include "finding.h"
 
@@ -14,6 +15,7 @@
 
 #include <algorithm>
 #include <array>
+#include <chrono>
 
 namespace fileindexctl::doctor {
 
@@ -21,6 +23,7 @@ namespace {
 
 constexpr const char *kDaemon = "fileindexd";
 constexpr const char *kFileSharing = "samba";  // the platform's name for it
+constexpr std::chrono::seconds kLongestStart(3);
 
 bool RunsSystemd() {
     struct stat status {};
@@ -49,9 +52,24 @@ std::string StartCommand(const std::string &name) {
     return RunsSystemd() ? "systemctl start " + name : "service " + name + " start";
 }
 
+bool IsDaemonThere() {
+    const DaemonCondition condition = ProbeDaemon().condition;
+    return condition != DaemonCondition::Absent && condition != DaemonCondition::Stale;
+}
+
+// The service may report success before the daemon listens, or while it fails.
 void Start() {
     if (VLIBServiceStart(kDaemon, 1) < 0) {
         throw Failure(ExitStatus::Unreachable, std::string(kDaemon) + " could not be started");
+    }
+    Patience patience(kLongestStart);
+    while (!IsDaemonThere()) {
+        if (!patience.Again()) {
+            throw Failure(ExitStatus::Unreachable,
+                          std::string(kDaemon) +
+                              " was started, but does not listen; the system log may tell "
+                              "why");
+        }
     }
 }
 

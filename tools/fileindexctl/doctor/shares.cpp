@@ -127,7 +127,8 @@ Finding SpaceFlag(const std::string &share) {
 
 Finding ReindexFlag(const std::string &share) {
     return {"the share " + Quoted(share) + " waits to be reindexed",
-            "changes have been lost, and the index is behind", ReindexCommand(share)};
+            "changes have been lost, and the index is behind",
+            ReindexCommand(share) + "; this is found until fileindexd has cleared the mark"};
 }
 
 std::vector<std::string> Marked(const Facts &facts, const char *flag) {
