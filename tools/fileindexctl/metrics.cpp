@@ -1,5 +1,6 @@
 #include "configuration.h"
 #include "daemon.h"
+#include "gaps.h"
 #include "handlers.h"
 #include "paths.h"
 #include "queue.h"
@@ -58,28 +59,37 @@ const char *KindOf(unsigned type) {
     }
 }
 
-void MeasureQueue(const std::string &share, Metrics &metrics) {
+void MeasureQueue(const std::string &share, const Backlog &backlog, Metrics &metrics) {
     const Labels label = {{"share", share}};
-    const auto backlog = ReadBacklog(share, "");
-    metrics.present.Add(label, backlog ? 1 : 0);
-    if (!backlog) {
-        return;
-    }
     std::map<std::string, long long> kinds = {{"reindex", 0}, {"settings", 0}, {"rename", 0}, {"other", 0}};
-    for (const auto &[type, count] : backlog->events) {
+    for (const auto &[type, count] : backlog.events) {
         kinds[KindOf(type)] += static_cast<long long>(count);
     }
     for (const auto &[kind, count] : kinds) {
         metrics.events.Add({{"share", share}, {"event", kind}}, count);
     }
-    metrics.malformed.Add(label, static_cast<long long>(backlog->malformed));
-    metrics.taken.Add(label, backlog->hasTemporary ? 1 : 0);
-    if (backlog->oldest) {
-        metrics.oldest.Add(label, *backlog->oldest);
+    metrics.malformed.Add(label, static_cast<long long>(backlog.malformed));
+    metrics.taken.Add(label, backlog.hasTemporary ? 1 : 0);
+    if (backlog.oldest) {
+        metrics.oldest.Add(label, *backlog.oldest);
     }
 }
 
-Metrics Measure() {
+void MeasureShare(const std::string &share, Metrics &metrics, Gaps &gaps) {
+    bool isPresent = true;
+    try {
+        const auto backlog = ReadBacklog(share, "");
+        isPresent = backlog.has_value();
+        if (backlog) {
+            MeasureQueue(share, *backlog, metrics);
+        }
+    } catch (const Failure &failure) {
+        gaps.AddQueue(share, failure);
+    }
+    metrics.present.Add({{"share", share}}, isPresent ? 1 : 0);
+}
+
+Metrics Measure(Gaps &gaps) {
     Metrics metrics;
     const StatusSettings status = StoredStatus();
     std::map<std::string, long long> shares;
@@ -88,7 +98,7 @@ Metrics Measure() {
     }
     for (const auto &[share, count] : shares) {
         metrics.folders.Add({{"share", share}}, count);
-        MeasureQueue(share, metrics);
+        MeasureShare(share, metrics, gaps);
     }
     for (const auto *flagged : {&status.noSpace, &status.needReindex}) {
         for (const auto &share : *flagged) {
@@ -155,13 +165,14 @@ void Show(const Metric &metric, Output &output) {
 }  // namespace
 
 ExitStatus ShowMetrics(const Arguments & /*arguments*/, Output &output) {
-    const Metrics metrics = Measure();
+    Gaps gaps;
+    const Metrics metrics = Measure(gaps);
     for (const Metric *metric : metrics.All()) {
         if (!metric->samples.empty()) {
             Show(*metric, output);
         }
     }
-    return ExitStatus::Done;
+    return gaps.Report(output);
 }
 
 }  // namespace fileindexctl

@@ -1,3 +1,4 @@
+#include "gaps.h"
 #include "handlers.h"
 #include "paths.h"
 #include "queue.h"
@@ -57,10 +58,10 @@ public:
         output_.Warn("the share \"" + share + "\" is away");
     }
 
-    void Finish() {
+    void Finish(bool isWhole) {
         output_.Data()["left_out"] = static_cast<Json::UInt64>(leftOut_);
         output_.Data()["malformed"] = static_cast<Json::UInt64>(malformed_);
-        if (shown_ + leftOut_ + malformed_ == 0 && !isAnyAway_) {
+        if (shown_ + leftOut_ + malformed_ == 0 && !isAnyAway_ && isWhole) {
             output_.Note("nothing waits");
         }
         if (leftOut_ > 0) {
@@ -110,49 +111,62 @@ void AddRows(const std::string &share, const Backlog &backlog, std::vector<std::
                     AgeText(backlog.oldest) + (backlog.hasTemporary ? " (.tmp present)" : "")});
 }
 
+// For programs; null for a queue that is not there or may not be read.
+Json::Value Count(const std::string &share, std::vector<std::vector<std::string>> &rows, Gaps &gaps) {
+    try {
+        if (const auto backlog = ReadBacklog(share, "")) {
+            AddRows(share, *backlog, rows);
+            return BacklogJson(*backlog);
+        }
+        gaps.Add("the share \"" + share + "\" is away");
+    } catch (const Failure &failure) {
+        gaps.AddQueue(share, failure);
+    }
+    return {};
+}
+
 }  // namespace
 
 ExitStatus ShowQueue(const Arguments &arguments, Output &output) {
     const auto shares = Shares(arguments);
     Listing listing(arguments.Number("--limit", std::numeric_limits<unsigned long>::max()), output);
+    Gaps gaps;
     for (const auto &share : shares) {
         const std::string path = QueuePathOf(share);
         if (path.empty()) {
             listing.PassOver(share);
             continue;
         }
-        listing.Show(share, QueueFiles(path));
+        try {
+            listing.Show(share, QueueFiles(path));
+        } catch (const Failure &failure) {
+            gaps.AddQueue(share, failure);
+        }
     }
-    listing.Finish();
-    return ExitStatus::Done;
+    listing.Finish(gaps.Warnings().empty());
+    return gaps.Report(output);
 }
 
 ExitStatus CountQueue(const Arguments &arguments, Output &output) {
     std::vector<std::vector<std::string>> rows = {{"SHARE", "EVENT", "LINES", "OLDEST"}};
     output.Data()["share"] = Json::Value(Json::arrayValue);
     const auto shares = Shares(arguments);
+    Gaps gaps;
     for (const auto &share : shares) {
-        const auto backlog = ReadBacklog(share, "");
         Json::Value entry(Json::objectValue);
         entry["name"] = share;
-        entry["queue"] = backlog ? BacklogJson(*backlog) : Json::Value();
+        entry["queue"] = Count(share, rows, gaps);
         output.Data()["share"].append(entry);
-        if (backlog) {
-            AddRows(share, *backlog, rows);
-        } else {
-            output.Warn("the share \"" + share + "\" is away");
-        }
     }
     if (shares.empty()) {
         output.Note("no folder is indexed");
     }
-    if (rows.size() == 1) {
-        return ExitStatus::Done;
+    if (rows.size() > 1) {
+        for (const auto &line : Align(rows, output.Width())) {
+            output.Line(line);
+        }
     }
-    for (const auto &line : Align(rows, output.Width())) {
-        output.Line(line);
-    }
-    return ExitStatus::Done;
+    return gaps.Report(output);
 }
 
 }  // namespace fileindexctl

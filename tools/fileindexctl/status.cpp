@@ -74,6 +74,9 @@ std::string Brief(const StatusReport &report, const Progress &progress) {
 void Draw(const StatusReport &report, unsigned long interval, Screen &screen) {
     auto lines = report.Lines(Screen::Width());
     lines.emplace_back();
+    for (const auto &warning : report.gaps.Warnings()) {
+        lines.push_back("warning: " + Printable(warning));
+    }
     lines.push_back("every " + std::to_string(interval) + " s; Ctrl-C ends it");
     screen.Draw(lines);
 }
@@ -82,6 +85,9 @@ void Draw(const StatusReport &report, unsigned long interval, Screen &screen) {
 bool Write(const StatusReport &report, const Progress &progress, Output &output) {
     output.Data() = report.data;
     output.Line(Brief(report, progress));
+    for (const auto &warning : report.gaps.Warnings()) {
+        output.Warn(warning);
+    }
     return output.EndSample();
 }
 
@@ -148,7 +154,7 @@ ExitStatus ShowStatus(const Arguments &arguments, Output &output) {
     const unsigned long interval = Interval(arguments);
     const Reporter reporter = [&] {
         return arguments.Has("PATH") ? ReportFolder(arguments.One("PATH"))
-                                     : ReportService(arguments.One("--share"), output);
+                                     : ReportService(arguments.One("--share"));
     };
     if (!arguments.Has("--watch")) {
         const StatusReport report = reporter();
@@ -156,9 +162,9 @@ ExitStatus ShowStatus(const Arguments &arguments, Output &output) {
         for (const auto &line : report.Lines(output.Width())) {
             output.Line(line);
         }
-    } else {
-        Watch(reporter, interval, output);
+        return report.gaps.Report(output);
     }
+    Watch(reporter, interval, output);
     return ExitStatus::Done;
 }
 

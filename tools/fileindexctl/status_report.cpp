@@ -26,7 +26,7 @@ std::string EventsText(const Backlog &backlog) {
     return BacklogText(backlog) + (backlog.hasTemporary ? " (.tmp present)" : "");
 }
 
-void AddService(StatusReport &report, Output &output) {
+void AddService(StatusReport &report) {
     StatusFile file;
     long long resumeTime = -1;
     ForgetErrors();
@@ -38,7 +38,7 @@ void AddService(StatusReport &report, Output &output) {
     }
     if (!StatusMgr::GetStatus(report.state)) {
         report.state = "unknown";
-        output.Warn("the state cannot be told: " + Records().Last());
+        report.gaps.Add("the state cannot be told: " + Records().Last());
     }
     const auto noSpace = file.Marked("no_space");
     const auto needReindex = file.Marked("need_reindex");
@@ -71,7 +71,14 @@ void AddShare(const std::string &share, const Folders &folders, StatusReport &re
     for (const auto &folder : folders) {
         places.push_back(folder.GetFullPath());
     }
-    const auto backlogs = ReadBacklogs(share, places);
+    std::vector<Backlog> backlogs;
+    std::string why = "the share is away";
+    try {
+        backlogs = ReadBacklogs(share, places);
+    } catch (const Failure &failure) {
+        report.gaps.AddQueue(share, failure);
+        why = "the queue may not be read";
+    }
     Json::Value entry(Json::objectValue);
     entry["name"] = share;
     entry["folders"] = static_cast<Json::UInt64>(folders.size());
@@ -79,7 +86,7 @@ void AddShare(const std::string &share, const Folders &folders, StatusReport &re
     entry["folder"] = Json::Value(Json::arrayValue);
     const std::string count = std::to_string(folders.size());
     if (backlogs.empty()) {
-        report.shares.push_back({share, count, "-", "-", "the share is away"});
+        report.shares.push_back({share, count, "-", "-", why});
     } else {
         const Backlog &whole = backlogs.front();
         report.backlogs[share] = whole;
@@ -127,9 +134,9 @@ std::vector<std::string> StatusReport::Lines(unsigned width) const {
     return lines;
 }
 
-StatusReport ReportService(const std::string &onlyShare, Output &output) {
+StatusReport ReportService(const std::string &onlyShare) {
     StatusReport report;
-    AddService(report, output);
+    AddService(report);
     std::map<std::string, Folders> shares;
     for (const auto &folder : ReadFolders()) {
         shares[ShareOf(folder.path)].push_back(folder);

@@ -3,7 +3,7 @@
 #ifndef FILEINDEXCTL_STATUS_REPORT_H
 #define FILEINDEXCTL_STATUS_REPORT_H
 
-#include "output.h"
+#include "gaps.h"
 #include "queue.h"
 
 #include <json/value.h>
@@ -24,6 +24,7 @@ struct StatusReport {
     Rows folders{};
     std::map<std::string, Backlog> backlogs{};  ///< by share or, for a report of one folder, by folder
     Json::Value data{Json::objectValue};
+    Gaps gaps{};
 
     unsigned long Queued() const;
 
@@ -35,7 +36,7 @@ struct StatusReport {
 };
 
 /// Everything or, with a name, one share. Throws Failure.
-StatusReport ReportService(const std::string &onlyShare, Output &output);
+StatusReport ReportService(const std::string &onlyShare);
 
 /// One indexed folder. Throws Failure.
 StatusReport ReportFolder(const std::string &given);
