@@ -58,12 +58,6 @@ bool IsShareKnown(const std::string &share, const Folders &folders) {
            });
 }
 
-bool IsPlain(const std::string &path) {
-    const std::string closed = path + "/";
-    return closed.find("//") == std::string::npos && closed.find("/./") == std::string::npos &&
-           closed.find("/../") == std::string::npos;
-}
-
 }  // namespace
 
 Folders ReadFolders() {
@@ -167,6 +161,12 @@ const Folder &RequireFolder(const std::string &given, const Folders &folders) {
         message += ", but lies in \"" + covering.back() + "\"";
     }
     throw Failure(ExitStatus::NoSuchFolder, message + "; \"fileindexctl list\" shows them");
+}
+
+bool IsPlain(const std::string &path) {
+    const std::string closed = path + "/";
+    return closed.find("//") == std::string::npos && closed.find("/./") == std::string::npos &&
+           closed.find("/../") == std::string::npos;
 }
 
 Place RequirePlain(const std::string &given, const Folders &folders) {

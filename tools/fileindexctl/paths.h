@@ -37,6 +37,9 @@ const VORK::FILEINDEX::Folder &RequireFolder(const std::string &given, const Fol
 /// Throws Failure, which names the share path, for a full path.
 void RequireSharePath(const Place &place);
 
+/// Is the path spelt without ".", ".." and doubled "/"?
+bool IsPlain(const std::string &path);
+
 /// The place that a share path names: on a share that exists, without trailing slashes, spelt plainly. Throws
 /// Failure.
 Place RequirePlain(const std::string &given, const Folders &folders);

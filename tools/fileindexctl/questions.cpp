@@ -21,6 +21,9 @@ Place Asked(const Arguments &arguments, const Folders &folders, Output &output) 
     Place place = Locate(arguments.One("PATH"), folders);
     output.Data()["path"] = place.path;
     output.Data()["taken_as"] = place.TakenAs();
+    if (!IsPlain(place.path)) {
+        output.Warn(Quoted(place.path) + " is compared as text: \".\", \"..\" and doubled \"/\" are not resolved");
+    }
     return place;
 }
 
