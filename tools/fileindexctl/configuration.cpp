@@ -12,7 +12,6 @@
 #include <algorithm>
 #include <ctime>
 #include <iterator>
-#include <limits>
 #include <memory>
 
 namespace fileindexctl {
@@ -21,7 +20,6 @@ namespace {
 
 constexpr int kVersion = 1;
 constexpr long long kNotPaused = -1;
-constexpr long long kLatest = std::numeric_limits<int>::max();  // the daemon reckons in 32 bits
 
 // Shares and markers are members with names of their own, which the library's questions cannot list.
 class StatusFile : public VORK::FILEINDEX::Status {
@@ -143,8 +141,8 @@ private:
     }
 
     long long Time(const Json::Value &value, const std::string &member) const {
-        if (!value.isInt64() || value.asInt64() < kNotPaused || value.asInt64() > kLatest) {
-            Fault(member, "-1, 0 or a time up to " + std::to_string(kLatest) + " is expected");
+        if (!value.isInt64() || value.asInt64() < kNotPaused) {
+            Fault(member, "-1, 0 or a time is expected");
         }
         return value.asInt64();
     }

@@ -150,7 +150,9 @@ std::string ConsequenceOf(const Removal &removal, const Folders &folders) {
         }
     }
     if (!emptied.empty()) {
-        consequence += " and deletes the index data of the share " + Enumerate(emptied);
+        consequence += (emptied.size() == 1 ? " and deletes the index data of the share "
+                                            : " and deletes the index data of the shares ") +
+                       Enumerate(emptied);
     }
     return consequence;
 }

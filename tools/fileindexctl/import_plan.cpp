@@ -76,10 +76,14 @@ void PlanFlags(const std::string &member, const std::set<std::string> &stored, c
     }
 }
 
-void PlanStatus(const StatusSettings &wanted, ImportPlan &plan) {
+void PlanStatus(const StatusSettings &wanted, const std::string &source, ImportPlan &plan) {
     const StatusSettings stored = StoredStatus();
     plan.pausedFrom = stored.resumeTime;
     if (stored.resumeTime != wanted.resumeTime) {
+        if (wanted.resumeTime > kLatestEnd) {
+            throw Failure(ExitStatus::Malformed, source + ": status[\"resume_time\"]: a pause cannot end after " +
+                                                     std::to_string(kLatestEnd));
+        }
         plan.pause = wanted.resumeTime;
     }
     PlanFlags("no_space", stored.noSpace, wanted.noSpace, plan);
@@ -124,7 +128,7 @@ ImportPlan PlanImport(const Configuration &wanted, const std::string &source, bo
         PlanFolders(*wanted.folders, source, replace, plan);
     }
     if (wanted.status) {
-        PlanStatus(*wanted.status, plan);
+        PlanStatus(*wanted.status, source, plan);
     }
     return plan;
 }

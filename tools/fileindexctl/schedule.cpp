@@ -14,7 +14,6 @@
 #include <array>
 #include <cstdio>
 #include <ctime>
-#include <limits>
 
 namespace fileindexctl {
 
@@ -26,9 +25,6 @@ using VORK::FILEINDEX::StatusMgr;
 constexpr long long kNotPaused = -1;
 constexpr long long kWithoutEnd = 0;
 constexpr long long kSecondsPerHour = 3600;
-
-// The library and the daemon reckon pauses in 32 bits: a later end would wrap and end the pause at once.
-constexpr long long kLatest = std::numeric_limits<int>::max();
 
 std::vector<PlannedStep> Plan(int line, const std::string &saved = "saved") {
     return {SaveStep(saved), {"daemon told", "fileindexd cannot be reached", {{"status_mgr.cpp", line}}}};
@@ -58,9 +54,9 @@ int ParseHours(std::string text) {
         throw Failure(ExitStatus::Usage,
                       "\"" + given + "\" is no number of hours: 8h, 8, or 0 for a pause without an end");
     }
-    const long long hours = text.size() > 9 ? kLatest : std::stoll(text);
-    if (std::time(nullptr) + hours * kSecondsPerHour > kLatest) {
-        throw Failure(ExitStatus::Usage, "a pause cannot end after " + LocalTime(kLatest) +
+    const long long hours = text.size() > 9 ? kLatestEnd : std::stoll(text);
+    if (std::time(nullptr) + hours * kSecondsPerHour > kLatestEnd) {
+        throw Failure(ExitStatus::Usage, "a pause cannot end after " + LocalTime(kLatestEnd) +
                                              "; \"fileindexctl pause 0\" is one without an end");
     }
     return static_cast<int>(hours);

@@ -5,11 +5,15 @@
 
 #include "steps.h"
 
+#include <limits>
 #include <optional>
 #include <string>
 #include <vector>
 
 namespace fileindexctl {
+
+/// The library and the daemon reckon pauses in 32 bits: a later end would wrap and end the pause at once.
+inline constexpr long long kLatestEnd = std::numeric_limits<int>::max();
 
 /// Pauses until that time, 0 for without an end, or resumes for -1; the first step is called `saved`. Throws
 /// Failure when nothing was done.
