@@ -47,8 +47,7 @@ constexpr Parameter kPause[] = {
     kWait,
     {"--run", Takes::Rest, "COMMAND ...",
      "while this command, the rest of the line, runs; its exit status is kept; SIGKILL leaves the pause behind, "
-     "and "
-     "of several runs at once the first to begin ends it for all"},
+     "and of several runs at once the first to begin ends it for all"},
 };
 constexpr Parameter kStatus[] = {
     {"PATH", Takes::Optional, "", "only this indexed folder"},
