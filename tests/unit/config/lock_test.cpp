@@ -1,0 +1,124 @@
+// The lock of a configuration file.
+#include "unit/config/document.h"
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <filesystem>
+#include <string>
+
+namespace fs = std::filesystem;
+
+namespace fileindex_test {
+namespace {
+
+class ConfigLock : public FileIndexTest {};
+
+TEST_F(ConfigLock, ExcludesOthersUnlessAllAreReaders) {
+    for (const bool held : {true, false}) {
+        for (const bool asked : {true, false}) {
+            SCOPED_TRACE(std::to_string(static_cast<int>(held)) + std::to_string(static_cast<int>(asked)));
+            const bool granted = !held && !asked;
+            Script::Current().random = 7;
+            Document first;
+            Document second;
+            ASSERT_TRUE(first.Lock(held));
+            Forget();
+            EXPECT_EQ(granted, second.Lock(asked));
+            EXPECT_EQ(granted ? 1 : 3, Script::Current().Calls("flock", kStatusLock));
+            EXPECT_EQ(granted ? 0 : 3, Script::Current().Calls("usleep", "7000"));
+            EXPECT_EQ(granted ? "" : kBusy, Left());
+            second.Unlock();
+            EXPECT_TRUE(IsLocked(kStatusLock));
+            first.Unlock();
+            EXPECT_FALSE(IsLocked(kStatusLock));
+        }
+    }
+}
+
+TEST_F(ConfigLock, IsGrantedWhenTheHolderLetsGoBetweenTwoAttempts) {
+    LockAgent holder(kStatusLock);
+    Fail({.call = "usleep", .action = [&] { holder.Release(); }});
+    Document document;
+    EXPECT_TRUE(document.Lock(true));
+    EXPECT_EQ(2, Script::Current().Calls("flock", kStatusLock));
+    document.Unlock();
+    EXPECT_EQ("", Left());
+}
+
+TEST_F(ConfigLock, IsTriedAgainOnlyWhenTriedTooEarly) {
+    const struct {
+        const char *name;
+        Fault fault;
+        int attempts;
+        bool locked;
+    } rows[] = {
+        {"interrupted once", {.call = "flock", .error = EINTR}, 2, true},
+        {"busy twice", {.call = "flock", .times = 2, .error = EAGAIN}, 3, true},
+        {"interrupted always", {.call = "flock", .times = 3, .error = EINTR}, 3, false},
+        {"no locks on this file system", {.call = "flock", .error = ENOLCK}, 1, false},
+        {"read-only /tmp", {.call = "open", .error = EROFS}, 1, false},
+        {"no descriptors left at the second attempt", {.call = "open", .nth = 2, .error = EMFILE}, 2, false},
+    };
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        Forget();
+        const auto before = OpenDescriptors();
+        if (row.fault.nth == 2) {
+            Fail({.call = "flock", .error = EAGAIN});
+        }
+        Fail(row.fault);
+        Document document;
+        EXPECT_EQ(row.locked, document.Lock(true));
+        EXPECT_EQ(row.attempts, Script::Current().Calls("open", kStatusLock));
+        EXPECT_EQ(row.locked ? "" : kBusy, Left());
+        EXPECT_THAT(Script::Current().Finish(), IsEmpty());
+        document.Unlock();
+        EXPECT_EQ(before, OpenDescriptors());
+    }
+}
+
+TEST_F(ConfigLock, FileIsOwnWritableClosedOnExecAndNoLink) {
+    {
+        const UmaskOf none(0);
+        Document document;
+        ASSERT_TRUE(document.Lock(true));
+        EXPECT_EQ(0100644U, StatusOf(kStatusLock).st_mode);
+        for (const std::string &open : OpenDescriptors()) {
+            if (open.ends_with(kStatusLock)) {
+                EXPECT_EQ(FD_CLOEXEC, ::fcntl(std::stoi(open), F_GETFD));
+            }
+        }
+        document.Unlock();
+    }
+    const std::string target = std::string(kConfigDir) + "/elsewhere";
+    fs::remove(kStatusLock);
+    fs::create_symlink(target, kStatusLock);
+    Document document;
+    EXPECT_FALSE(document.Lock(true));
+    EXPECT_EQ(kBusy, Left());
+    EXPECT_FALSE(fs::exists(target));
+    document.Unlock();
+}
+
+TEST_F(ConfigLock, IsNotReleasedByTheDestructorButByTheEndOfTheProcess) {
+    const int child = RunInChild([] {
+        {
+            Document document;
+            document.Lock(true);
+        }
+        return IsLocked(kStatusLock) ? 1 : 0;
+    });
+    EXPECT_EQ(1, child);
+    EXPECT_FALSE(IsLocked(kStatusLock));
+}
+
+TEST_F(ConfigLock, UnlockingWhatWasNeverLockedDoesNothing) {
+    Document document;
+    document.Unlock();
+    EXPECT_EQ(0, Script::Current().Calls("flock"));
+}
+
+}  // namespace
+}  // namespace fileindex_test
