@@ -34,7 +34,7 @@ std::string Quoted(std::string_view text) {
     return SingleQuoted(text, "'\\''");
 }
 
-// In a specification of _arguments these have a meaning of their own.
+// In what _arguments is given these have a meaning of their own.
 std::string Escaped(std::string_view text) {
     std::string result;
     for (const char character : text) {
@@ -63,7 +63,7 @@ std::string ActionOf(const Parameter &parameter) {
     return offer.empty() ? " " : "(" + offer + ")";
 }
 
-std::string SpecificationOf(const Parameter &parameter) {
+std::string ArgumentText(const Parameter &parameter) {
     if (!parameter.IsOption()) {
         const char *position = parameter.takes == Takes::Many       ? "*:"
                                : parameter.takes == Takes::Optional ? "::"
@@ -88,7 +88,7 @@ std::string Common() {
 std::string CaseOf(const Command &command) {
     std::string text = "    " + std::string(command.name) + ")\n        _arguments " + Common();
     for (const auto &parameter : command.parameters) {
-        text += " \\\n            " + SpecificationOf(parameter);
+        text += " \\\n            " + ArgumentText(parameter);
     }
     return text + "\n        ;;\n";
 }
