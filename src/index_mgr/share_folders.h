@@ -6,15 +6,19 @@
 #include <fileindex/folders.h>
 #include <fileindex/paths.h>
 
+#include <new>
 #include <string>
 #include <vector>
 
 namespace VORK::FILEINDEX::internal {
 
-/// As Folders::List by share, but an empty name means the records whose own share name is empty, never all.
+/// As Folders::List by share, but an empty name means the records whose own share name is empty, never all. Throws
+/// when memory runs out: a list that is too short would have a share cleaned that is in use.
 inline std::vector<Folder> FoldersOf(Folders &store, const std::string &share) {
     std::vector<Folder> folders;
-    store.List(folders, share);
+    if (!store.List(folders, share)) {
+        throw std::bad_alloc();
+    }
     if (share.empty()) {
         std::erase_if(folders, [](const Folder &folder) {
             std::string owner;
