@@ -12,6 +12,9 @@
 #include <unistd.h>
 
 #include <filesystem>
+#include <functional>
+#include <string>
+#include <utility>
 
 namespace bench {
 
@@ -34,55 +37,56 @@ std::string EventLine(const std::string &fullPath) {
 
 /// Appends to a queue of 10 lines, which is cut back so that it stays that long.
 
-Row PendingCheck(std::size_t lines, Escapes escapes, const char *name, double ofFloor, double ofBaseline) {
-    const std::string queue = QueuePath("share0");
-    const auto prepare = [=] { WriteQueue(queue, lines, escapes); };
+struct Ratios {
+    double ofFloor;
+    double ofBaseline;
+};
+
+/// A scan of the whole queue, against reading its bytes.
+Row Scan(std::string name, const std::function<void()> &prepare, const std::function<void()> &library,
+         const std::function<void()> &baseline, Ratios most) {
     Row row;
-    row.name = std::string("pending-reindex check/") + std::to_string(lines) + name;
+    row.name = std::move(name);
     row.library = [=] {
         prepare();
-        return [queue] {
-            bool found = false;
-            Require(VORK::FILEINDEX::internal::FindInQueue(queue, 0x10000, FullPath(kAbsent), found) && !found,
-                    "find");
-        };
+        return library;
     };
     row.baseline = [=] {
         prepare();
-        return [queue] { Require(!baseline::IsReindexQueued(FullPath(kAbsent), queue), "find"); };
+        return baseline;
     };
     row.floor = [=] {
         prepare();
-        return [queue] { ReadBytes(queue); };
+        return [queue = QueuePath("share0")] { ReadBytes(queue); };
     };
-    row.mostOfFloor = ofFloor;
-    row.mostOfBaseline = ofBaseline;
+    row.mostOfFloor = most.ofFloor;
+    row.mostOfBaseline = most.ofBaseline;
     return row;
 }
 
-Row FolderState(std::size_t lines, bool unusual, double ofFloor, double ofBaseline) {
+Row PendingCheck(std::size_t lines, Escapes escapes, const char *name, Ratios most) {
+    const std::string queue = QueuePath("share0");
+    const auto library = [queue] {
+        bool found = false;
+        Require(VORK::FILEINDEX::internal::FindInQueue(queue, 0x10000, FullPath(kAbsent), found) && !found,
+                "find");
+    };
+    const auto baseline = [queue] { Require(!baseline::IsReindexQueued(FullPath(kAbsent), queue), "find"); };
+    return Scan(
+        "pending-reindex check/" + std::to_string(lines) + name, [=] { WriteQueue(queue, lines, escapes); },
+        library, baseline, most);
+}
+
+Row FolderState(std::size_t lines, bool unusual, Ratios most) {
     const std::string queue = QueuePath("share0");
     const auto prepare = [=] {
         std::filesystem::create_directories(FullPath(kAbsent));
         unusual ? WriteUnusualQueue(queue, lines) : WriteQueue(queue, lines);
     };
-    Row row;
-    row.name = "folder state/" + std::to_string(lines) + (unusual ? ", every line unusual" : "");
-    row.library = [=] {
-        prepare();
-        return [] { Require(StatusMgr::GetFolderStatus(kAbsent) == "finished", "state"); };
-    };
-    row.baseline = [=] {
-        prepare();
-        return [queue] { Require(!baseline::IsPathInQueue(FullPath(kAbsent), queue), "state"); };
-    };
-    row.floor = [=] {
-        prepare();
-        return [queue] { ReadBytes(queue); };
-    };
-    row.mostOfFloor = ofFloor;
-    row.mostOfBaseline = ofBaseline;
-    return row;
+    const auto library = [] { Require(StatusMgr::GetFolderStatus(kAbsent) == "finished", "state"); };
+    const auto baseline = [queue] { Require(!baseline::IsPathInQueue(FullPath(kAbsent), queue), "state"); };
+    return Scan("folder state/" + std::to_string(lines) + (unusual ? ", every line unusual" : ""), prepare,
+                library, baseline, most);
 }
 
 Row OneEvent() {
@@ -172,12 +176,12 @@ Row Reindex(std::size_t paths, std::size_t lines) {
 std::vector<Row> QueueRows(std::size_t scale) {
     const std::size_t million = 1000000 / scale;
     return {
-        PendingCheck(million / 100, Escapes::kNone, "", 0, 0),
-        PendingCheck(million / 10, Escapes::kNone, "", 0, 0),
-        PendingCheck(million, Escapes::kNone, "", 3, 1.0 / 80),
-        PendingCheck(million, Escapes::kEverywhere, ", escapes in every path", 0, 1.0 / 8),
-        FolderState(million, false, 7, 1.0 / 30),
-        FolderState(million / 10, true, 0, 1.0 / 2),
+        PendingCheck(million / 100, Escapes::kNone, "", {0, 0}),
+        PendingCheck(million / 10, Escapes::kNone, "", {0, 0}),
+        PendingCheck(million, Escapes::kNone, "", {3, 1.0 / 80}),
+        PendingCheck(million, Escapes::kEverywhere, ", escapes in every path", {0, 1.0 / 8}),
+        FolderState(million, false, {7, 1.0 / 30}),
+        FolderState(million / 10, true, {0, 1.0 / 2}),
         OneEvent(),
         Reindex(1000, million / 10),
     };
