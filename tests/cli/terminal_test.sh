@@ -48,12 +48,13 @@ expect "after the refusals" 1 "$(fileindexctl list | grep -c "$folder")"
 on_terminal $'y\n' "fileindexctl remove $folder" >/dev/null
 expect "after the consent" 0 "$(fileindexctl list 2>/dev/null | grep -c "$folder")"
 
-# Ctrl-C is typed once the second look has been drawn over the first.
+# Ctrl-C is typed once the second look has been drawn over the first. It reaches the whole terminal: some shells would
+# end of it too, so none stays between.
 : >/tmp/watched
 {
     until grep -q "$escape\[[0-9]*A" /tmp/watched; do sleep 0.05; done
     printf '\003'
-} | TERM=xterm script --quiet --flush --return --command "fileindexctl status --watch --interval 1" /tmp/watched >/dev/null
+} | TERM=xterm script --quiet --flush --return --command "exec fileindexctl status --watch --interval 1" /tmp/watched >/dev/null
 expect "the status of a watch that is ended" 0 $?
 expect "looks drawn" 2 "$(grep -c '^state' <(tr '\r' '\n' </tmp/watched | sed "s/.*$escape\[[0-9?;]*[A-Za-z]state/state/"))"
 expect "the terminal as it was" 1 "$(tr -d '\r' </tmp/watched | grep -c "$escape\[?7h$escape\[?25h$")"
