@@ -38,12 +38,14 @@ int InvalidArgument(const char *condition, int line) {
 
 /// Makes the share's metadata directory and sets `location` to its entry `leaf`. A directory that cannot be made
 /// is not fatal: the caller meets the problem where it matters, when it opens the file.
-bool Locate(std::string &location, const char *shareName, const char *leaf, const RecordLines &lines) {
-    const Share share = FindShare(shareName);
+///
+/// The share's record, for the caller to hold until all is done, or null: an unknown share, which is recorded.
+Share Locate(std::string &location, const char *shareName, const char *leaf, const RecordLines &lines) {
+    Share share = FindShare(shareName);
     if (!share) {
         syslog(LOG_ERR, "%s:%d VORKShareGet failed, name=%s, code=%d", kUtilsModule, lines.share, shareName,
                VLIBCErrGet());
-        return false;
+        return share;
     }
     const std::string directory = std::string(share->szPath) + "/" + kMetadataDir;
     if (VORKEAMKDir(0, directory.c_str()) < 0) {
@@ -51,7 +53,7 @@ bool Locate(std::string &location, const char *shareName, const char *leaf, cons
                directory.c_str(), VLIBCErrGet());
     }
     location = directory + "/" + leaf;
-    return true;
+    return share;
 }
 
 int CopyOut(const std::string &location, char *out, int size) {
@@ -74,8 +76,8 @@ int FILEIDXQueuePathGet(const char *szName, char *szOutQueuePath, int cbOutLen) 
     return NoThrow(
         [&] {
             std::string location;
-            return Locate(location, szName, kQueueFile, kQueueLines) ? CopyOut(location, szOutQueuePath, cbOutLen)
-                                                                     : -1;
+            const Share share = Locate(location, szName, kQueueFile, kQueueLines);
+            return share ? CopyOut(location, szOutQueuePath, cbOutLen) : -1;
         },
         -1);
 }
@@ -93,7 +95,8 @@ int FILEIDXDBPathGet(const char *szName, char *szOutDBPath, int cbOutLen) {
     return NoThrow(
         [&] {
             std::string location;
-            if (!Locate(location, szName, kDatabaseDir, kDatabaseLines)) {
+            const Share share = Locate(location, szName, kDatabaseDir, kDatabaseLines);
+            if (!share) {
                 return -1;
             }
             const int length = CopyOut(location, szOutDBPath, cbOutLen);

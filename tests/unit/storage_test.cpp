@@ -104,6 +104,8 @@ TEST_F(DatabaseLocation, IsMadeWithTheUmaskAndToldEvenWhenItCannotBe) {
     EXPECT_EQ(std::string(kDatabase).size(), FILEIDXDBPathGet("photo", buffer.data(), 4096));
     EXPECT_EQ(std::string("0 utils.cpp:750 mkdir failed, path=") + kDatabase + ", reason=Permission denied",
               Left());
+    const auto held = [] { EXPECT_EQ(1, Platform::Current().shareRecords) << "given back last"; };
+    Fail({.call = "mkdir", .about = kDatabase, .action = held});
     const mode_t before = ::umask(0027);
     EXPECT_EQ(std::string(kDatabase).size(), FILEIDXDBPathGet("photo", buffer.data(), 4096));
     ::umask(before);
