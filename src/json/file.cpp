@@ -207,10 +207,13 @@ bool ReadFile(const std::string &path, std::string &text, bool &undisturbed) {
 
 bool WriteFile(const std::string &path, const std::string &text) {
     UniqueFd fd(open(path.c_str(), O_RDWR | kOpenFlags));
-    if (fd) {
-        return Replace(std::move(fd), path, text);
+    if (!fd && errno == ENOENT) {
+        if (Create(path, text)) {
+            return true;
+        }
+        fd = UniqueFd(open(path.c_str(), O_RDWR | kOpenFlags));  // another writer may have made it meanwhile
     }
-    return errno == ENOENT && Create(path, text);
+    return fd && Replace(std::move(fd), path, text);
 }
 
 }  // namespace VORK::FILEINDEX::internal
