@@ -146,6 +146,7 @@ bool Folders::Upsert(Json::Value &out, const Json::Value &folder) {
             ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);  // over the path error: the request is what is wrong
             return false;
         }
+        const bool allResolved = unresolved_ == 0;
         const auto found = folders_.find(path);
         const bool known = found != folders_.end();
         Folder updated = known ? found->second : Folder();
@@ -154,6 +155,7 @@ bool Folders::Upsert(Json::Value &out, const Json::Value &folder) {
         } else {
             updated.Reload(path, folder);
             folders_.emplace(path, updated);
+            unresolved_ += IsUnresolved(updated) ? 1 : 0;
             if (folders_.size() > internal::kMaxFolders) {
                 syslog(LOG_ERR, "%s:%d Exceed max folder size", kFoldersModule, __LINE__);
                 ErrorHandler::SetError(FILEINDEX_ERR_EXCEED_MAX_FOLDER);
@@ -162,10 +164,9 @@ bool Folders::Upsert(Json::Value &out, const Json::Value &folder) {
         }
         const StoreWith asItWas(folders_, path, known ? &found->second : nullptr);
         // After the change the record itself counts, even where a folder later in the list governs the path.
-        out = ChangeReport(asItWas.Governing(fullPath, unresolved_ == 0), &updated);
-        unresolved_ += IsUnresolved(updated) ? 1 : 0;
+        out = ChangeReport(asItWas.Governing(fullPath, allResolved), &updated);
         if (known) {
-            unresolved_ -= IsUnresolved(found->second) ? 1 : 0;
+            unresolved_ += (IsUnresolved(updated) ? 1 : 0) - (IsUnresolved(found->second) ? 1 : 0);
             found->second = std::move(updated);
         }
         return true;

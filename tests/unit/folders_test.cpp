@@ -271,6 +271,12 @@ TEST_F(FoldersStore, HoldsAThousandFoldersAndNotOneMore) {
     Folders store;
     Json::Value out;
     ASSERT_TRUE(store.Load());
+    Fail({.call = "VORKShareGet", .about = "music", .nth = 2, .times = 2});
+    EXPECT_FALSE(store.Upsert(out, Parse(R"({"path":"/music"})")));
+    Forget();
+    EXPECT_TRUE(store.Upsert(out, Parse(R"({"path":"/photo/999","video":true})")));
+    EXPECT_EQ("2 folder.cpp Failed to get full path from /music", Left()) << "the refused one is asked too";
+    EXPECT_TRUE(store.Delete(out, "/music"));
     EXPECT_TRUE(store.Delete(out, "/photo/0") && store.Upsert(out, Parse(R"({"path":"/photo/1000"})")));
 }
 
