@@ -1,11 +1,7 @@
-// Child processes, errors and metadata directories.
+// Child processes, and the error of each thread.
 #include "support.h"
 
-#include <vork/metadata.h>
 #include <vork/process.h>
-
-#include <fcntl.h>
-#include <sys/stat.h>
 
 #include <csignal>
 #include <thread>
@@ -113,47 +109,8 @@ TEST(ErrorsTest, BelongToTheThread) {
     EXPECT_EQ(VLIBCErrGet(), 0x2900);
     EXPECT_STREQ(VLIBCErrorGetFile(), "here.cpp");
     EXPECT_EQ(VLIBCErrorGetLine(), 7);
-}
-
-TEST(ErrorsTest, NameThePlaceWithoutItsDirectory) {
-    VORKEAMKDir(0, nullptr);
-    EXPECT_STREQ(VLIBCErrorGetFile(), "metadata.cpp");
-    EXPECT_GT(VLIBCErrorGetLine(), 0);
-}
-
-TEST(MetadataTest, KnowsTheHiddenName) {
-    for (const char *name : {"@eaDir/", "@eadir", "@eaDirs", "", "/@eaDir"}) {
-        EXPECT_EQ(VORKEAIsHiddenDir(name), 0) << name;
-    }
-    EXPECT_EQ(VORKEAIsHiddenDir("@eaDir"), 1);
-    EXPECT_EQ(VORKEAIsHiddenDir(nullptr), 0);
-}
-
-TEST(MetadataTest, MakesDirectoriesAndNothingElseWillDo) {
-    std::filesystem::create_directories("/vol1/photo");
-    std::filesystem::create_directory_symlink("/vol1", "/vol1/link");
-    WriteFile("/vol1/file", "");
-    const struct {
-        const char *path;
-        int result, code;
-    } rows[] = {
-        {"/vol1/photo/@eaDir", 0, 0},
-        {"/vol1/photo/@eaDir", 0, 0},
-        {"/vol1/link", -1, VORK_ERR_EXISTS},
-        {"/vol1/file", -1, VORK_ERR_EXISTS},
-        {"/vol1/missing/@eaDir", -1, VORK_ERR_NOT_FOUND},
-        {"/vol1/file/@eaDir", -1, VORK_ERR_NOT_FOUND},
-        {"/proc/@eaDir", -1, VORK_ERR_NOT_FOUND},
-        {"relative", -1, VORK_ERR_BAD_PARAMETER},
-    };
-    for (const auto &row : rows) {
-        VLIBCErrSetEx(0, "", 0);
-        EXPECT_EQ(VORKEAMKDir(0, row.path), row.result) << row.path;
-        EXPECT_EQ(VLIBCErrGet(), row.code) << row.path;
-    }
-    struct stat status {};
-    ASSERT_EQ(stat("/vol1/photo/@eaDir", &status), 0);
-    EXPECT_EQ(status.st_mode & 0022U, 0U) << "users of the share could plant files here";
+    Exec(nullptr);
+    EXPECT_STREQ(VLIBCErrorGetFile(), "processes.cpp") << "without its directory";
 }
 
 }  // namespace

@@ -1,5 +1,5 @@
-// Files, mounts and child processes for the tests of the platform, which run as root in a file system of their
-// own.
+// Files, child processes and a dead server for the tests of the platform, which run as root in a file system of
+// their own.
 #ifndef TESTS_PLATFORM_SUPPORT_H
 #define TESTS_PLATFORM_SUPPORT_H
 
@@ -8,6 +8,7 @@
 #include <gtest/gtest.h>
 #include <json/json.h>
 
+#include <fcntl.h>
 #include <sys/mount.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -19,8 +20,6 @@
 #include <iterator>
 #include <sstream>
 #include <string>
-#include <utility>
-#include <vector>
 
 namespace platform_test {
 
@@ -44,34 +43,10 @@ inline Json::Value Parse(const std::string &text) {
     return value;
 }
 
-/// The JSON example in the platform's README that holds the text.
-inline std::string DocumentedExample(const std::string &text) {
-    const char *source = std::getenv("SOURCE_DIR");
-    const std::string readme = ReadText((source == nullptr ? "." : std::string(source)) + "/platform/README.md");
-    const std::string start = "```json\n";
-    for (size_t at = readme.find(start); at != std::string::npos; at = readme.find(start, at + 1)) {
-        std::string example = readme.substr(at + start.size(), readme.find("```", at + 1) - at - start.size());
-        if (example.find(text) != std::string::npos) {
-            return example;
-        }
-    }
-    ADD_FAILURE() << "no such example: " << text;
-    return "";
-}
-
-inline void WriteScript(const std::string &path, const std::string &body) {
-    WriteFile(path, "#!/bin/sh\n" + body);
-    std::filesystem::permissions(path, std::filesystem::perms(0755));
-}
-
 /// Runs a shell command that prepares a test; its exit status.
 inline int Shell(const std::string &command) {
     const int status = std::system(command.c_str());
     return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-}
-
-inline bool HasProgram(const std::string &name) {
-    return Shell("command -v " + name + " >/dev/null") == 0;
 }
 
 /// Runs the function in a child process and gives its result as the exit status.
@@ -88,40 +63,28 @@ inline int WaitFor(pid_t child) {
     return waitpid(child, &status, 0) == child && WIFEXITED(status) ? WEXITSTATUS(status) : -1;
 }
 
-/// Mounts of one test, taken down again in reverse order.
-class Mounts {
+/// The mount of a network file system whose server never answers: whoever looks below it waits for ever.
+class DeadServer {
 public:
-    Mounts() = default;
-    Mounts(const Mounts &) = delete;
-    Mounts &operator=(const Mounts &) = delete;
-    ~Mounts() {
-        for (auto point = points_.rbegin(); point != points_.rend(); ++point) {
-            umount2(point->c_str(), MNT_DETACH);
-        }
+    explicit DeadServer(const std::string &point) : point_(point) {
+        std::filesystem::create_directories(point);
+        const std::string options = "fd=" + std::to_string(fd_) + ",rootmode=40000,user_id=0,group_id=0";
+        mounted_ = fd_ >= 0 && mount("server:/", point.c_str(), "fuse.sshfs", 0, options.c_str()) == 0;
+    }
+    DeadServer(const DeadServer &) = delete;
+    DeadServer &operator=(const DeadServer &) = delete;
+    ~DeadServer() {
+        umount2(point_.c_str(), MNT_DETACH | MNT_FORCE);
+        close(fd_);
     }
 
-    bool Mount(const std::string &source, const std::string &point, const std::string &options) {
-        if (!std::filesystem::exists(point)) {
-            std::filesystem::create_directories(point);
-        }
-        const bool done = Shell("mount -n " + options + " '" + source + "' '" + point + "' 2>/tmp/mount.err") == 0;
-        if (done) {
-            points_.push_back(point);
-        }
-        return done;
-    }
-
-    /// Makes an image file with the command, in which $IMAGE stands for it, and mounts it through a loop device.
-    bool MountImage(const std::string &image, unsigned int megabytes, const std::string &make,
-                    const std::string &point, const std::string &options = "-o loop") {
-        std::filesystem::create_directories(std::filesystem::path(image).parent_path());
-        return Shell("truncate -s " + std::to_string(megabytes) + "M '" + image + "' && IMAGE='" + image +
-                     "' && export IMAGE && { " + make + "; } >/tmp/mkfs.log 2>&1") == 0 &&
-               Mount(image, point, options);
-    }
+    /// False where the kernel lacks FUSE.
+    bool IsMounted() const { return mounted_; }
 
 private:
-    std::vector<std::string> points_;
+    const std::string point_;
+    const int fd_ = open("/dev/fuse", O_RDWR | O_CLOEXEC);
+    bool mounted_ = false;
 };
 
 }  // namespace platform_test
