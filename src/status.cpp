@@ -21,19 +21,16 @@ constexpr int kNotPaused = -1;
 
 /// Adds or removes `share` under root[flagKey], which comes into being as null if it is absent and is not replaced
 /// if it is of another type: then the JSON library throws, and nothing of the file is lost. `beforeFirst` runs
-/// when the share is about to be marked for the first time.
+/// when the share is not marked yet, even if it then cannot be: the administrators should know of it all the same.
 template <typename BeforeFirst>
 void SetShareFlag(Json::Value &root, const char *flagKey, const std::string &share, bool set,
                   BeforeFirst beforeFirst) {
     Json::Value &flags = root[flagKey];
-    const bool marked = flags.isMember(share);
     if (!set) {
-        if (marked) {
-            flags.removeMember(share, nullptr);
-        }
+        flags.removeMember(share);
         return;
     }
-    if (!marked) {
+    if (!flags.isObject() || !flags.isMember(share)) {
         beforeFirst();
     }
     flags[share] = true;

@@ -156,7 +156,7 @@ bool QueueEventOf(std::string &share, int type, const std::string &fullPath, con
 bool QueueOrMark(int type, const std::string &fullPath, const Json::Value &data,
                  const PendingCheck &isReindexQueued) {
     std::string share;
-    if (QueueEventOf(share, type, fullPath, data, isReindexQueued)) {
+    if (NoThrow([&] { return QueueEventOf(share, type, fullPath, data, isReindexQueued); })) {
         return true;
     }
     // Outside every share the name is empty; the mark is then the only trace of the lost event.

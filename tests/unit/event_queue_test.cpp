@@ -194,6 +194,8 @@ TEST_F(EventQueue, ThatCannotBeUsedMarksTheShareForReindexing) {
         {"share gone in between", [] { Fail({.call = "VORKShareGet", .error = 0x1400}); }, 3,
          "0 utils.cpp:772 VORKShareGet failed, name=photo, code=5120 | "
          "utils.cpp:478 FILEIDXQueuePathGet failed, share=photo"},
+        {"out of memory",
+         [] { Fail({.call = "open", .about = kQueue, .action = [] { throw std::bad_alloc(); }}); }, 3, ""},
     };
     fs::create_directory("/vol1/photo/@eaDir");
     for (const auto &row : rows) {

@@ -109,6 +109,7 @@ TEST_F(StatusStore, ChangesOfAMemberOfAnotherTypePassTheExceptionAndTheManagerSt
         Status status;
         ASSERT_TRUE(status.Load());
         EXPECT_ANY_THROW(status.ShareSetNoSpace("a", set));
+        EXPECT_EQ(set ? 1 : 0, Script::Current().Calls("VLIBCExecv"));
         EXPECT_ANY_THROW(status.ShareSetNeedReindex("a", set));
         EXPECT_FALSE(StatusMgr::ShareSetNoSpace("a", set));
         EXPECT_FALSE(StatusMgr::ShareSetNeedReindex("a", set));
