@@ -1,5 +1,6 @@
 #include "names.h"
 #include "scoped.h"
+#include "utils/storage.h"
 
 #include <fileindex/error.h>
 #include <fileindex/paths.h>
@@ -13,6 +14,7 @@
 namespace VORK {
 namespace FILEINDEX {
 
+using internal::HasNul;
 using internal::kUtilsModule;
 
 bool GetFullPath(std::string &out, const std::string &sharePath) {
@@ -22,8 +24,7 @@ bool GetFullPath(std::string &out, const std::string &sharePath) {
         return false;
     }
     // The platform would see the path up to a NUL only, and so another one.
-    const bool named = sharePath.find('\0') == std::string::npos;
-    const internal::Share share = named ? internal::FindShare(shareName) : internal::Share();
+    const internal::Share share = HasNul(sharePath) ? internal::Share() : internal::FindShare(shareName);
     if (!share) {
         ErrorHandler::SetError(FILEINDEX_ERR_PATH);
         return false;
@@ -50,7 +51,7 @@ bool GetShareNamePathByFullPath(std::string &outShareName, std::string &outShare
                                 const std::string &fullPath) {
     char name[internal::kShareNameSize] = {};
     char path[internal::kPathSize] = {};
-    if (VORKShareNamePathGet(fullPath.c_str(), name, sizeof(name), path, sizeof(path)) < 0) {
+    if (HasNul(fullPath) || VORKShareNamePathGet(fullPath.c_str(), name, sizeof(name), path, sizeof(path)) < 0) {
         syslog(LOG_ERR, "%s:%d VORKShareNamePathGet failed, path=%s", kUtilsModule, 418, fullPath.c_str());
         ErrorHandler::SetError(FILEINDEX_ERR_PATH);
         return false;
@@ -75,12 +76,12 @@ bool StringStartWith(const std::string &str, const std::string &prefix) {
 
 bool IsDirExist(const std::string &path) {
     struct stat status = {};
-    return lstat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
+    return !HasNul(path) && lstat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
 }
 
 bool IsFileExist(const std::string &path) {
     struct stat status = {};
-    return lstat(path.c_str(), &status) == 0 && S_ISREG(status.st_mode);
+    return !HasNul(path) && lstat(path.c_str(), &status) == 0 && S_ISREG(status.st_mode);
 }
 
 }  // namespace FILEINDEX

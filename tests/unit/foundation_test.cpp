@@ -142,8 +142,10 @@ TEST_F(Paths, WhatCannotBeResolvedLeavesItsReasonAndTheOutput) {
     Platform::Current().shares.erase("nowhere");
     EXPECT_FALSE(GetFullPath(out, ""));
     EXPECT_EQ("0 utils.cpp:389 GetShareNameByPath failed, path=", Left());
-    EXPECT_FALSE(GetShareNamePathByFullPath(out, path, "/vol9/x"));
-    EXPECT_EQ("2 utils.cpp:418 VORKShareNamePathGet failed, path=/vol9/x", Left());
+    for (const std::string &outside : {std::string("/vol9/x"), std::string("/vol1/photo\0/x", 14)}) {
+        EXPECT_FALSE(GetShareNamePathByFullPath(out, path, outside));
+        EXPECT_EQ(std::string("2 utils.cpp:418 VORKShareNamePathGet failed, path=") + outside.c_str(), Left());
+    }
     EXPECT_EQ("before before", out + " " + path);
 
     EXPECT_TRUE(GetShareNamePathByFullPath(out, path, "/vol1/photo/a"));
@@ -187,6 +189,7 @@ TEST_F(Paths, FilesAndDirectoriesAreSeenWithoutFollowingLinks) {
         EXPECT_EQ(row.isFile, IsFileExist(base + row.name)) << row.name;
         EXPECT_EQ(row.isDir, IsDirExist(base + row.name)) << row.name;
     }
+    EXPECT_FALSE(IsFileExist(base + std::string("file\0x", 6)) || IsDirExist(base + std::string("dir\0x", 5)));
     Fail({.call = "lstat", .times = 2, .error = EACCES});
     EXPECT_FALSE(IsFileExist(base + "file"));
     EXPECT_FALSE(IsDirExist(base + "dir"));
