@@ -62,7 +62,7 @@ inline constexpr char kShareNameKey[] = "share_name";
 
 // The notification daemon's registration.
 inline constexpr char kMonitorName[] = "fileindex";
-inline constexpr unsigned kMonitorMask = 0xFFCE;  // every change and move; not access, close without write, open
+inline constexpr int kMonitorMask = 0xFFCE;  // every change and move; not access, close without write, open
 
 // Buffers of the platform's share library.
 inline constexpr int kShareNameSize = 492;

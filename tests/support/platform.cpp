@@ -13,6 +13,7 @@
 #include <vork/text.h>
 #include <vorknotifyd/monitor_queue.h>
 
+#include <json/reader.h>
 #include <json/writer.h>
 
 #include <strings.h>
@@ -22,6 +23,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
+#include <sstream>
 #include <stdexcept>
 #include <string>
 
@@ -305,7 +307,10 @@ bool MonitorQueue::Upsert(const MonitorQueue &queue, const std::string &name, _t
         }
         return false;
     }
-    Script::Current().Record("monitor " + name + " " + std::to_string(type) + " " + text);
+    Json::Value reread;
+    std::istringstream(text) >> reread;
+    const char *const note = reread == queue.description_->json ? "" : " of other types than the text's";
+    Script::Current().Record("monitor " + name + " " + std::to_string(type) + " " + text + note);
     return true;
 }
 
