@@ -9,10 +9,13 @@
 #include <syslog.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <functional>
 #include <iostream>
+#include <map>
 #include <memory>
 #include <sstream>
 
@@ -60,6 +63,15 @@ std::string Canonical(const std::string &text) {
     return text == "(missing)" ? text : Print(Parse(text));
 }
 
+std::pair<std::string, std::string> Split(const std::string &line) {
+    const size_t blank = std::min(line.find(' '), line.size());
+    return {line.substr(0, blank), line.substr(std::min(blank + 1, line.size()))};
+}
+
+std::string Decoded(const std::string &text) {
+    return text.starts_with('"') ? Parse(text).asString() : text;
+}
+
 std::string ReadFile(const std::string &path) {
     std::ifstream file(path, std::ios::binary);
     if (!file) {
@@ -70,18 +82,26 @@ std::string ReadFile(const std::string &path) {
     return text.str();
 }
 
+std::string TestPath(const std::string &name) {
+    const char *sources = std::getenv("SOURCE_DIR");
+    return std::string(sources != nullptr ? sources : ".") + "/tests/unit/" + name;
+}
+
+std::string TestData(const std::string &name) {
+    return ReadFile(TestPath(name));
+}
+
+void ExpectTestData(const std::string &name, const std::string &found) {
+    EXPECT_EQ(TestData(name), found);
+    if (std::getenv("REWRITE") != nullptr) {
+        WriteFile(TestPath(name), found);
+    }
+}
+
 void WriteFile(const std::string &path, const std::string &text) {
     std::ofstream file(path, std::ios::binary | std::ios::trunc);
     file << text;
     ASSERT_TRUE(file.flush()) << path;
-}
-
-std::string FolderRecord(const std::string &path, const std::string &name, const std::string &flags) {
-    const auto flag = [&flags](char letter) { return flags.find(letter) == std::string::npos ? "false" : "true"; };
-    std::ostringstream text;
-    text << '"' << path << R"(":{"audio":)" << flag('a') << R"(,"document":)" << flag('d') << R"(,"name":")"
-         << name << R"(","path":")" << path << R"(","photo":)" << flag('p') << R"(,"video":)" << flag('v') << '}';
-    return text.str();
 }
 
 void FileIndexTest::SetUp() {
@@ -108,19 +128,40 @@ void FileIndexTest::TearDown() {
     Left();  // looks at the records that no test has looked at
 }
 
+void FileIndexTest::Given(const std::string &line) {
+    const auto [what, text] = Split(line);
+    if (what.ends_with(".conf")) {
+        WriteFile(std::string(kConfigDir) + "/" + what, text);
+        return;
+    }
+    if (what.starts_with("queue")) {
+        GivenQueue("photo", text.empty() ? "" : Decoded(text) + "\n", what.substr(5));
+        return;
+    }
+    Platform &platform = Platform::Current();
+    const std::map<std::string, std::function<void()>> changes = {
+        {"no", [&] { fs::remove_all(text.ends_with(".conf") ? kConfigDir + ("/" + text) : text); }},
+        {"search", [&] { platform.searchOn = text == "on"; }},
+        {"gone", [&] { platform.shares.erase(text); }},
+        {"locked", [&] { platform.shares.at(text).encrypted = true; }},
+        {"encrypted", [&] { platform.shares.at(text).encryptionKind = true; }},
+        {"read-only", [&] { platform.shares.at(text).readOnly = true; }},
+        {"share", [&] { platform.shares[Decoded(Split(text).first)].path = Split(text).second; }},
+        {"result",
+         [&] {
+             Fault fault;
+             std::istringstream(text) >> fault.call >> fault.result >> std::hex >> fault.error >> fault.about;
+             Fail(fault);
+         }},
+    };
+    changes.at(what)();
+}
+
 void FileIndexTest::GivenShare(const std::string &name, const std::string &path) {
     const std::string directory = path.empty() ? "/vol1/" + name : path;
     fs::create_directories(directory);
     directories_.push_back(directory);
     Platform::Current().shares[name].path = directory;
-}
-
-void FileIndexTest::GivenFolders(const std::vector<std::string> &records) {
-    std::string text = "{";
-    for (const std::string &record : records) {
-        text += (text.size() > 1 ? "," : "") + record;
-    }
-    GivenFolderConf(text + "}");
 }
 
 void FileIndexTest::GivenQueue(const std::string &share, const std::string &text, const std::string &suffix) {
@@ -154,14 +195,9 @@ std::string FileIndexTest::Left() {
                    record.message;
     }
     SyslogCapture::Clear();
-    const int code = LeftCode();
-    return code == FILEINDEX_ERR_NONE && records.empty() ? "" : std::to_string(code) + records;
-}
-
-int FileIndexTest::LeftCode() {
     const int code = ErrorHandler::GetError();
     ErrorHandler::SetError(FILEINDEX_ERR_NONE);
-    return code;
+    return code == FILEINDEX_ERR_NONE && records.empty() ? "" : std::to_string(code) + records;
 }
 
 void FileIndexTest::Forget() {

@@ -16,6 +16,7 @@
 
 #include <set>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace fileindex_test {
@@ -41,11 +42,17 @@ Json::Value Parse(const std::string &text);  ///< strict; a text that is no JSON
 std::string Print(const Json::Value &value);
 std::string Canonical(const std::string &text);  ///< Print(Parse(text)): one spelling for each document
 
-std::string ReadFile(const std::string &path);  ///< "(missing)" when there is no file
-void WriteFile(const std::string &path, const std::string &text);
+std::pair<std::string, std::string> Split(const std::string &line);  ///< the first word, and the rest
+std::string Decoded(const std::string &text);  ///< of a line that is a JSON string if it has to be
 
-/// {path: {record}} with the flags named by letters of "davp", for putting documents together.
-std::string FolderRecord(const std::string &path, const std::string &name, const std::string &flags);
+/// The answer of "Function argument": calls.cpp has the functions.
+std::string Ask(const std::string &call);
+
+std::string ReadFile(const std::string &path);  ///< "(missing)" when there is no file
+std::string TestData(const std::string &name);  ///< a file below tests/unit
+/// Where REWRITE is set in the environment, the file is made what was found.
+void ExpectTestData(const std::string &name, const std::string &found);
+void WriteFile(const std::string &path, const std::string &text);
 
 class FileIndexTest : public testing::Test {
 protected:
@@ -55,10 +62,12 @@ protected:
     /// records in the log, and with every scripted failure used.
     void TearDown() override;
 
+    /// A line of a table: "folder.conf TEXT", "queue TEXT" (of photo), "queue.tmp TEXT", "search on", "no PATH";
+    /// "share NAME PATH", without a directory, "gone NAME", "locked NAME", "encrypted NAME", "read-only NAME"; of
+    /// the next such call, "result CALL NUMBER ERROR ABOUT".
+    void Given(const std::string &line);
     /// A share with a real directory; /vol1/NAME unless said otherwise.
     void GivenShare(const std::string &name, const std::string &path = "");
-    /// The members of an object, as FolderRecord makes them.
-    static void GivenFolders(const std::vector<std::string> &records);
     static void GivenFolderConf(const std::string &text) { WriteFile(kFolderConf, text); }
     static void GivenStatusConf(const std::string &text) { WriteFile(kStatusConf, text); }
     static void GivenQueue(const std::string &share, const std::string &text, const std::string &suffix = "");
@@ -67,14 +76,11 @@ protected:
     static std::string QueuePath(const std::string &share);
     /// The lines of the share's queue file.
     static std::vector<std::string> Queue(const std::string &share);
-    std::vector<std::string> SentCommands() { return daemon_.Commands(); }
     static std::vector<std::string> Journal() { return Script::Current().Journal(); }
 
     /// The error code and the records since the last look, "2 utils.cpp:418 message | utils.cpp:239 message";
     /// empty when there are neither. The line is left out for the modules that do not fix it. Forgets both.
     static std::string Left();
-    /// The code alone.
-    static int LeftCode();
     static void Forget();
 
     static std::string FolderConf() { return Canonical(ReadFile(kFolderConf)); }

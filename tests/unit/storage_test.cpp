@@ -112,6 +112,28 @@ TEST_F(DatabaseLocation, IsMadeWithTheUmaskAndToldEvenWhenItCannotBe) {
     EXPECT_EQ(fs::perms(0750), fs::status(kDatabase).permissions());
 }
 
+class IndexData : public FileIndexTest {};
+
+TEST_F(IndexData, CleaningRemovesTheIndexDataAndNothingElse) {
+    GivenShare("photo");
+    fs::create_directories("/vol1/photo/@eaDir/VORK@.fileindexdb/deep/er");
+    WriteFile("/vol1/photo/@eaDir/other", "kept");
+    GivenQueue("photo", "x", ".tmp");
+    EXPECT_TRUE(IndexMgr::CleanShareIndexData("photo"));
+    EXPECT_EQ("kept", ReadFile("/vol1/photo/@eaDir/other"));
+    Fail({.call = "VLIBCExec", .times = 3, .result = 1});
+    EXPECT_TRUE(IndexMgr::CleanShareIndexData("photo")) << "what rm says does not count";
+}
+
+TEST_F(IndexData, CleaningStopsAtAPathThatIsCut) {
+    bool cleaned = true;
+    for (size_t length = 4050; length < 4096; ++length) {
+        Platform::Current().shares["long"].path = "/" + std::string(length, 'x');
+        cleaned = IndexMgr::CleanShareIndexData("long");
+    }
+    EXPECT_FALSE(cleaned);
+}
+
 class Monitor : public FileIndexTest {};
 
 TEST_F(Monitor, WithoutMemoryForItIsReported) {

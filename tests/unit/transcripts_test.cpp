@@ -1,0 +1,97 @@
+// What the functions answer, and what they do, one by one: the lines of the files in tests/unit/transcripts.
+//
+//   # a remark
+//   given FACT                  see FileIndexTest::Given
+//   Function argument | answer, code and records
+//     what it did: the journal, and the files that it left otherwise than they were
+//
+// No call leaves a lock or a descriptor behind.
+#include "fixture.h"
+
+#include <filesystem>
+#include <sstream>
+#include <string>
+
+namespace fs = std::filesystem;
+
+namespace fileindex_test {
+namespace {
+
+class Transcripts : public FileIndexTest, public testing::WithParamInterface<const char *> {
+protected:
+    /// In the share photo, 2015 and links to it, and places that are not indexed or only look so; in music, places
+    /// on other file systems.
+    void SetUp() override {
+        FileIndexTest::SetUp();
+        GivenShare("photo");
+        GivenShare("music", "/vol2/music");
+        for (const char *directory : {"a", "2015", "#recycle/x", "a#recycle", "#snapshot/x", "a#snapshot",
+                                      "mounted", ".DS_Store/x", "#bin"}) {
+            fs::create_directories(std::string("/vol1/photo/") + directory);
+        }
+        fs::create_symlink("2015", "/vol1/photo/link");
+        fs::create_symlink("loop", "/vol1/photo/loop");
+        for (const char *directory : {"remote", "image", "pseudo", "strange"}) {
+            fs::create_directories(std::string("/vol2/music/") + directory);
+        }
+        Platform &platform = Platform::Current();
+        platform.fsTypes = {{"/vol2/music/remote", kRemoteFs},
+                            {"/vol2/music/image", kImageFs},
+                            {"/vol2/music/pseudo", kPseudoFs},
+                            {"/vol2/music/strange", -1},
+                            {"/unknown", -1}};
+        platform.recycleBins = {"/vol1/photo/#recycle", "/vol1/photo/#bin"};
+        platform.snapshots = {"/vol1/photo/#snapshot", "/vol1/photo/#bin"};
+        platform.mountPoints = {"/vol1/photo/mounted"};
+        Script::Current().now = 1700000000;
+        daemon_.Start();
+    }
+
+    static std::string Play(const std::string &call) {
+        Forget();
+        const std::string files[] = {kFolderConf, kStatusConf};
+        const std::string before[] = {ReadFile(files[0]), ReadFile(files[1])};
+        const auto descriptors = OpenDescriptors();
+        const std::string answer = Ask(call);
+        const std::string left = Left();
+        EXPECT_EQ(descriptors, OpenDescriptors()) << call;
+        EXPECT_FALSE(IsLocked(kFolderLock) || IsLocked(kStatusLock)) << call;
+        std::string outcome = " | " + answer + " " + left;
+        outcome.resize(outcome.find_last_not_of(' ') + 1);
+        for (const std::string &step : Journal()) {
+            outcome += "\n  " + step;
+        }
+        for (const size_t i : {0U, 1U}) {
+            const std::string now = ReadFile(files[i]);
+            outcome += now == before[i] ? "" : "\n  " + now.substr(0, now.find('\n'));
+        }
+        return outcome;
+    }
+};
+
+TEST_P(Transcripts, AreTrue) {
+    const std::string file = std::string("transcripts/") + GetParam() + ".txt";
+    std::string found;
+    std::istringstream lines(TestData(file));
+    for (std::string line; std::getline(lines, line);) {
+        if (line.starts_with("  ")) {
+            continue;
+        }
+        found += line.substr(0, line.find(" |"));
+        if (line.starts_with("given ")) {
+            Given(line.substr(6));
+        } else if (!line.empty() && !line.starts_with("#")) {
+            found += Play(line.substr(0, line.find(" |")));
+        }
+        found += "\n";
+    }
+    ExpectTestData(file, found);
+}
+
+INSTANTIATE_TEST_SUITE_P(Of, Transcripts,
+                         testing::Values("paths", "places", "folders", "documents", "listing", "progress",
+                                         "requests"),
+                         [](const auto &info) { return info.param; });
+
+}  // namespace
+}  // namespace fileindex_test
