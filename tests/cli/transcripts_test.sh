@@ -4,6 +4,7 @@
 #   $ COMMAND     is run by the shell; below it stands what it writes to stdout, then, each line behind "! ", what it
 #                 writes to stderr, then its exit status unless that is 0: "[66]"
 #   # TEXT        a remark, behind an empty line
+#   ? COMMAND     the transcript is left out where this fails
 #
 # Points in time are shown as TIME or, in names of files, STAMP, seconds since the epoch as EPOCH, numbers of processes
 # as PID, lines of the platform's source as PLACE. Each transcript starts on a fresh machine with the shares photo and
@@ -52,7 +53,17 @@ received() {
     cat /tmp/commands
 }
 
-# The commands of a transcript share one shell, so that one can build on another.
+# What "explain" says of a path, in short.
+# shellcheck disable=SC2317  # the transcripts call it
+why() {
+    local json status
+    json=$(fileindexctl explain --json "$1")
+    status=$?
+    echo "$1: $status $(grep -oE '"(explained|failed_rule|indexable)":[^,]*|"result":"failed"|"remedy":"' <<<"$json" |
+        tr -d '"' | paste -sd ' ')"
+}
+
+# The commands of a transcript share one shell, so that one can build on another. Fails when it is to be left out.
 play() {
     local line status first=yes
     while IFS= read -r line; do
@@ -65,6 +76,10 @@ play() {
             without_accidents </tmp/stderr | sed 's/^/! /'
             [[ $status -eq 0 ]] || printf '[%s]\n' "$status"
             ;;
+        '? '*)
+            printf '%s\n' "$line"
+            eval "${line#\? }" >/dev/null 2>&1 </dev/null || return 1
+            ;;
         '#'*)
             [[ $first == yes ]] || echo
             printf '%s\n' "$line"
@@ -73,12 +88,13 @@ play() {
         esac
         first=no
     done <"$1"
+    return 0
 }
 
 failures=0
 for transcript in "$here"/transcripts/*.txt; do
     fresh_machine
-    play "$transcript" >/tmp/played
+    play "$transcript" >/tmp/played || continue
     if [[ -n ${REWRITE-} ]]; then
         cat /tmp/played >"$transcript"
     else

@@ -3,6 +3,8 @@
 
 #include <vork/process.h>
 
+#include <fcntl.h>
+
 #include <csignal>
 #include <thread>
 

@@ -1,15 +1,14 @@
-// Files, child processes and a dead server for the tests of the platform, which run as root in a file system of
+// Files and child processes for the tests of the platform, which run as root in a file system of
 // their own.
 #ifndef TESTS_PLATFORM_SUPPORT_H
 #define TESTS_PLATFORM_SUPPORT_H
 
 #include <vork/error.h>
+#include <vork/share.h>
 
 #include <gtest/gtest.h>
 #include <json/json.h>
 
-#include <fcntl.h>
-#include <sys/mount.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -63,29 +62,16 @@ inline int WaitFor(pid_t child) {
     return waitpid(child, &status, 0) == child && WIFEXITED(status) ? WEXITSTATUS(status) : -1;
 }
 
-/// The mount of a network file system whose server never answers: whoever looks below it waits for ever.
-class DeadServer {
-public:
-    explicit DeadServer(const std::string &point) : point_(point) {
-        std::filesystem::create_directories(point);
-        const std::string options = "fd=" + std::to_string(fd_) + ",rootmode=40000,user_id=0,group_id=0";
-        mounted_ = fd_ >= 0 && mount("server:/", point.c_str(), "fuse.sshfs", 0, options.c_str()) == 0;
+/// "plain", "unlocked", "locked" or "failed".
+inline std::string Encryption(const std::string &path) {
+    const VORKSHARE share{"share", 0, path.c_str()};
+    int kind = -9;
+    int locked = -9;
+    if (VLIBShareIsEncryptionGet(&share, &kind) < 0 || VLIBShareIsEncryptedGet(&share, &locked) < 0) {
+        return "failed";
     }
-    DeadServer(const DeadServer &) = delete;
-    DeadServer &operator=(const DeadServer &) = delete;
-    ~DeadServer() {
-        umount2(point_.c_str(), MNT_DETACH | MNT_FORCE);
-        close(fd_);
-    }
-
-    /// False where the kernel lacks FUSE.
-    bool IsMounted() const { return mounted_; }
-
-private:
-    const std::string point_;
-    const int fd_ = open("/dev/fuse", O_RDWR | O_CLOEXEC);
-    bool mounted_ = false;
-};
+    return kind == 0 ? "plain" : locked == 1 ? "locked" : "unlocked";
+}
 
 }  // namespace platform_test
 

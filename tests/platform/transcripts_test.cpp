@@ -120,6 +120,7 @@ const std::map<std::string, std::string (*)(Text)> kQuestions = {
     {"kind", Kind},
     {"mount-point", [](Text path) { return Answer(VORKFSDirIsMntPoint(path.c_str())); }},
     {"read-only", IsReadOnly},
+    {"encryption", platform_test::Encryption},
     {"snapshot", IsInSnapshot},
     {"room", HasRoom},
     {"hidden", [](Text name) { return Answer(VORKEAIsHiddenDir(name.c_str())); }},

@@ -1,10 +1,7 @@
-// A server that never answers, and encrypted directories; all else about file systems is in the transcripts.
+// Encrypted directories, whose keys no program for a transcript adds; all else about file systems is in those.
 #include "support.h"
 
-#include <vork/filesystem.h>
-#include <vork/quota.h>
-#include <vork/share.h>
-
+#include <fcntl.h>
 #include <linux/fscrypt.h>
 #include <sys/ioctl.h>
 
@@ -13,46 +10,9 @@
 
 namespace {
 
-namespace fs = std::filesystem;
+using platform_test::Encryption;
 
-// "plain", "unlocked", "locked" or "failed".
-std::string Encryption(const char *path) {
-    const VORKSHARE share{"share", 0, path};
-    int kind = -9;
-    int locked = -9;
-    if (VLIBShareIsEncryptionGet(&share, &kind) < 0 || VLIBShareIsEncryptedGet(&share, &locked) < 0) {
-        return "failed";
-    }
-    return kind == 0 ? "plain" : locked == 1 ? "locked" : "unlocked";
-}
-
-TEST(FileSystemTest, DoesNotHangOnADeadServer) {
-    const std::string point = "/tmp/dead server";
-    const platform_test::DeadServer server(point);
-    if (!server.IsMounted()) {
-        GTEST_SKIP() << "no FUSE";
-    }
-    fs::create_symlink(point + "/x", "/tmp/to-dead");
-    alarm(60);
-    for (const std::string &path :
-         {point, point + "/a/b", std::string("/tmp/to-dead/y"), point + "/../dead server/x"}) {
-        const VORKSHARE share{"share", 0, path.c_str()};
-        int inSnapshot = -9;
-        int readOnly = -9;
-        EXPECT_EQ(VORKFSIsRemoteFS(VORKGetFSType(path.c_str(), 0)), 1) << path;
-        EXPECT_EQ(VLIBFhsPathInSnapshot(path.c_str(), &inSnapshot) + inSnapshot, 0) << path;
-        EXPECT_EQ(VLIBShareIsReadOnlyGet(&share, &readOnly) + readOnly, 0) << path;
-        EXPECT_EQ(Encryption(path.c_str()), "plain") << path;
-        EXPECT_EQ(VORKQuotaIsEnough(0, path.c_str(), 1), 0) << path;
-        EXPECT_EQ(VLIBCErrGet(), VORK_ERR_IO) << path;
-    }
-    EXPECT_EQ(VORKFSDirIsMntPoint(point.c_str()), 1);
-    EXPECT_EQ(VORKFSDirIsMntPoint((point + "/a").c_str()), 0);
-    EXPECT_EQ(VORKFSIsRemoteFS(VORKGetFSType((point + "/../..").c_str(), 0)), 0);
-    alarm(0);
-}
-
-TEST(FileSystemTest, KnowsEncryptedDirectories) {
+TEST(EncryptionTest, IsUnlockedWhileItsKeyIsThere) {
     ASSERT_EQ(
         platform_test::Shell("truncate -s 16M /vol2/crypt.img && mkfs.ext4 -q -F -O encrypt /vol2/crypt.img &&"
                              " mkdir /tmp/crypt && mount -n -o loop /vol2/crypt.img /tmp/crypt &&"
