@@ -1,20 +1,11 @@
 // Eight processes change both configuration files at once, and some of them are killed.
 #include "harness.h"
-#include "scenarios.h"
 
-#include <sched.h>
-#include <unistd.h>
-
-#include <array>
-#include <atomic>
 #include <csignal>
-#include <random>
 
 namespace reliability {
 
 namespace {
-
-using namespace VORK::FILEINDEX;
 
 constexpr int kWorkers = 8;
 constexpr int kMaxFolders = 1000;
@@ -24,24 +15,7 @@ constexpr size_t kPage = 4096;
 struct Board {
     std::array<std::atomic<bool>, kMaxFolders> folders;
     std::array<std::atomic<bool>, kMaxMarkers> markers;
-    /// Held around a write above a page, which is known not to survive a kill, and around a kill.
-    std::array<std::atomic<bool>, kWorkers> noKill;
     std::atomic<int> busy;  ///< times an operation was refused because of the lock
-};
-
-class Spinlock {
-public:
-    explicit Spinlock(std::atomic<bool> &taken) : taken_(taken) {
-        while (taken_.exchange(true)) {
-            ::sched_yield();
-        }
-    }
-    ~Spinlock() { taken_ = false; }
-    Spinlock(const Spinlock &) = delete;
-    Spinlock &operator=(const Spinlock &) = delete;
-
-private:
-    std::atomic<bool> &taken_;
 };
 
 std::string PathOf(int number) {
@@ -52,28 +26,32 @@ std::string MarkerOf(int number) {
     return "marker " + std::to_string(number);
 }
 
-/// Repeats an operation that is refused for the lock alone; any other failure is one.
-template <typename Operation>
-void Insist(Board &board, Operation operation) {
+/// A write above a page is known not to survive a kill, so SIGTERM, which kills just as well, waits for its end.
+ssize_t WriteUnkilled(int fd, const void *data, size_t size) {
+    sigset_t kill;
+    sigemptyset(&kill);
+    sigaddset(&kill, SIGTERM);
+    ::sigprocmask(size > kPage ? SIG_BLOCK : SIG_UNBLOCK, &kill, nullptr);
+    const ssize_t written = RealWrite(fd, data, size);
+    ::sigprocmask(SIG_UNBLOCK, &kill, nullptr);
+    return written;
+}
+
+/// Repeats a call that is refused for the lock alone; any other failure is one.
+template <typename Call>
+void Insist(Board &board, Call call) {
     ErrorHandler::SetError(FILEINDEX_ERR_NONE);
-    while (!operation()) {
+    for (; !call(); ++board.busy) {
         Check(ErrorHandler::GetError() == FILEINDEX_ERR_LOCK, "refused for another reason than the lock");
-        ++board.busy;
     }
 }
 
 void Work(Board &board, int worker, int firstFolder, int markers) {
-    WriteHook() = [&board, worker](int fd, const void *data, size_t size) {
-        if (size <= kPage) {
-            return RealWrite(fd, data, size);
-        }
-        const Spinlock guard(board.noKill[worker]);
-        return RealWrite(fd, data, size);
-    };
+    WriteHook() = WriteUnkilled;
     // By turns, so that a worker is killed in either.
     for (int i = worker; i < std::max(kMaxFolders, markers); i += kWorkers) {
         if (i >= firstFolder && i < kMaxFolders && !board.folders[i]) {
-            Insist(board, [i] { return IndexMgr::Add(Array({FolderRequest(PathOf(i), "x")})); });
+            Insist(board, [i] { return IndexMgr::Add(Array(FolderRequest(PathOf(i), "x"))); });
             board.folders[i] = true;
         }
         if (i < markers && !board.markers[i]) {
@@ -92,23 +70,34 @@ void AddFirst(int count) {
     Check(count == 0 || IndexMgr::Add(request), "the first folders");
 }
 
-using Team = std::array<pid_t, kWorkers>;
-
-/// False when the worker had finished already.
-bool KillWorker(Board &board, Team &team, int worker) {
-    const Spinlock guard(board.noKill[worker]);
-    ::kill(team[worker], SIGKILL);
-    const int status = Wait(team[worker]);
-    Check(status == 0 || status == 128 + SIGKILL, "a worker failed");
-    team[worker] = 0;
-    return status != 0;
+/// Starts eight workers, and one anew for each that is killed. Returns the number of kills.
+int KillWorkers(int wanted, const std::function<pid_t(int worker)> &start) {
+    std::mt19937 random(1);
+    std::array<pid_t, kWorkers> team{};
+    for (int worker = 0; worker < kWorkers; ++worker) {
+        team[worker] = start(worker);
+    }
+    int kills = 0;
+    for (bool finished = false; kills < wanted && !finished;) {
+        ::usleep(random() % 100000);  // the instant to kill at, not a wait
+        const int worker = static_cast<int>(random() % kWorkers);
+        ::kill(team[worker], SIGTERM);
+        const int status = Wait(team[worker]);
+        Check(status == 0 || status == 128 + SIGTERM, "a worker failed");
+        finished = status == 0;
+        kills += finished ? 0 : 1;
+        team[worker] = start(worker);
+    }
+    for (const pid_t member : team) {
+        Check(Wait(member) == 0, "a worker failed");
+    }
+    return kills;
 }
 
 void CheckBoard(const Board &board, int firstFolder, int markers) {
     Folders folders;
-    Check(folders.Load(), "folder.conf");
     Status status;
-    Check(status.Load(), "status.conf");
+    Check(folders.Load() && status.Load(), "the files");
     Json::Value record;
     for (int i = 0; i < kMaxFolders; ++i) {
         Check(i < firstFolder || board.folders[i], "a folder was not added");
@@ -119,53 +108,29 @@ void CheckBoard(const Board &board, int firstFolder, int markers) {
     }
 }
 
-void RefuseOneMore() {
-    const auto before = ReadFile(kFolderConf);
-    Check(Fails([] { return IndexMgr::Add(Array({FolderRequest("/photo/one more", "x")})); },
-                FILEINDEX_ERR_EXCEED_MAX_FOLDER),
-          "folder 1001: code 5");
-    Check(ReadFile(kFolderConf) == before, "folder 1001 changed the file");
-}
-
 }  // namespace
 
-void Adders() {
+void Adders(const std::string &) {
     MakeMachine();
     const pid_t daemon = StartDaemon();
     const int firstFolder = Rounds(900, 0);
     const int markers = Rounds(200, kMaxMarkers);
-    const int wanted = Rounds(15, 200);
-    const Stopwatch stopwatch;
-    std::mt19937 random(1);
+    const double begin = Now();
     AddFirst(firstFolder);
     auto &board = Shared<Board>();
-    const auto start = [&](int worker) {
+    const int kills = KillWorkers(Rounds(15, 200), [&](int worker) {
         return Start([&board, worker, firstFolder, markers] { Work(board, worker, firstFolder, markers); });
-    };
-    Team team{};
-    for (int worker = 0; worker < kWorkers; ++worker) {
-        team[worker] = start(worker);
-    }
-    int kills = 0;
-    for (; kills < wanted; ++kills) {
-        ::usleep(random() % 100000);  // the instant to kill at, not a wait
-        const int worker = static_cast<int>(random() % kWorkers);
-        if (!KillWorker(board, team, worker)) {
-            break;
-        }
-        team[worker] = start(worker);
-    }
-    for (const pid_t member : team) {
-        Check(member == 0 || Wait(member) == 0, "a worker failed");
-    }
+    });
     CheckBoard(board, firstFolder, markers);
-    RefuseOneMore();
+    const auto before = ReadFile(kFolderConf);
+    const auto addOneMore = [] { return IndexMgr::Add(Array(FolderRequest("/photo/one more", "x"))); };
+    Check(Fails(addOneMore, FILEINDEX_ERR_EXCEED_MAX_FOLDER), "folder 1001: code 5");
+    Check(ReadFile(kFolderConf) == before, "folder 1001 changed the file");
     Kill(daemon);
-    Figure("8 processes, " + std::to_string(kMaxFolders - firstFolder) + " folders and " +
-               std::to_string(markers) + " markers",
-           "all there; " + std::to_string(kills) + " killed, lock busy " + std::to_string(board.busy) +
-               " times, folder 1001 refused (" +
-               std::to_string(static_cast<int>(stopwatch.Milliseconds() / 1000)) + " s)");
+    Figure(
+        "8 processes, %d folders and %d markers | all there; %d killed, lock busy %d times, folder 1001 refused"
+        " (%.0f s)",
+        kMaxFolders - firstFolder, markers, kills, board.busy.load(), Now() - begin);
 }
 
 }  // namespace reliability

@@ -1,47 +1,26 @@
 #include "harness.h"
 
-#include "support/processes.h"
-
 #include <json/reader.h>
 
-#include <fcntl.h>
-#include <sys/mman.h>
 #include <sys/prctl.h>
 #include <sys/socket.h>
-#include <sys/stat.h>
 #include <sys/syscall.h>
-#include <sys/un.h>
 #include <sys/wait.h>
-#include <unistd.h>
 
-#include <array>
+#include <chrono>
 #include <csignal>
+#include <cstdarg>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <memory>
-#include <sstream>
 
 namespace reliability {
 
-namespace {
-
-constexpr char kPlatformConf[] = "/usr/vork/etc/platform.conf";
-
-/// The platform reads its file more often while the file is fresh; a trace is to be the same each time.
-void AwaitAge(const std::string &path) {
-    struct stat status {};
-    Check(::stat(path.c_str(), &status) == 0, path);
-    timespec now{};
-    while (::clock_gettime(CLOCK_REALTIME, &now) == 0 &&
-           (now.tv_sec - status.st_ctim.tv_sec) * 1000 + (now.tv_nsec - status.st_ctim.tv_nsec) / 1000000 < 50) {
-        ::usleep(1000);
-    }
-}
-
-}  // namespace
+namespace fs = std::filesystem;
 
 int Rounds(int quick, int whole) {
     const char *tier = std::getenv("FILEINDEX_TORTURE");
@@ -55,19 +34,23 @@ void Check(bool fine, const std::string &reason) {
     }
 }
 
-void Figure(const std::string &subject, const std::string &measured) {
-    std::printf("figure: %s | %s\n", subject.c_str(), measured.c_str());
+void Figure(const char *format, ...) {
+    std::va_list values;
+    va_start(values, format);
+    std::printf("figure: ");
+    std::vprintf(format, values);
+    va_end(values);
+    std::puts("");
     std::fflush(stdout);
+}
+
+double Now() {
+    return std::chrono::duration<double>(std::chrono::steady_clock::now().time_since_epoch()).count();
 }
 
 std::optional<std::string> ReadFile(const std::string &path) {
     std::ifstream file(path, std::ios::binary);
-    if (!file) {
-        return std::nullopt;
-    }
-    std::ostringstream text;
-    text << file.rdbuf();
-    return text.str();
+    return file ? std::optional(std::string(std::istreambuf_iterator<char>(file), {})) : std::nullopt;
 }
 
 void WriteFile(const std::string &path, const std::string &text) {
@@ -81,10 +64,8 @@ std::optional<Json::Value> Parse(const std::string &text) {
     builder["failIfExtra"] = true;
     const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
     Json::Value value;
-    if (!reader->parse(text.data(), text.data() + text.size(), &value, nullptr)) {
-        return std::nullopt;
-    }
-    return value;
+    const bool parsed = reader->parse(text.data(), text.data() + text.size(), &value, nullptr);
+    return parsed ? std::optional(value) : std::nullopt;
 }
 
 pid_t Start(const std::function<void()> &body) {
@@ -112,18 +93,6 @@ void Kill(pid_t child) {
     Check(Wait(child) == 128 + SIGKILL, "a process ended before it was killed");
 }
 
-SameDescriptors::SameDescriptors() : before_(fileindex_test::OpenDescriptors()) {}
-
-SameDescriptors::~SameDescriptors() {
-    Check(fileindex_test::OpenDescriptors() == before_, "descriptors differ before and after");
-}
-
-void *SharedMemory(size_t size) {
-    void *memory = ::mmap(nullptr, size, PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0);
-    Check(memory != MAP_FAILED, "mmap");
-    return memory;
-}
-
 std::function<ssize_t(int, const void *, size_t)> &WriteHook() {
     static std::function<ssize_t(int, const void *, size_t)> hook;
     return hook;
@@ -134,7 +103,6 @@ ssize_t RealWrite(int fd, const void *data, size_t size) {
 }
 
 void MakeMachine(bool search) {
-    namespace fs = std::filesystem;
     // The fixed places may only be emptied where they are this program's own.
     Check(ReadFile("/proc/self/mountinfo").value_or("").find("fileindex-private") != std::string::npos,
           "not in a private namespace");
@@ -144,25 +112,34 @@ void MakeMachine(bool search) {
     }
     fs::create_directories("/vol1/photo/@eaDir");
     fs::create_directories("/vol1/music/@eaDir");
+    const std::string conf = "/usr/vork/etc/platform.conf";
     const std::string platform = std::string(R"({"shares": {"music": {"path": "/vol1/music"}, )") +
                                  R"("photo": {"path": "/vol1/photo"}}, "search": )" + (search ? "true" : "false") +
                                  "}\n";
-    if (Parse(ReadFile(kPlatformConf).value_or("")) != Parse(platform)) {
-        WriteFile(kPlatformConf, platform);
+    if (Parse(ReadFile(conf).value_or("")) != Parse(platform)) {
+        WriteFile(conf, platform);
     }
-    AwaitAge(kPlatformConf);
+    // The platform reads its file more often while the file is fresh; a trace is to be the same each time.
+    while (fs::file_time_type::clock::now() - fs::last_write_time(conf) < std::chrono::milliseconds(50)) {
+        ::usleep(1000);
+    }
     for (const char *program : {"/etc/init.d/fileindexd", "/etc/init.d/smbd", "/usr/vork/bin/vorkzolnotify"}) {
         WriteFile(program, "#!/bin/sh\n");
-        Check(::chmod(program, 0755) == 0, program);
+        fs::permissions(program, fs::perms(0755));
     }
+}
+
+sockaddr_un SocketAddress() {
+    sockaddr_un address{};
+    address.sun_family = AF_UNIX;
+    std::memcpy(address.sun_path, kSocket, sizeof kSocket);
+    return address;
 }
 
 int Listen(int backlog) {
     ::unlink(kSocket);
     const int listener = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
-    sockaddr_un address{};
-    address.sun_family = AF_UNIX;
-    std::memcpy(address.sun_path, kSocket, sizeof kSocket);
+    const sockaddr_un address = SocketAddress();
     Check(::bind(listener, reinterpret_cast<const sockaddr *>(&address), sizeof address) == 0, "bind");
     Check(backlog < 0 || ::listen(listener, backlog) == 0, "listen");
     return listener;
@@ -187,14 +164,6 @@ Json::Value FolderRequest(const std::string &path, const std::string &name) {
     folder["name"] = name;
     folder["photo"] = true;
     return folder;
-}
-
-Json::Value Array(std::initializer_list<Json::Value> elements) {
-    Json::Value array(Json::arrayValue);
-    for (const Json::Value &element : elements) {
-        array.append(element);
-    }
-    return array;
 }
 
 }  // namespace reliability

@@ -4,20 +4,30 @@
 /// A scenario that goes wrong ends its process at once; one that ends, passed.
 #pragma once
 
+#include "support/processes.h"
+
 #include <fileindex/fileindex.h>
 
 #include <json/value.h>
 
-#include <sys/types.h>
+#include <sys/mman.h>
+#include <sys/un.h>
+#include <unistd.h>
 
-#include <chrono>
+#include <algorithm>
+#include <array>
+#include <atomic>
 #include <functional>
+#include <new>
 #include <optional>
+#include <random>
 #include <set>
 #include <string>
 #include <vector>
 
 namespace reliability {
+
+using namespace VORK::FILEINDEX;  // NOLINT(google-build-using-namespace): the subject of every scenario
 
 inline constexpr char kConfigDir[] = "/usr/vork/etc/fileindex";
 inline constexpr char kFolderConf[] = "/usr/vork/etc/fileindex/folder.conf";
@@ -27,14 +37,22 @@ inline constexpr char kStatusLock[] = "/tmp/fileidx_cfg_status.lock";
 inline constexpr char kQueue[] = "/vol1/photo/@eaDir/VORK@file_index_queue";
 inline constexpr char kSocket[] = "/var/run/fileindexd.sock";
 
+// What can be run, "fileindex_torture NAME [ARGUMENT]"; the argument is a file system's or an operation's name.
+using Scenario = void(const std::string &argument);
+Scenario FullDisk, Kills, Readers, Adders, Threads, QueueWriters, Moods, WriterModel, Planted, ForeignLocks;
+Scenario Operation, ListOperations;
+
 /// The number of rounds: `whole` when FILEINDEX_TORTURE=long asks for it.
 int Rounds(int quick, int whole);
 
 /// Ends the process, with the reason, unless `fine`.
 void Check(bool fine, const std::string &reason);
 
-/// One row of the table that a run ends with.
-void Figure(const std::string &subject, const std::string &measured);
+/// One row of the table that a run ends with: "SUBJECT | what was measured".
+[[gnu::format(printf, 1, 2)]] void Figure(const char *format, ...);
+
+/// Seconds, from some beginning.
+double Now();
 
 std::optional<std::string> ReadFile(const std::string &path);
 void WriteFile(const std::string &path, const std::string &text);
@@ -47,42 +65,28 @@ pid_t Start(const std::function<void()> &body);
 int Wait(pid_t child);
 void Kill(pid_t child);
 
-/// The code that `operation` leaves; false results only.
-template <typename Operation>
-bool Fails(Operation operation, int code) {
-    namespace fi = VORK::FILEINDEX;
-    fi::ErrorHandler::SetError(fi::FILEINDEX_ERR_NONE);
-    return !operation() && fi::ErrorHandler::GetError() == code;
+/// Does the call fail and leave the code?
+template <typename Call>
+bool Fails(Call call, int code) {
+    ErrorHandler::SetError(FILEINDEX_ERR_NONE);
+    return !call() && ErrorHandler::GetError() == code;
 }
 
-class Stopwatch {
-public:
-    double Milliseconds() const {
-        return std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now() - start_).count();
-    }
-
-private:
-    std::chrono::steady_clock::time_point start_ = std::chrono::steady_clock::now();
-};
-
 /// Fails when the block leaves other descriptors open than it found.
-class SameDescriptors {
-public:
-    SameDescriptors();
-    ~SameDescriptors();
-    SameDescriptors(const SameDescriptors &) = delete;
-    SameDescriptors &operator=(const SameDescriptors &) = delete;
+struct SameDescriptors {
+    const std::set<std::string> before = fileindex_test::OpenDescriptors();
 
-private:
-    const std::set<std::string> before_;
+    ~SameDescriptors() {
+        Check(fileindex_test::OpenDescriptors() == before, "other descriptors are open than before");
+    }
 };
-
-void *SharedMemory(size_t size);
 
 /// An object that the processes started from here share. Never unmapped.
 template <typename Object>
 Object &Shared() {
-    return *new (SharedMemory(sizeof(Object))) Object();
+    void *memory = ::mmap(nullptr, sizeof(Object), PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0);
+    Check(memory != MAP_FAILED, "mmap");
+    return *new (memory) Object();
 }
 
 /// Called in the place of `write` in this process, the library's own calls included; none at first.
@@ -94,10 +98,17 @@ void MakeMachine(bool search = true);
 
 /// A daemon that reads every connection to its end.
 pid_t StartDaemon();
-/// The command socket, listening.
+/// The command socket, listening unless the backlog is negative.
 int Listen(int backlog);
+sockaddr_un SocketAddress();
 
 Json::Value FolderRequest(const std::string &path, const std::string &name);
-Json::Value Array(std::initializer_list<Json::Value> elements);
+
+template <typename... Elements>
+Json::Value Array(const Elements &...elements) {
+    Json::Value array(Json::arrayValue);
+    (array.append(Json::Value(elements)), ...);
+    return array;
+}
 
 }  // namespace reliability

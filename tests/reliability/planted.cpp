@@ -1,21 +1,17 @@
 // What strangers leave in the places that the library opens, and lock files that another user holds.
 #include "harness.h"
-#include "scenarios.h"
 
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
 #include <sys/sysmacros.h>
-#include <unistd.h>
 
-#include <algorithm>
 #include <filesystem>
 
 namespace reliability {
 
 namespace {
 
-using namespace VORK::FILEINDEX;
 namespace fs = std::filesystem;
 
 constexpr uid_t kStranger = 65534;
@@ -55,17 +51,8 @@ bool ChangeStatus() {
     return StatusMgr::SetUpdated("marker");
 }
 
-bool ReadStatus() {
-    long long resumeTime = 0;
-    return StatusMgr::GetPauseInfo(resumeTime);
-}
-
 bool QueueEvent() {
     return AddCustomEvent(0x20000, "/vol1/photo/a", Json::Value());
-}
-
-bool SendCommand() {
-    return SendCammandToDaemon("resume", Json::Value(Json::objectValue));
 }
 
 /// One letter for each object, in their order: does the call succeed? The code is that of its failures.
@@ -81,12 +68,12 @@ const Place kPlaces[] = {
     {kFolderConf, "change", ChangeFolders, "ffffff", FILEINDEX_ERR_SAVE_JSON},
     {kFolderConf, "read", ReadFolders, "tttttt", 0},  // whatever is no regular file is no configuration yet
     {kStatusConf, "change", ChangeStatus, "ffffff", FILEINDEX_ERR_SAVE_JSON},
-    {kStatusConf, "read", ReadStatus, "tttttt", 0},
+    {kStatusConf, "read", [] { return Status().Load(); }, "tttttt", 0},
     {kFolderLock, "change", ChangeFolders, "ffftft", FILEINDEX_ERR_LOCK},  // a FIFO can be locked as well
     {kStatusLock, "change", ChangeStatus, "ffftft", FILEINDEX_ERR_LOCK},
     {kQueue, "append", QueueEvent, "ffffff", 0},
     {std::string(kQueue) + ".tmp", "append to its queue", QueueEvent, "tttttt", 0},
-    {kSocket, "send", SendCommand, "ffffff", 0},
+    {kSocket, "send", [] { return SendCammandToDaemon("resume", Json::Value()); }, "ffffff", 0},
 };
 
 /// What the objects are and lead to, before and after.
@@ -98,6 +85,7 @@ std::string Describe(const std::string &path) {
            (fs::exists(kNowhere) ? " a file was made" : "");
 }
 
+/// The seconds that the call took.
 double Try(const Place &place, const Object &object, bool succeeds) {
     const std::string what = std::string(object.name) + " at " + place.path + ", " + place.operation;
     MakeMachine();
@@ -107,9 +95,9 @@ double Try(const Place &place, const Object &object, bool succeeds) {
     const std::string before = Describe(place.path);
     const SameDescriptors sameDescriptors;
     ::alarm(30);  // a call that hangs ends the run
-    const Stopwatch stopwatch;
+    const double begin = Now();
     Check(succeeds ? place.call() : Fails(place.call, place.code), what + ": the result");
-    const double duration = stopwatch.Milliseconds();
+    const double duration = Now() - begin;
     ::alarm(0);
     Check(Describe(place.path) == before, what + ": something was changed");
     Check(place.path != kQueue || StatusMgr::ShareIsNeedReindex("photo"), what + ": the share is not marked");
@@ -136,46 +124,44 @@ pid_t StartStranger() {
     return stranger;
 }
 
-void CallWhileLocked(const std::string &whose, int calls) {
+void CallWhileLocked(const char *whose, int calls) {
     double sum = 0;
     double longest = 0;
     const SameDescriptors sameDescriptors;
     for (int i = 0; i < calls; ++i) {
-        const Stopwatch stopwatch;
+        const double begin = Now();
         Check(Fails(i % 2 == 0 ? ChangeFolders : ChangeStatus, FILEINDEX_ERR_LOCK), "a held lock: code 9");
-        sum += stopwatch.Milliseconds();
-        longest = std::max(longest, stopwatch.Milliseconds());
-        Check(ReadFolders() && ReadStatus(), "a reader failed while the lock was held");
+        sum += Now() - begin;
+        longest = std::max(longest, Now() - begin);
+        Check(ReadFolders() && Status().Load(), "a reader failed while the lock was held");
     }
-    Figure("another user holds " + whose + " lock files",
-           std::to_string(calls) + " calls: code 9, readers fine; " + std::to_string(sum / calls) +
-               " ms on average, " + std::to_string(longest) + " ms at most");
+    Figure(
+        "another user holds %s lock files | %d calls: code 9, readers fine; %.0f ms on average, %.0f ms at most",
+        whose, calls, sum / calls * 1000, longest * 1000);
 }
 
 }  // namespace
 
-void Planted() {
+void Planted(const std::string &) {
     fs::create_directories(kVictimDir);
     double longest = 0;
     int cases = 0;
     for (const Place &place : kPlaces) {
         for (const Object &object : kObjects) {
-            const bool succeeds = place.results[&object - kObjects] == 't';
-            longest = std::max(longest, Try(place, object, succeeds));
+            longest = std::max(longest, Try(place, object, place.results[&object - kObjects] == 't'));
             ++cases;
         }
     }
-    Figure("planted links, FIFOs, directories, devices",
-           std::to_string(cases) + " cases: victims unchanged, " + std::to_string(longest) + " ms at most");
+    Figure("planted links, FIFOs, directories, devices | %d cases: victims unchanged, %.1f ms at most", cases,
+           longest * 1000);
 }
 
-void ForeignLocks() {
-    const int calls = Rounds(100, 1000);
+void ForeignLocks(const std::string &) {
     for (const bool ours : {true, false}) {
         MakeMachine();
         Check(!ours || (ChangeFolders() && ChangeStatus()), "make the lock files");
         const pid_t stranger = StartStranger();
-        CallWhileLocked(ours ? "the library's" : "their own", calls);
+        CallWhileLocked(ours ? "the library's" : "their own", Rounds(100, 1000));
         Kill(stranger);
         // A lock file of a stranger may stay out of reach for good (fs.protected_regular): no demand on those.
         Check(!ours || (ChangeFolders() && ChangeStatus()), "a released lock");

@@ -1,19 +1,14 @@
 // Saving a configuration file while the disk is full, while the writer is killed, while others read.
 #include "harness.h"
-#include "scenarios.h"
 
-#include <sys/statvfs.h>
-#include <unistd.h>
-
-#include <atomic>
+#include <filesystem>
 #include <fstream>
-#include <random>
 
 namespace reliability {
 
 namespace {
 
-using namespace VORK::FILEINDEX;
+namespace fs = std::filesystem;
 
 /// folder.conf with a document whose parts must fit each other: its number and as much filling as it says.
 class Document : public Config {
@@ -26,105 +21,87 @@ public:
     bool SaveNumber(int number, size_t size) {
         document_["number"] = number;
         document_["size"] = static_cast<Json::UInt64>(size);
-        document_["filling"] = std::string(size, FillingOf(number));
+        document_["filling"] = Filling(number, size);
         Lock(true);
         const bool saved = Save();
         Unlock();
         return saved;
     }
 
-    static char FillingOf(int number) { return static_cast<char>('a' + number % 26); }
+    static std::string Filling(int number, size_t size) {
+        return std::string(size, static_cast<char>('a' + number % 26));
+    }
 };
 
 constexpr int kUnreadable = -1;
 constexpr int kMixed = -2;
 
-/// The number of the document that the text holds whole.
-int NumberIn(const std::string &text) {
-    const auto document = Parse(text);
+/// The number of the document that the file holds whole; 0 without a file.
+int NumberInFile() {
+    const auto text = ReadFile(kFolderConf);
+    const auto document = Parse(text.value_or("{}"));
     if (!document || !document->isObject()) {
         return kUnreadable;
     }
     const int number = (*document)["number"].asInt();
-    const bool fits = (*document)["filling"].asString() ==
-                      std::string((*document)["size"].asUInt64(), Document::FillingOf(number));
-    return fits ? number : kMixed;
-}
-
-unsigned long FreeBlocks() {
-    struct statvfs status {};
-    Check(::statvfs(kConfigDir, &status) == 0, "statvfs");
-    return status.f_bfree;
+    return (*document)["filling"] == Document::Filling(number, (*document)["size"].asUInt64()) || !text ? number
+                                                                                                        : kMixed;
 }
 
 /// Fills the file system but for a few blocks.
-void FillDisk(const std::string &path, int blocksLeft) {
-    std::ofstream filler(path);
-    const std::string block(4096, 'x');
-    long size = 0;
-    while (filler.write(block.data(), static_cast<std::streamsize>(block.size())).flush()) {
-        size += static_cast<long>(block.size());
+void FillDisk(const std::string &path, std::uintmax_t blocksLeft) {
+    constexpr std::uintmax_t kBlock = 4096;
+    while (std::ofstream(path, std::ios::app) << std::string(kBlock, 'x') << std::flush) {
     }
-    Check(::truncate(path.c_str(), std::max(0L, size - 4096L * blocksLeft)) == 0, "truncate");
-}
-
-/// Saves ever new documents until it is killed; `saved` is the last one that was acknowledged.
-void SaveForEver(std::atomic<int> &saved, size_t maxSize, unsigned seed) {
-    std::mt19937 random(seed);
-    Document document;
-    for (int number = saved + 1;; ++number) {
-        Check(document.SaveNumber(number, random() % maxSize), "save");
-        saved = number;
-    }
+    const std::uintmax_t blocks = fs::file_size(path) / kBlock;
+    fs::resize_file(path, (blocks - std::min(blocks, blocksLeft)) * kBlock);
 }
 
 /// Kills a writer again and again; every third one begins without a file. Returns the number of broken files.
-int KillWriters(int kills, size_t maxSize, const std::string &subject) {
+int KillWriters(int kills, unsigned maxSize, const std::string &subject) {
     std::mt19937 random(1);
-    auto &saved = Shared<std::atomic<int>>();
+    auto &saved = Shared<std::atomic<int>>();  // the last document that was acknowledged
     int unreadable = 0;
     int mixed = 0;
-    for (int kill = 0; kill < kills; ++kill) {
-        if (kill % 3 == 0) {
+    for (int kill = 0, number = 0; kill < kills; ++kill) {
+        if (kill % 3 == 0 || number < 0) {
             ::unlink(kFolderConf);
             saved = 0;
         }
-        const unsigned seed = random();
-        const pid_t writer = Start([&] { SaveForEver(saved, maxSize, seed); });
+        const pid_t writer = Start([&saved, maxSize, seed = random()] {
+            std::mt19937 sizes(seed);
+            Document document;
+            for (int next = saved + 1;; saved = next++) {
+                Check(document.SaveNumber(next, sizes() % maxSize), "save");
+            }
+        });
         ::usleep(random() % 3000);  // the instant to kill at, not a wait
         Kill(writer);
-        const auto text = ReadFile(kFolderConf);
-        const int number = text ? NumberIn(*text) : 0;
+        number = NumberInFile();
         unreadable += number == kUnreadable ? 1 : 0;
         mixed += number == kMixed ? 1 : 0;
-        if (number < 0) {
-            ::unlink(kFolderConf);
-            saved = 0;
-        }
         Check(number < 0 || number >= saved, "an acknowledged save is lost");
     }
-    Figure("kill -9 while saving " + subject, std::to_string(kills) + " kills: " + std::to_string(unreadable) +
-                                                  " unreadable, " + std::to_string(mixed) + " mixed");
+    Figure("kill -9 while saving %s | %d kills: %d unreadable, %d mixed", subject.c_str(), kills, unreadable,
+           mixed);
     return unreadable + mixed;
 }
 
-/// Both states of a list in which all names are alike.
-void FillList(Folders &folders, int count, const std::string &name) {
+/// Saves two states of the list by turns; in each all names are alike.
+void FlipForEver(int count, const std::array<std::string, 2> &names) {
+    std::array<Folders, 2> states;
     Json::Value report;
-    for (int i = 0; i < count; ++i) {
-        Check(folders.Upsert(report, FolderRequest("/photo/" + std::to_string(i), name)), "upsert");
+    for (int i = 0; i < 2 * count; ++i) {
+        const Json::Value request = FolderRequest("/photo/" + std::to_string(i / 2), names[i % 2]);
+        Check(states[i % 2].Upsert(report, request), "upsert");
     }
-}
-
-void FlipForEver(Folders &one, Folders &other) {
-    for (;;) {
-        for (Folders *folders : {&one, &other}) {
-            while (!folders->Lock(true)) {
-                folders->Unlock();
-            }
-            Check(folders->Save(), "save");
-            folders->Unlock();
+    for (int turn = 0;; ++turn) {
+        Folders &folders = states[turn % 2];
+        while (!folders.Lock(true)) {
+            folders.Unlock();
         }
+        Check(folders.Save(), "save");
+        folders.Unlock();
     }
 }
 
@@ -141,17 +118,20 @@ void ReadStates(int reads, int count) {
 
 void ReadWhileFlipping(int count, int reads) {
     constexpr int kReaders = 4;
-    const Stopwatch stopwatch;
-    Folders one;
-    Folders other;
-    FillList(one, count, "short");
-    FillList(other, count, "a longer name");
-    Check(one.Save(), "save");
-    const pid_t writers[] = {Start([&] { FlipForEver(one, other); }), Start([&] { FlipForEver(other, one); })};
+    const double begin = Now();
+    ::unlink(kFolderConf);
+    const pid_t writers[] = {Start([=] {
+                                 FlipForEver(count, {"short", "a longer name"});
+                             }),
+                             Start([=] {
+                                 FlipForEver(count, {"a longer name", "short"});
+                             })};
+    while (!ReadFile(kFolderConf)) {
+        ::usleep(1000);
+    }
     std::vector<pid_t> readers;
-    readers.reserve(kReaders);
     for (int i = 0; i < kReaders; ++i) {
-        readers.push_back(Start([&] { ReadStates(reads / kReaders, count); }));
+        readers.push_back(Start([=] { ReadStates(reads / kReaders, count); }));
     }
     for (const pid_t reader : readers) {
         Check(Wait(reader) == 0, "a reader failed");
@@ -159,16 +139,15 @@ void ReadWhileFlipping(int count, int reads) {
     for (const pid_t writer : writers) {
         Kill(writer);
     }
-    Figure("4 unlocked readers, 2 writers, " + std::to_string(count) + " folders",
-           std::to_string(reads) + " reads: 0 failures, 0 mixtures (" +
-               std::to_string(static_cast<int>(stopwatch.Milliseconds() / 1000)) + " s)");
+    Figure("4 unlocked readers, 2 writers, %d folders | %d reads: 0 failures, 0 mixtures (%.0f s)", count, reads,
+           Now() - begin);
 }
 
 }  // namespace
 
 void FullDisk(const std::string &fileSystem) {
     const std::string filler = std::string(kConfigDir) + "/filler";
-    constexpr unsigned long kBlocksOfMetadata = 4;  // a file system may keep the map of what was reserved
+    constexpr std::uintmax_t kMetadata = 4 * 4096;  // a file system may keep the map of what was reserved
     const int rounds = Rounds(10, 100);
     std::mt19937 random(1);
     int failures = 0;
@@ -176,25 +155,25 @@ void FullDisk(const std::string &fileSystem) {
         Document document;
         ::unlink(kFolderConf);
         Check(round % 2 == 1 || document.SaveNumber(0, random() % 30000), "save on a disk with room");
-        FillDisk(filler, static_cast<int>(random() % 8));
+        FillDisk(filler, random() % 8);
         for (size_t size = 0; size < 200000; size += 1 + random() % 8192) {
             const auto old = ReadFile(kFolderConf);
-            const unsigned long room = FreeBlocks();
+            const std::uintmax_t room = fs::space(kConfigDir).free;
             const SameDescriptors sameDescriptors;
             if (!Fails([&] { return document.SaveNumber(round, size); }, FILEINDEX_ERR_SAVE_JSON)) {
-                Check(NumberIn(ReadFile(kFolderConf).value_or("")) == round, "neither failed nor saved");
+                Check(NumberInFile() == round, "neither failed nor saved");
                 continue;
             }
             ++failures;
             Check(ReadFile(kFolderConf) == old, "a failed save changed the file");
-            Check(FreeBlocks() + kBlocksOfMetadata >= room, "a failed save keeps space");
+            Check(fs::space(kConfigDir).free + kMetadata >= room, "a failed save keeps space");
         }
         ::unlink(filler.c_str());
         Check(document.SaveNumber(round, 100000), "save after space returned");
     }
     Check(failures > rounds, "the disk was hardly ever full");
-    Figure("full disk, " + fileSystem, std::to_string(failures) + " failed saves: old bytes each time, then " +
-                                           std::to_string(rounds) + " good ones");
+    Figure("full disk, %s | %d failed saves: old bytes each time, then %d good ones", fileSystem.c_str(), failures,
+           rounds);
 }
 
 void Kills(const std::string &fileSystem) {
@@ -204,7 +183,7 @@ void Kills(const std::string &fileSystem) {
     KillWriters(Rounds(100, 2000), 153600, "up to 150 KiB, " + fileSystem);
 }
 
-void Readers() {
+void Readers(const std::string &) {
     MakeMachine();
     ReadWhileFlipping(100, Rounds(4000, 80000));
     ReadWhileFlipping(1000, Rounds(200, 5000));

@@ -1,28 +1,15 @@
 // The command socket: a daemon in every mood, and the writer's loop against a model of it.
 #include "harness.h"
-#include "scenarios.h"
 
 #include <poll.h>
 #include <sys/socket.h>
-#include <sys/un.h>
-#include <unistd.h>
 
-#include <array>
-#include <atomic>
 #include <cerrno>
-#include <climits>
-#include <csignal>
 #include <cstdint>
-#include <cstring>
-#include <random>
 
 namespace reliability {
 
 namespace {
-
-using namespace VORK::FILEINDEX;
-
-constexpr char kReceived[] = "/tmp/received";
 
 std::string FrameOf(size_t bodySize) {
     const std::string text = R"({"data":")" + std::string(bodySize, 'b') + R"(","type":"command"})";
@@ -38,7 +25,7 @@ bool Send(size_t bodySize) {
 // --- moods -----------------------------------------------------------------------------------------------------
 
 /// Reads up to `size` bytes, or until the other end is closed.
-std::string Receive(int fd, size_t size) {
+std::string Receive(int fd, size_t size = SIZE_MAX) {
     std::string all;
     std::array<char, 4096> buffer{};
     ssize_t got = 0;
@@ -48,23 +35,11 @@ std::string Receive(int fd, size_t size) {
     return all;
 }
 
-std::string HangUp(int) {
-    return "";
-}
-
-std::string Collect(int fd) {
-    return Receive(fd, SIZE_MAX);
-}
-
-std::string HangUpMidFrame(int fd) {
-    return Receive(fd, 2000);
-}
-
 /// Looks at nothing while the caller is there; what it sent is read when it has gone.
 std::string NeverRead(int fd) {
     pollfd hungUp = {fd, POLLRDHUP, 0};
     Check(::poll(&hungUp, 1, -1) == 1, "poll");
-    return Collect(fd);
+    return Receive(fd);
 }
 
 /// Writes of the caller that ended with -1, the send timeout among them.
@@ -79,60 +54,53 @@ std::string FallAsleep(int fd) {
     while (FailedWrites() == 0) {
         ::usleep(1000);
     }
-    return first + Collect(fd);
+    return first + Receive(fd);
 }
 
-enum class Bytes { kNone, kWhole, kBeginning, kOneOrMoreTwice, kAny };
+/// What the daemon received, beside the frame.
+using Comparison = bool (*)(const std::string &received, const std::string &frame);
 
-bool AreRight(Bytes expected, const std::string &received, const std::string &frame) {
-    switch (expected) {
-        case Bytes::kNone:
-            return received.empty();
-        case Bytes::kWhole:
-            return received == frame;
-        case Bytes::kBeginning:
-            return received.size() < frame.size() && frame.starts_with(received);
-        case Bytes::kOneOrMoreTwice:  // each timeout sends the byte before it again; in the body all are alike
-            return received.size() > frame.size() && received.starts_with(frame.substr(0, 2000)) &&
-                   received.ends_with(frame.substr(frame.size() - 2000)) &&
-                   received.find_first_not_of('b', 20) >= received.size() - 20;
-        default:
-            return true;
-    }
-}
-
-struct Mood {
-    const char *name;
-    std::string (*serve)(int fd);
-    size_t bodySize;
-    bool sent;
-    Bytes bytes;
+constexpr Comparison kWhole = [](auto &received, auto &frame) { return received == frame; };
+constexpr Comparison kBeginning = [](auto &received, auto &frame) {
+    return received.size() < frame.size() && frame.starts_with(received);
+};
+/// Each timeout sends the byte before it again; in the body all are alike.
+constexpr Comparison kSomeTwice = [](auto &received, auto &frame) {
+    return received.size() > frame.size() && received.starts_with(frame.substr(0, 2000)) &&
+           received.ends_with(frame.substr(frame.size() - 2000)) &&
+           received.find_first_not_of('b', 20) >= received.size() - 20;
 };
 
 constexpr size_t kShort = 10;
 constexpr size_t kLong = 4194304;  // 4 MiB
 
-constexpr Mood kMoods[] = {
-    {"reads, short frame", Collect, kShort, true, Bytes::kWhole},
-    {"reads, 4 MiB frame", Collect, kLong, true, Bytes::kWhole},
-    {"hangs up at once", HangUp, kLong, false, Bytes::kAny},
-    {"hangs up mid-frame", HangUpMidFrame, kLong, false, Bytes::kBeginning},
-    {"never reads, short frame", NeverRead, kShort, true, Bytes::kWhole},
-    {"never reads, 4 MiB frame", NeverRead, kLong, false, Bytes::kBeginning},
-    {"sleeps mid-frame", FallAsleep, kLong, true, Bytes::kOneOrMoreTwice},
+constexpr struct Mood {
+    const char *name;
+    std::string (*serve)(int fd);
+    size_t bodySize;
+    bool sent;
+    Comparison isRight;
+} kMoods[] = {
+    {"reads, short frame", [](int fd) { return Receive(fd); }, kShort, true, kWhole},
+    {"reads, 4 MiB frame", [](int fd) { return Receive(fd); }, kLong, true, kWhole},
+    {"hangs up at once", [](int) { return std::string(); }, kLong, false, kBeginning},
+    {"hangs up mid-frame", [](int fd) { return Receive(fd, 2000); }, kLong, false, kBeginning},
+    {"never reads, short frame", NeverRead, kShort, true, kWhole},
+    {"never reads, 4 MiB frame", NeverRead, kLong, false, kBeginning},
+    {"sleeps mid-frame", FallAsleep, kLong, true, kSomeTwice},
 };
 
 void SendMust(bool sent, size_t bodySize, const std::string &mood) {
     const SameDescriptors sameDescriptors;
-    const Stopwatch stopwatch;
+    const double begin = Now();
     ::alarm(60);  // a call that hangs ends the run
     Check(Send(bodySize) == sent, mood + ": the result");
     ::alarm(0);
-    Figure("daemon " + mood, std::string(sent ? "true" : "false") + " after " +
-                                 std::to_string(static_cast<int>(stopwatch.Milliseconds())) + " ms");
+    Figure("daemon %s | %s after %.0f ms", mood.c_str(), sent ? "true" : "false", (Now() - begin) * 1000);
 }
 
 void TryMood(const Mood &mood) {
+    constexpr char kReceived[] = "/tmp/received";
     FailedWrites() = 0;
     const int listener = Listen(8);
     const pid_t peer = Start([&] {
@@ -149,80 +117,66 @@ void TryMood(const Mood &mood) {
     SendMust(mood.sent, mood.bodySize, mood.name);
     WriteHook() = nullptr;
     Check(Wait(peer) == 0, "the peer failed");
-    Check(AreRight(mood.bytes, ReadFile(kReceived).value_or("?"), FrameOf(mood.bodySize)),
+    Check(mood.isRight(ReadFile(kReceived).value_or("?"), FrameOf(mood.bodySize)),
           std::string(mood.name) + ": the bytes");
 }
 
 /// Nobody accepts, and more callers wait than the backlog holds.
 void TryFullBacklog() {
     std::vector<int> open = {Listen(0)};
-    sockaddr_un address{};
-    address.sun_family = AF_UNIX;
-    std::memcpy(address.sun_path, kSocket, sizeof kSocket);
+    const sockaddr_un address = SocketAddress();
     do {
         open.push_back(::socket(AF_UNIX, SOCK_STREAM | SOCK_NONBLOCK, 0));
     } while (::connect(open.back(), reinterpret_cast<const sockaddr *>(&address), sizeof address) == 0);
     SendMust(false, kShort, "with a full backlog");
-    for (const int fd : open) {
-        ::close(fd);
-    }
+    std::for_each(open.begin(), open.end(), ::close);
 }
 
 // --- model -----------------------------------------------------------------------------------------------------
 
-struct Answer {
-    ssize_t result;
-    int error;
-};
-
-/// What `write` answers, call for call, decided by a seed.
-class Dice {
+/// A peer that answers `write` as a seed decides, and keeps what it took.
+class Peer {
 public:
-    explicit Dice(unsigned seed) : random_(seed), mood_(random_() % 100) {}
+    explicit Peer(unsigned seed) : random_(seed), mood_(random_() % 100) {}
 
-    Answer Roll(size_t asked) {
-        constexpr int kErrors[] = {EAGAIN, EPIPE, EINTR};
-        const unsigned roll = random_() % 100;
-        const int error = kErrors[random_() % 3];
-        if (mood_ == 0 || roll < (mood_ < 50 ? 2U : mood_)) {
-            return {-1, error};
+    ssize_t Write(const char *data, size_t size) {
+        ++calls;
+        const ssize_t result = Roll(size);
+        if (result > 0) {
+            bytes.append(data, static_cast<size_t>(result));
         }
-        if (roll % 10 == 9) {
-            return {0, random_() % 4 == 0 ? error : EINTR};
-        }
-        const bool isWhole = roll % 2 == 0;
-        return {static_cast<ssize_t>(isWhole ? asked : 1 + random_() % asked), error};
+        return result;
     }
 
-private:
-    std::mt19937 random_;
-    const unsigned mood_;  ///< 0 is a dead peer
-};
-
-struct Transcript {
     std::string bytes;
     long calls = 0;
     bool sent = false;
 
-    bool operator==(const Transcript &) const = default;
-
-    ssize_t Play(Dice &dice, const char *data, size_t size) {
-        const Answer answer = dice.Roll(size);
-        ++calls;
-        if (answer.result > 0) {
-            bytes.append(data, static_cast<size_t>(answer.result));
+private:
+    ssize_t Roll(size_t asked) {
+        constexpr int kErrors[] = {EAGAIN, EPIPE, EINTR};
+        const unsigned roll = random_() % 100;
+        errno = kErrors[random_() % 3];
+        if (mood_ == 0 || roll < (mood_ < 50 ? 2U : mood_)) {
+            return -1;
         }
-        errno = answer.error;
-        return answer.result;
+        if (roll % 10 == 9) {
+            errno = random_() % 4 == 0 ? errno : EINTR;
+            return 0;
+        }
+        return static_cast<ssize_t>(roll % 2 == 0 ? asked : 1 + random_() % asked);
     }
+
+    std::mt19937 random_;
+    const unsigned mood_;  ///< 0 is a dead peer
 };
 
 /// Sends the bytes of `tape` from `head` on; -1 is a step back, and the tape's beginning ends the attempt.
-bool ModelWriteAll(const std::string &tape, size_t head, size_t size, Dice &dice, Transcript &transcript) {
+bool ModelWriteAll(const std::string &tape, size_t head, size_t size, Peer &peer) {
     size_t remaining = size;
     int interruptions = 0;
     while (remaining > 0) {
-        const ssize_t result = transcript.Play(dice, tape.data() + head, std::min<size_t>(remaining, 1024));
+        const ssize_t result = peer.Write(tape.data() + head, std::min<size_t>(remaining, 1024));
         if (result == 0 && (errno != EINTR || ++interruptions > 3)) {
             return false;
         }
@@ -235,31 +189,28 @@ bool ModelWriteAll(const std::string &tape, size_t head, size_t size, Dice &dice
     return true;
 }
 
-Transcript Model(unsigned seed, size_t bodySize) {
+Peer Model(unsigned seed, size_t bodySize) {
     constexpr size_t kZeros = 65536;
     const std::string frame = FrameOf(bodySize);
     const std::string tape = std::string(kZeros, '\0') + frame;
-    Dice dice(seed);
-    Transcript transcript;
-    transcript.sent = ModelWriteAll(tape, kZeros, 4, dice, transcript) &&
-                      ModelWriteAll(tape, kZeros + 4, frame.size() - 4, dice, transcript);
-    return transcript;
+    Peer peer(seed);
+    peer.sent = ModelWriteAll(tape, kZeros, 4, peer) && ModelWriteAll(tape, kZeros + 4, frame.size() - 4, peer);
+    return peer;
 }
 
-Transcript Library(unsigned seed, size_t bodySize) {
-    Dice dice(seed);
-    Transcript transcript;
+Peer Library(unsigned seed, size_t bodySize) {
+    Peer peer(seed);
     WriteHook() = [&](int, const void *data, size_t size) {
-        return transcript.Play(dice, static_cast<const char *>(data), size);
+        return peer.Write(static_cast<const char *>(data), size);
     };
-    transcript.sent = Send(bodySize);
+    peer.sent = Send(bodySize);
     WriteHook() = nullptr;
-    return transcript;
+    return peer;
 }
 
 }  // namespace
 
-void Moods() {
+void Moods(const std::string &) {
     ::unlink(kSocket);
     SendMust(false, kShort, "absent");
     ::close(Listen(-1));
@@ -270,7 +221,7 @@ void Moods() {
     TryFullBacklog();
 }
 
-void WriterModel() {
+void WriterModel(const std::string &) {
     const pid_t daemon = StartDaemon();
     const int sequences = Rounds(10000, 100000);
     std::mt19937 random(1);
@@ -279,16 +230,17 @@ void WriterModel() {
     for (int i = 0; i < sequences; ++i) {
         const unsigned seed = random();
         const size_t bodySize = random() % 5000;
-        const Transcript expected = Model(seed, bodySize);
-        Check(Library(seed, bodySize) == expected, "the loop and its model differ, seed " + std::to_string(seed));
+        const Peer expected = Model(seed, bodySize);
+        const Peer met = Library(seed, bodySize);
+        Check(met.bytes == expected.bytes && met.calls == expected.calls && met.sent == expected.sent,
+              "the loop and its model differ, seed " + std::to_string(seed));
         sent += expected.sent ? 1 : 0;
         calls += expected.calls;
     }
     Kill(daemon);
     Check(sent > sequences / 10 && sent < sequences, "the sequences are all of one kind");
-    Figure("socket writer against its model", std::to_string(sequences) + " sequences, " + std::to_string(calls) +
-                                                  " writes: same bytes, same result (" + std::to_string(sent) +
-                                                  " sent)");
+    Figure("socket writer against its model | %d sequences, %ld writes: same bytes, same result (%d sent)",
+           sequences, calls, sent);
 }
 
 }  // namespace reliability

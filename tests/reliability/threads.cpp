@@ -1,18 +1,11 @@
 // Eight threads of one process call everything at once; the thread sanitizer looks on.
 #include "harness.h"
-#include "scenarios.h"
 
-#include <array>
-#include <atomic>
-#include <optional>
-#include <random>
 #include <thread>
 
 namespace reliability {
 
 namespace {
-
-using namespace VORK::FILEINDEX;
 
 constexpr int kThreads = 8;
 
@@ -29,72 +22,58 @@ struct Own {
     }
 };
 
-void CallOne(unsigned which, Own &own) {
+void CheckList() {
     std::vector<Folder> folders;
-    std::string text;
-    long long time = 0;
-    Json::Value json;
-    const std::string fullPath = "/vol1" + own.path;
-    switch (which) {
-        case 0:
-            return own.Change(IndexMgr::Upsert(Array({FolderRequest(own.path, "x")})), true);
-        case 1:
-            return own.Change(IndexMgr::Delete(Array({own.path})), false);
-        case 2:
-            return Check(!IndexMgr::List(folders) || folders.size() <= kThreads + 1, "a list of strangers");
-        case 3:
-            return static_cast<void>(IndexMgr::List(json, 0, 10, "name", "DESC", Array({"status", "is_valid"})));
-        case 4:
-            return static_cast<void>(IndexMgr::IsPathIndexed(own.path) && IndexMgr::IsFullPathIndexed(fullPath));
-        case 5:
-            return static_cast<void>(StatusMgr::GetStatus(text));
-        case 6:
-            return static_cast<void>(StatusMgr::GetFolderStatus("/photo/always"));
-        case 7:
-            return static_cast<void>(StatusMgr::Pause(1));
-        case 8:
-            return static_cast<void>(StatusMgr::Resume());
-        case 9:
-            return static_cast<void>(IndexMgr::Reindex(Array({"/photo/always", own.path})));
-        case 10:
-            return static_cast<void>(StatusMgr::ShareSetNoSpace("photo", own.changes % 2 == 0));
-        case 11:
-            return static_cast<void>(StatusMgr::GetPauseInfo(time));
-        case 12:
-            return static_cast<void>(IndexMgr::ShareResume("photo"));
-        case 13:
-            return static_cast<void>(IndexMgr::Get(json, own.path));
-        case 14:
-            return static_cast<void>(AddCustomEvent(2, fullPath, Json::Value()));
-        case 15:
-            return static_cast<void>(CanPathBeIndexed(own.path) && IsShareSpaceEnough("photo"));
-        case 16:
-            return static_cast<void>(StatusMgr::SetUpdated(own.path) && StatusMgr::IsUpdated(own.path));
-        default:
-            return Check(ErrorHandler::GetError() >= FILEINDEX_ERR_NONE, "the code");
-    }
+    Check(!IndexMgr::List(folders) || folders.size() <= kThreads + 1, "a list of strangers");
 }
 
-void Call(Own &own, unsigned seed, int rounds) {
-    constexpr unsigned kCalls = 18;
-    std::mt19937 random(seed);
-    for (int round = 0; round < rounds; ++round) {
-        CallOne(random() % kCalls, own);
-    }
+std::vector<std::function<void()>> CallsOf(Own &own) {
+    const std::string path = own.path;
+    const std::string fullPath = "/vol1" + path;
+    struct {
+        std::string text;
+        long long time = 0;
+        Json::Value json;
+    } out;
+    return {
+        [&own] { own.Change(IndexMgr::Upsert(Array(FolderRequest(own.path, "x"))), true); },
+        [&own] { own.Change(IndexMgr::Delete(Array(own.path)), false); },
+        [&own] { StatusMgr::ShareSetNoSpace("photo", own.changes % 2 == 0); },
+        CheckList,
+        [=]() mutable { IndexMgr::List(out.json, 0, 10, "name", "DESC", Array("status", "is_valid")); },
+        [=]() mutable { IndexMgr::Get(out.json, path); },
+        [=]() mutable { StatusMgr::GetStatus(out.text); },
+        [=]() mutable { StatusMgr::GetPauseInfo(out.time); },
+        [=] { return IndexMgr::IsPathIndexed(path) && IndexMgr::IsFullPathIndexed(fullPath); },
+        [=] { return CanPathBeIndexed(path) && IsShareSpaceEnough("photo"); },
+        [=] { return StatusMgr::SetUpdated(path) && StatusMgr::IsUpdated(path); },
+        [=] { IndexMgr::Reindex(Array("/photo/always", path)); },
+        [=] { AddCustomEvent(2, fullPath, Json::Value()); },
+        [] { StatusMgr::GetFolderStatus("/photo/always"); },
+        [] { IndexMgr::ShareResume("photo"); },
+        [] { StatusMgr::Pause(1); },
+        [] { StatusMgr::Resume(); },
+        [] { Check(ErrorHandler::GetError() >= FILEINDEX_ERR_NONE, "the code"); },
+    };
 }
 
 }  // namespace
 
-void Threads() {
+void Threads(const std::string &) {
     MakeMachine();
     const pid_t daemon = StartDaemon();
-    Check(IndexMgr::Upsert(Array({FolderRequest("/photo/always", "x")})), "the first folder");
+    Check(IndexMgr::Upsert(Array(FolderRequest("/photo/always", "x"))), "the first folder");
     const int rounds = Rounds(200, 2000);
     std::array<Own, kThreads> owns;
     std::vector<std::thread> threads;
     for (int i = 0; i < kThreads; ++i) {
         owns[i].path = "/photo/thread " + std::to_string(i);
-        threads.emplace_back([&own = owns[i], i, rounds] { Call(own, i, rounds); });
+        threads.emplace_back([calls = CallsOf(owns[i]), i, rounds] {
+            std::mt19937 random(i);
+            for (int round = 0; round < rounds; ++round) {
+                calls[random() % calls.size()]();
+            }
+        });
     }
     for (std::thread &thread : threads) {
         thread.join();
@@ -110,9 +89,8 @@ void Threads() {
         changes += own.changes;
     }
     Check(changes > kThreads, "hardly anything was changed");
-    Figure(std::to_string(kThreads) + " threads of mixed calls", std::to_string(rounds * kThreads) + " calls, " +
-                                                                     std::to_string(changes) +
-                                                                     " changes of folders done, none lost");
+    Figure("%d threads of mixed calls | %d calls, %d changes of folders done, none lost", kThreads,
+           rounds * kThreads, changes);
 }
 
 }  // namespace reliability
