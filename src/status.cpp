@@ -27,7 +27,9 @@ void SetShareFlag(Json::Value &root, const char *flagKey, const std::string &sha
                   BeforeFirst beforeFirst) {
     Json::Value &flags = root[flagKey];
     if (!set) {
-        flags.removeMember(share);
+        if (flags.isMember(share)) {
+            flags.removeMember(share, nullptr);  // the form without a result takes a name up to its first NUL only
+        }
         return;
     }
     if (!flags.isObject() || !flags.isMember(share)) {
