@@ -84,14 +84,19 @@ bool StatusMgr::Pause(const int &hours) {
         ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);
         return false;
     }
-    const long long resumeTime = ResumeTimeIn(hours);
-    const Announcement pause = {kPauseCommand, Object(kResumeTimeKey, static_cast<Json::Int64>(resumeTime)), 198};
-    return Change([&](Status &status) { return status.Pause(resumeTime); }, &pause);
+    return NoThrow([&] {
+        const long long resumeTime = ResumeTimeIn(hours);
+        const Announcement pause = {kPauseCommand, Object(kResumeTimeKey, static_cast<Json::Int64>(resumeTime)),
+                                    198};
+        return Change([&](Status &status) { return status.Pause(resumeTime); }, &pause);
+    });
 }
 
 bool StatusMgr::Resume() {
-    const Announcement resume = {kResumeCommand, Json::Value(Json::objectValue), 221};
-    return Change([](Status &status) { return status.Resume(); }, &resume);
+    return NoThrow([] {
+        const Announcement resume = {kResumeCommand, Json::Value(Json::objectValue), 221};
+        return Change([](Status &status) { return status.Resume(); }, &resume);
+    });
 }
 
 bool StatusMgr::GetPauseInfo(long long &resumeTime) {
@@ -107,8 +112,10 @@ bool StatusMgr::ShareIsNoSpace(const std::string &share) {
 }
 
 bool StatusMgr::ShareRevive(const std::string &share) {
-    const Announcement revive = {kReviveShareCommand, Object(kShareNameKey, share), 321};
-    return Change([&](Status &status) { return status.ShareSetNoSpace(share, false); }, &revive);
+    return NoThrow([&] {
+        const Announcement revive = {kReviveShareCommand, Object(kShareNameKey, share), 321};
+        return Change([&](Status &status) { return status.ShareSetNoSpace(share, false); }, &revive);
+    });
 }
 
 bool StatusMgr::ShareSetNeedReindex(const std::string &share, bool needReindex) {

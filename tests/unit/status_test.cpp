@@ -1,7 +1,27 @@
 // status.conf in memory, and beside others.
 #include "fixture.h"
 
+#include <cstdlib>
+#include <new>
 #include <string>
+#include <utility>
+
+namespace {
+bool nextAllocationFails = false;
+}
+
+void *operator new(size_t size) {
+    void *const memory = std::exchange(nextAllocationFails, false) ? nullptr : malloc(size);
+    return memory != nullptr ? memory : throw std::bad_alloc();
+}
+
+void operator delete(void *memory) noexcept {
+    free(memory);
+}
+
+void operator delete(void *memory, size_t /*unused*/) noexcept {
+    free(memory);
+}
 
 namespace fileindex_test {
 namespace {
@@ -43,6 +63,16 @@ TEST_F(StatusStore, ReadsWhileAnotherHoldsTheLock) {
     EXPECT_TRUE(StatusMgr::ShareIsNoSpace("a") && StatusMgr::ShareIsNeedReindex("a") && StatusMgr::IsUpdated("x"));
     EXPECT_FALSE(StatusMgr::Resume());
     EXPECT_EQ(kBusy, Left());
+}
+
+TEST_F(StatusStore, OfAManagerThatIsOutOfMemoryStaysAsItIs) {
+    for (bool (*change)() : {+[] { return StatusMgr::Pause(2); }, +[] { return StatusMgr::Resume(); },
+                             +[] { return StatusMgr::ShareRevive("a"); }}) {
+        nextAllocationFails = true;
+        EXPECT_FALSE(change());
+        EXPECT_FALSE(nextAllocationFails);
+    }
+    EXPECT_EQ("(missing)", ReadFile(kStatusConf));
 }
 
 }  // namespace
