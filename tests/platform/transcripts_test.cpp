@@ -60,7 +60,7 @@ std::string PathOfShare(const std::string &name) {
     if (VORKShareGet(name.c_str(), &share) < 0) {
         return share == nullptr ? "failed" : "failed with a share";
     }
-    const std::string path = share->szName == name ? share->szPath : "another share";
+    std::string path = share->szName == name ? share->szPath : "another share";
     VORKShareFree(share);
     return path;
 }

@@ -114,9 +114,9 @@ void QueueWriters(const std::string &) {
     MakeMachine();
     const int count = Rounds(4000, kMaxEvents);
     auto &board = Shared<Board>();
-    std::vector<pid_t> writers;
+    std::array<pid_t, kWriters> writers{};
     for (int writer = 0; writer < kWriters; ++writer) {
-        writers.push_back(Start([&board, writer, count] { WriteEvents(board, writer, count); }));
+        writers[writer] = Start([&board, writer, count] { WriteEvents(board, writer, count); });
     }
     Consumed consumed;
     int renames = 0;

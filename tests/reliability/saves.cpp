@@ -129,9 +129,9 @@ void ReadWhileFlipping(int count, int reads) {
     while (!ReadFile(kFolderConf)) {
         ::usleep(1000);
     }
-    std::vector<pid_t> readers;
-    for (int i = 0; i < kReaders; ++i) {
-        readers.push_back(Start([=] { ReadStates(reads / kReaders, count); }));
+    std::array<pid_t, kReaders> readers{};
+    for (pid_t &reader : readers) {
+        reader = Start([=] { ReadStates(reads / kReaders, count); });
     }
     for (const pid_t reader : readers) {
         Check(Wait(reader) == 0, "a reader failed");
