@@ -187,9 +187,9 @@ std::string FileIndexTest::Left() {
     const std::set<std::string> unnumbered = {"config.cpp", "folder.cpp", "folders.cpp"};
     std::string records;
     for (const LogRecord &record : SyslogCapture::Records()) {
-        EXPECT_EQ(LOG_ERR, record.priority) << record.format;
-        EXPECT_TRUE(numbered.contains(record.file) || unnumbered.contains(record.file)) << record.format;
-        EXPECT_GT(record.line, 0) << record.format;
+        EXPECT_EQ(LOG_ERR, record.priority) << record.message;
+        EXPECT_TRUE(numbered.contains(record.file) || unnumbered.contains(record.file)) << record.message;
+        EXPECT_GT(record.line, 0) << record.message;
         records += records.empty() ? " " : " | ";
         records += record.file + (numbered.contains(record.file) ? ":" + std::to_string(record.line) : "") + " " +
                    record.message;

@@ -3,7 +3,6 @@
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/syscall.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cstdio>
@@ -12,23 +11,6 @@
 #include <system_error>
 
 namespace fileindex_test {
-namespace {
-
-void Require(bool fine, const char *what) {
-    if (!fine) {
-        std::perror(what);
-        std::abort();
-    }
-}
-
-int WaitFor(pid_t child) {
-    int status = 0;
-    Require(::waitpid(child, &status, 0) == child, "waitpid");
-    return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
-}
-
-}  // namespace
-
 std::set<std::string> OpenDescriptors() {
     std::set<std::string> open;
     for (const auto &entry : std::filesystem::directory_iterator("/proc/self/fd")) {
@@ -41,19 +23,13 @@ std::set<std::string> OpenDescriptors() {
     return open;
 }
 
-int RunInChild(const std::function<int()> &body) {
-    const pid_t child = ::fork();
-    Require(child >= 0, "fork");
-    if (child == 0) {
-        ::_exit(body());
-    }
-    return WaitFor(child);
-}
-
 // By system calls: the replaced functions are not ours to use.
 LockAgent::LockAgent(const std::string &path)
     : fd_(::syscall(SYS_openat, AT_FDCWD, path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0644)) {
-    Require(::syscall(SYS_flock, fd_, LOCK_EX | LOCK_NB) == 0, "lock agent");
+    if (::syscall(SYS_flock, fd_, LOCK_EX | LOCK_NB) != 0) {
+        std::perror("lock agent");
+        std::abort();
+    }
 }
 
 LockAgent::~LockAgent() {

@@ -4,6 +4,7 @@
 
 #include <syslog.h>
 
+#include <array>
 #include <cerrno>
 #include <cstdarg>
 #include <cstdio>
@@ -25,24 +26,16 @@ Log &TheLog() {
 
 void Keep(int priority, const char *format, va_list arguments) {
     const int error = errno;  // what %m stands for
-    constexpr std::string_view kPrefix = "%s:%d ";
-    LogRecord record;
-    record.priority = priority;
-    record.format = format;
-    if (std::string_view(format).starts_with(kPrefix)) {
-        va_list prefix;
-        va_copy(prefix, arguments);
-        record.file = va_arg(prefix, const char *);  // NOLINT(clang-analyzer-valist.Uninitialized): it is a copy
-        record.line = va_arg(prefix, int);
-        va_end(prefix);
-    }
-    std::string text(16384, '\0');
-    errno = error;
+    std::array<char, 16384> text{};
     // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): the callers have started it
-    const int length = std::vsnprintf(text.data(), text.size(), format, arguments);
-    text.resize(std::min(static_cast<size_t>(length), text.size() - 1));
-    record.message = record.file.empty() ? text : text.substr(text.find(' ') + 1);
-
+    std::vsnprintf(text.data(), text.size(), format, arguments);
+    LogRecord record{.priority = priority, .message = text.data()};
+    if (std::string_view(format).starts_with("%s:%d ")) {
+        const size_t colon = record.message.find(':');
+        record.file = record.message.substr(0, colon);
+        record.line = std::stoi(record.message.substr(colon + 1));
+        record.message.erase(0, record.message.find(' ', colon) + 1);
+    }
     const std::lock_guard guard(TheLog().mutex);
     TheLog().records.push_back(record);
     errno = error;

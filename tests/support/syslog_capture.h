@@ -9,10 +9,9 @@ namespace fileindex_test {
 
 struct LogRecord {
     int priority = 0;
-    std::string format;   ///< whole, as given to syslog
-    std::string file;     ///< the first argument, when the format begins with "%s:%d "
-    int line = 0;         ///< the second
-    std::string message;  ///< formatted, without the prefix
+    std::string file = {};  ///< of the beginning "FILE:LINE "
+    int line = 0;
+    std::string message;  ///< what follows
 };
 
 class SyslogCapture {

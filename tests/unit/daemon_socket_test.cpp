@@ -1,4 +1,4 @@
-// Commands to the daemon's socket, and the notification of the administrators.
+// Commands to the daemon's socket.
 #include "fixture.h"
 
 #include <sys/socket.h>
@@ -120,27 +120,6 @@ TEST_F(DaemonSocket, IgnoresTheSignalOfADaemonThatHangsUp) {
     daemon_.Start(/*hangsUp=*/true);
     EXPECT_FALSE(SendCammandToDaemon("large", std::string(4000000, 'x')));
     EXPECT_EQ(SIG_IGN, std::signal(SIGPIPE, SIG_IGN));
-}
-
-class NoSpaceNotification : public FileIndexTest {};
-
-TEST_F(NoSpaceNotification, RunsTheToolWithItsTenArguments) {
-    EXPECT_TRUE(NotifyNoSpace());
-    EXPECT_THAT(
-        Journal(),
-        ElementsAre("execv /usr/vork/bin/vorkzolnotify 1 0: [/usr/vork/bin/vorkzolnotify] [-e] [false] [-c] "
-                    "[VORK.KDX.AdminCenter.Application] [@administrators] [fileindex:fileindex_title] "
-                    "[fileindex:notify_no_space] [<a data-vork-app=\"VORK.KDX.AdminCenter.Application\" "
-                    "data-vork-fn=\"VORK.KDX.AdminCenter.MediaIndex.Main\" data-vork-tab=\"fileIndex\">] "
-                    "[</a>]"));
-}
-
-TEST_F(NoSpaceNotification, FailsUnlessTheToolSucceeds) {
-    for (const long result : {-1L, 1L, 127L}) {
-        Fail({.call = "VLIBCExecv", .result = result});
-        EXPECT_FALSE(NotifyNoSpace()) << result;
-    }
-    EXPECT_EQ("", Left());
 }
 
 }  // namespace

@@ -54,51 +54,15 @@ TEST_F(EventQueue, StaysALineWhateverTheCallersTextHeld) {
     EXPECT_EQ(kSettingLine + "\n", ReadFile(kQueue));
 }
 
-TEST_F(EventQueue, DropsWhatAQueuedReindexOfThePathCovers) {
-    const std::string junk =
-        "not json\n\n[65536]\n{\"event\":65536}\n{\"path\":\"/vol1/photo/a\"}\n"
-        "{\"event\":\"65536\",\"path\":\"/vol1/photo/a\"}\n"
-        "{\"event\":65536,\"path\":[\"/vol1/photo/a\"]}\n"
-        "{\"event\":-65536,\"path\":\"/vol1/photo/a\"}\n"
-        "{\"event\":65536,\"path\":\"/vol1/photo/a\"} // and more\n";
-    const std::string monitorLine = R"({"event":256,"path":"/vol1/photo/a","path_old":"/vol1/photo/b"})";
+TEST_F(EventQueue, IsNotReadInALineBeyondOneMebibyte) {
     const std::string endless =
         R"({"event":65536,"data":")" + std::string(1 << 20, 'x') + R"(","path":"/vol1/photo/a"})";
-    const struct {
-        const char *name;
-        std::string queue, companion;
-        const char *path;
-        bool dropped;
-    } rows[] = {
-        {"the same path", kReindexLine, "", kPath, true},
-        {"a path below", kReindexLine, "", "/vol1/photo/a/b", false},
-        {"the path with a slash", kReindexLine, "", "/vol1/photo/a/", false},
-        {"the share above", kReindexLine, "", "/vol1/photo", false},
-        {"another event of the path", kSettingLine + "\n" + monitorLine, "", kPath, false},
-        {"in the companion", "", kReindexLine + "\n", kPath, true},
-        {"only malformed lines", junk, junk, kPath, false},
-        {"behind malformed lines", junk + kReindexLine + "\n" + junk, "", kPath, true},
-        {"65536.0", R"({"event":65536.0,"path":"/vol1/photo/a"})", "", kPath, true},
-        {"6.5536e4", R"({"path":"/vol1/photo/a","event":6.5536e4})", "", kPath, true},
-        {"escaped path", R"({"path":"\/vol1\/photo\/\u0061","event":65536})", "", kPath, true},
-        {"the last of two paths", R"({"path":"/vol1/photo/a","event":65536,"path":"/b"})", "", kPath, false},
-        {"inside the data", R"({"data":{"path":"/vol1/photo/a"},"event":65536,"path":"/b"})", "", kPath, false},
-        {"data of every kind", R"({"data":[1,{"a":[null]}],"event":65536,"path":"/vol1/photo/a"})", "", kPath,
-         true},
-        {"data with reals", R"({"data":[1,{"a":[0.5]}],"event":65536,"path":"/vol1/photo/a"})", "", kPath, true},
-        {"a line that breaks off", R"({"event":65536,"path":"/vol1/photo/a")", "", kPath, false},
-        {"in a line beyond 1 MiB", endless, "", kPath, false},
-        {"behind a line beyond 1 MiB", endless + "\n" + kReindexLine, "", kPath, true},
-    };
-    for (const auto &row : rows) {
-        SCOPED_TRACE(row.name);
-        GivenQueue("photo", row.queue + "\n");
-        GivenQueue("photo", row.companion, ".tmp");
-        EXPECT_TRUE(AddSetting(row.path));
-        EXPECT_EQ(row.dropped, ReadFile(kQueue) == row.queue + "\n");
-        EXPECT_EQ(row.companion, ReadFile(std::string(kQueue) + ".tmp"));
-    }
-    EXPECT_EQ("", Left());
+    GivenQueue("photo", endless + "\n" + kReindexLine + "\n");
+    EXPECT_TRUE(AddSetting());
+    EXPECT_EQ(2U, Queue("photo").size()) << "covered by what is behind it";
+    GivenQueue("photo", endless + "\n");
+    EXPECT_TRUE(AddSetting());
+    EXPECT_THAT(Queue("photo"), ElementsAre(endless, kSettingLine));
 }
 
 TEST_F(EventQueue, ThatCannotBeReadIsWrittenAllTheSame) {
@@ -212,14 +176,6 @@ TEST_F(EventQueue, ThatCannotBeUsedMarksTheShareForReindexing) {
         EXPECT_EQ(descriptors, OpenDescriptors());
         EXPECT_EQ(std::string(row.name) == "link to a file" ? "" : "(missing)", ReadFile(elsewhere));
         EXPECT_THAT(Script::Current().Finish(), IsEmpty());
-    }
-}
-
-TEST_F(EventQueue, OfAPathOutsideEveryShareMarksTheEmptyName) {
-    for (const std::string &path : {std::string("/vol9/x"), std::string(kPath) + std::string("\0x", 2)}) {
-        EXPECT_FALSE(AddSetting(path));
-        EXPECT_EQ(R"({"need_reindex":{"":true}})", StatusConf());
-        EXPECT_EQ("0 utils.cpp:472 VORKShareNamePathGet failed, path=" + path.substr(0, path.find('\0')), Left());
     }
 }
 

@@ -90,7 +90,7 @@ TEST_P(Transcripts, AreTrue) {
 
 INSTANTIATE_TEST_SUITE_P(Of, Transcripts,
                          testing::Values("paths", "places", "folders", "documents", "listing", "progress",
-                                         "requests"),
+                                         "queues", "requests"),
                          [](const auto &info) { return info.param; });
 
 }  // namespace
