@@ -90,15 +90,13 @@ std::string Stored(const Change &change) {
 }
 
 /// What is read of a status.conf of this text.
-std::string Document(Text text) {
-    struct : Status {
-        std::string Read() { return Load() ? Print(document_) : "no"; }
-    } status;
+std::string DocumentOf(Text text) {
     WriteFile(kStatusConf, text);
-    const std::string document = status.Read();
+    Document status;
+    const bool loaded = status.Load();
     EXPECT_EQ(text, ReadFile(kStatusConf));
     std::filesystem::remove(kStatusConf);
-    return document;
+    return loaded ? status.Text() : "no";
 }
 
 std::string PauseInfo(Text /*unused*/) {
@@ -201,7 +199,7 @@ const std::map<std::string, Function> kFunctions = {
     {"CleanShareIndexData", Asks(IndexMgr::CleanShareIndexData)},
     {"Delete", Asks(IndexMgr::Delete)},
     {"DeleteVorkNotifydCfg", Asks(IndexMgr::DeleteVorkNotifydCfg)},
-    {"Document", Document},
+    {"Document", DocumentOf},
     {"FILEIDXDBPathGet", LocationFrom(FILEIDXDBPathGet)},
     {"FILEIDXIsFullPathIndexed", Asks(FILEIDXIsFullPathIndexed)},
     {"FILEIDXQueuePathGet", LocationFrom(FILEIDXQueuePathGet)},

@@ -53,14 +53,6 @@ void FakeDaemon::Stop() {
     listening = nullptr;
 }
 
-std::vector<std::string> FakeDaemon::Commands() const {
-    std::vector<std::string> commands;
-    for (const std::string &frame : frames_) {
-        commands.push_back(Decode(frame));
-    }
-    return commands;
-}
-
 int FakeDaemon::Connect(int fd, const sockaddr *address) {
     const char *path = reinterpret_cast<const sockaddr_un *>(address)->sun_path;
     std::array<int, 2> ends{};

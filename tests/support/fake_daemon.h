@@ -24,9 +24,6 @@ public:
 
     /// What each connection brought, byte for byte.
     const std::vector<std::string> &Frames() const { return frames_; }
-    /// The JSON text of each connection's frame; "malformed: ..." for one that is not length, text and NUL.
-    std::vector<std::string> Commands() const;
-
     /// In the place of `connect`, and after `close`.
     static int Connect(int fd, const sockaddr *address);
     static void Closed(int fd);

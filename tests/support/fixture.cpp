@@ -5,6 +5,7 @@
 
 #include <fcntl.h>
 #include <sys/file.h>
+#include <sys/stat.h>
 #include <sys/syscall.h>
 #include <syslog.h>
 #include <unistd.h>
@@ -104,6 +105,12 @@ void WriteFile(const std::string &path, const std::string &text) {
     ASSERT_TRUE(file.flush()) << path;
 }
 
+struct stat StatusOf(const std::string &path) {
+    struct stat status = {};
+    EXPECT_EQ(0, ::stat(path.c_str(), &status)) << path;
+    return status;
+}
+
 void FileIndexTest::SetUp() {
     ASSERT_TRUE(InPrivateNamespace()) << "to be run by scripts/in-private-namespace";
     Empty(kConfigDir);
@@ -113,6 +120,7 @@ void FileIndexTest::SetUp() {
     Script::Current().Reset();
     Forget();
     LOG_LEVEL = 3;
+    ::umask(0022);
     descriptors_ = OpenDescriptors();
 }
 
@@ -135,7 +143,7 @@ void FileIndexTest::Given(const std::string &line) {
         return;
     }
     if (what.starts_with("queue")) {
-        GivenQueue("photo", text.empty() ? "" : Decoded(text) + "\n", what.substr(5));
+        GivenQueue(text.empty() ? "" : Decoded(text) + "\n", what.substr(5));
         return;
     }
     Platform &platform = Platform::Current();
@@ -164,17 +172,13 @@ void FileIndexTest::GivenShare(const std::string &name, const std::string &path)
     Platform::Current().shares[name].path = directory;
 }
 
-void FileIndexTest::GivenQueue(const std::string &share, const std::string &text, const std::string &suffix) {
-    fs::create_directories(fs::path(QueuePath(share)).parent_path());
-    WriteFile(QueuePath(share) + suffix, text);
+void FileIndexTest::GivenQueue(const std::string &text, const std::string &suffix) {
+    fs::create_directories(fs::path(kQueue).parent_path());
+    WriteFile(kQueue + suffix, text);
 }
 
-std::string FileIndexTest::QueuePath(const std::string &share) {
-    return Platform::Current().shares.at(share).path + "/@eaDir/VORK@file_index_queue";
-}
-
-std::vector<std::string> FileIndexTest::Queue(const std::string &share) {
-    std::ifstream file(QueuePath(share));
+std::vector<std::string> FileIndexTest::Queue() {
+    std::ifstream file(kQueue);
     std::vector<std::string> lines;
     for (std::string line; std::getline(file, line);) {
         lines.push_back(line);

@@ -14,6 +14,8 @@
 #include <gtest/gtest.h>
 #include <json/value.h>
 
+#include <sys/stat.h>
+
 #include <set>
 #include <string>
 #include <utility>
@@ -29,6 +31,7 @@ constexpr char kConfigDir[] = "/usr/vork/etc/fileindex";
 constexpr char kFolderConf[] = "/usr/vork/etc/fileindex/folder.conf";
 constexpr char kStatusConf[] = "/usr/vork/etc/fileindex/status.conf";
 constexpr char kFolderLock[] = "/tmp/fileidx_cfg_folder.lock";
+constexpr char kQueue[] = "/vol1/photo/@eaDir/VORK@file_index_queue";
 constexpr char kStatusLock[] = "/tmp/fileidx_cfg_status.lock";
 
 // What FileIndexTest::Left() says when nothing else went wrong.
@@ -54,6 +57,16 @@ std::string TestData(const std::string &name);  ///< a file below tests/unit
 void ExpectTestData(const std::string &name, const std::string &found);
 void WriteFile(const std::string &path, const std::string &text);
 
+struct stat StatusOf(const std::string &path);
+
+/// status.conf with its content in reach.
+class Document : public Status {
+public:
+    Document() = default;
+    explicit Document(const std::string &text) { document_ = Parse(text); }
+    [[nodiscard]] std::string Text() const { return Print(document_); }
+};
+
 class FileIndexTest : public testing::Test {
 protected:
     void SetUp() override;
@@ -70,12 +83,10 @@ protected:
     void GivenShare(const std::string &name, const std::string &path = "");
     static void GivenFolderConf(const std::string &text) { WriteFile(kFolderConf, text); }
     static void GivenStatusConf(const std::string &text) { WriteFile(kStatusConf, text); }
-    static void GivenQueue(const std::string &share, const std::string &text, const std::string &suffix = "");
+    static void GivenQueue(const std::string &text, const std::string &suffix = "");  ///< of the share photo
     static void Fail(Fault fault) { Script::Current().Fail(std::move(fault)); }
 
-    static std::string QueuePath(const std::string &share);
-    /// The lines of the share's queue file.
-    static std::vector<std::string> Queue(const std::string &share);
+    static std::vector<std::string> Queue();  ///< its lines
     static std::vector<std::string> Journal() { return Script::Current().Journal(); }
 
     /// The error code and the records since the last look, "2 utils.cpp:418 message | utils.cpp:239 message";

@@ -29,7 +29,7 @@ TEST_F(IndexChange, NeverCleansAShareThatTheSavedListStillHolds) {
     Fail({.call = "write", .about = "/vol1/photo/@eaDir", .action = loseTheList});
     EXPECT_FALSE(IndexMgr::Delete(Parse(R"(["/photo/a"])")));
     EXPECT_TRUE(fs::exists("/vol1/photo/@eaDir/VORK@.fileindexdb"));
-    EXPECT_EQ(1U, Queue("photo").size());
+    EXPECT_EQ(1U, Queue().size());
     EXPECT_EQ(0, Script::Current().Calls("VLIBCExec"));
     EXPECT_EQ(0, Script::Current().Calls("MonitorQueue::Delete"));
     EXPECT_THAT(Left(), testing::EndsWith(" | index_mgr.cpp:121 UpsertVorkNotifydCfg failed, share=photo"));
@@ -38,7 +38,7 @@ TEST_F(IndexChange, NeverCleansAShareThatTheSavedListStillHolds) {
 /// The queue's consumer or another writer does something after the first event of a request, before or after the
 /// queue has been looked at for the second.
 TEST_F(IndexChange, ReindexSeesTheQueueAsItIsAtEachEvent) {
-    const std::string queue = "/vol1/photo/@eaDir/VORK@file_index_queue";
+    const std::string queue = kQueue;
     const auto lineOf = [](const std::string &name) {
         return R"({"data":null,"event":65536,"path":"/vol1/photo/)" + name + "\"}";
     };
@@ -69,7 +69,7 @@ TEST_F(IndexChange, ReindexSeesTheQueueAsItIsAtEachEvent) {
             fs::remove_all("/vol1/photo/@eaDir");
             Fail({.call = "flock", .about = queue, .nth = lockCall, .action = row.between});
             EXPECT_TRUE(IndexMgr::Reindex(Parse(R"(["/photo/a","/photo/b","/photo/a","/photo/b"])")));
-            EXPECT_EQ(row.lines, Queue("photo")) << lockCall;
+            EXPECT_EQ(row.lines, Queue()) << lockCall;
             Script::Current().Finish();
         }
     }

@@ -13,7 +13,6 @@ namespace fs = std::filesystem;
 namespace fileindex_test {
 namespace {
 
-constexpr char kQueue[] = "/vol1/photo/@eaDir/VORK@file_index_queue";
 constexpr char kPath[] = "/vol1/photo/a";
 constexpr int kReindex = 0x10000;
 constexpr int kSetting = 0x20000;
@@ -33,9 +32,8 @@ protected:
 };
 
 TEST_F(EventQueue, GetsOneLineForEachEvent) {
-    const mode_t before = ::umask(0);
+    ::umask(0);
     EXPECT_TRUE(AddSetting());
-    ::umask(before);
     EXPECT_TRUE(AddCustomEvent(kReindex, kPath, Json::Value()));
     EXPECT_TRUE(AddCustomEvent(-1, "/vol1/photo", "\xff\n"));
     EXPECT_EQ(kSettingLine + "\n" + kReindexLine + "\n" +
@@ -57,24 +55,24 @@ TEST_F(EventQueue, StaysALineWhateverTheCallersTextHeld) {
 TEST_F(EventQueue, IsNotReadInALineBeyondOneMebibyte) {
     const std::string endless =
         R"({"event":65536,"data":")" + std::string(1 << 20, 'x') + R"(","path":"/vol1/photo/a"})";
-    GivenQueue("photo", endless + "\n" + kReindexLine + "\n");
+    GivenQueue(endless + "\n" + kReindexLine + "\n");
     EXPECT_TRUE(AddSetting());
-    EXPECT_EQ(2U, Queue("photo").size()) << "covered by what is behind it";
-    GivenQueue("photo", endless + "\n");
+    EXPECT_EQ(2U, Queue().size()) << "covered by what is behind it";
+    GivenQueue(endless + "\n");
     EXPECT_TRUE(AddSetting());
-    EXPECT_THAT(Queue("photo"), ElementsAre(endless, kSettingLine));
+    EXPECT_THAT(Queue(), ElementsAre(endless, kSettingLine));
 }
 
 TEST_F(EventQueue, ThatCannotBeReadIsWrittenAllTheSame) {
-    GivenQueue("photo", kReindexLine + "\n");
+    GivenQueue(kReindexLine + "\n");
     Fail({.call = "open", .about = kQueue, .error = EACCES});
     EXPECT_TRUE(AddSetting());
-    EXPECT_THAT(Queue("photo"), ElementsAre(kReindexLine, kSettingLine));
+    EXPECT_THAT(Queue(), ElementsAre(kReindexLine, kSettingLine));
     EXPECT_EQ(std::string("0 utils.cpp:95 Failed to open queue=") + kQueue + ", reason=Permission denied", Left());
 }
 
 TEST_F(EventQueue, HeldByAnotherLosesTheEventAfterThreeAttempts) {
-    GivenQueue("photo", "");
+    GivenQueue("");
     Script::Current().random = 13;
     const LockAgent reader(kQueue);
     for (const int level : {3, 7}) {
@@ -92,27 +90,27 @@ TEST_F(EventQueue, HeldByAnotherLosesTheEventAfterThreeAttempts) {
 }
 
 TEST_F(EventQueue, HeldForAMomentGetsTheEventInTheEnd) {
-    GivenQueue("photo", "");
+    GivenQueue("");
     LockAgent reader(kQueue);
     Fail({.call = "usleep", .nth = 2, .action = [&] { reader.Release(); }});
     Fail({.call = "flock", .about = kQueue, .error = EINTR});
     EXPECT_TRUE(AddSetting());
-    EXPECT_THAT(Queue("photo"), ElementsAre(kSettingLine));
+    EXPECT_THAT(Queue(), ElementsAre(kSettingLine));
 }
 
 TEST_F(EventQueue, TakenAwayBeforeTheLockIsOpenedAgainAtOnce) {
-    GivenQueue("photo", "");
+    GivenQueue("");
     const std::string taken = std::string(kQueue) + ".taken";
     Fail({.call = "flock", .about = kQueue, .times = 9, .action = [&] { fs::rename(kQueue, taken); }});
     EXPECT_TRUE(AddSetting());
     EXPECT_EQ("", ReadFile(taken));
-    EXPECT_THAT(Queue("photo"), ElementsAre(kSettingLine));
+    EXPECT_THAT(Queue(), ElementsAre(kSettingLine));
     EXPECT_EQ(0, Script::Current().Calls("usleep"));
     EXPECT_EQ(0, fs::exists(kStatusConf));
 }
 
 TEST_F(EventQueue, AlwaysTakenAwayEndsTheAttempts) {
-    GivenQueue("photo", "");
+    GivenQueue("");
     const std::string taken = std::string(kQueue) + ".taken";
     Fail({.call = "flock", .about = kQueue, .times = kAlways, .action = [&] { fs::rename(kQueue, taken); }});
     AddSetting();
@@ -121,7 +119,7 @@ TEST_F(EventQueue, AlwaysTakenAwayEndsTheAttempts) {
 }
 
 TEST_F(EventQueue, WrittenShortCountsAsWritten) {
-    GivenQueue("photo", "");
+    GivenQueue("");
     for (const int level : {3, 7}) {
         Forget();
         LOG_LEVEL = level;

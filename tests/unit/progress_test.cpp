@@ -11,8 +11,6 @@ namespace fs = std::filesystem;
 namespace fileindex_test {
 namespace {
 
-constexpr char kQueue[] = "/vol1/photo/@eaDir/VORK@file_index_queue";
-
 std::string EventLine(const std::string &path) {
     return R"({"event":2,"path":")" + path + "\"}\n";
 }
@@ -28,7 +26,7 @@ protected:
 };
 
 TEST_F(Progress, IsNotSeenInWhatIsNoLineOrNoFile) {
-    GivenQueue("photo", std::string(2 << 20, 'x') + "\n" + EventLine("/vol1/photo/a"));
+    GivenQueue(std::string(2 << 20, 'x') + "\n" + EventLine("/vol1/photo/a"));
     EXPECT_EQ("processing", Ask("GetFolderStatus /photo/a"));
     EXPECT_EQ(1U, SyslogCapture::Records().size());
     Forget();
@@ -43,7 +41,7 @@ TEST_F(Progress, CountsALineOnlyWhenItIsWhole) {
         const std::string line =
             std::string("{") + data + R"("event":256,"path":"/vol1/photo/a","path_old":"/vol1/photo/b"})";
         for (size_t size = 1; size <= line.size(); ++size) {
-            GivenQueue("photo", line.substr(0, size));
+            GivenQueue(line.substr(0, size));
             EXPECT_EQ(size == line.size() ? "processing" : "finished", StatusMgr::GetFolderStatus("/photo/a"))
                 << size;
             Forget();
@@ -52,7 +50,7 @@ TEST_F(Progress, CountsALineOnlyWhenItIsWhole) {
 }
 
 TEST_F(Progress, SeesAQueueThatIsReadWithTroubleAsFarAsItGoes) {
-    GivenQueue("photo", EventLine("/vol1/photo/a"));
+    GivenQueue(EventLine("/vol1/photo/a"));
     Fail({.call = "pread", .about = kQueue, .error = EINTR});
     EXPECT_EQ("processing", StatusMgr::GetFolderStatus("/photo/a"));
     Fail({.call = "pread", .about = kQueue, .error = EIO});

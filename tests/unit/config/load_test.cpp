@@ -1,5 +1,5 @@
 // What counts as a configuration, and how it is read beside writers.
-#include "unit/config/document.h"
+#include "fixture.h"
 
 #include <sys/stat.h>
 #include <unistd.h>

@@ -1,5 +1,5 @@
 // The lock of a configuration file.
-#include "unit/config/document.h"
+#include "fixture.h"
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -82,7 +82,7 @@ TEST_F(ConfigLock, IsTriedAgainOnlyWhenTriedTooEarly) {
 
 TEST_F(ConfigLock, FileIsOwnWritableClosedOnExecAndNoLink) {
     {
-        const UmaskOf none(0);
+        ::umask(0);
         Document document;
         ASSERT_TRUE(document.Lock(true));
         EXPECT_EQ(0100644U, StatusOf(kStatusLock).st_mode);
