@@ -25,13 +25,6 @@ namespace fs = std::filesystem;
 namespace fileindex_test {
 namespace {
 
-void Empty(const fs::path &directory) {
-    fs::create_directories(directory);
-    for (const auto &entry : fs::directory_iterator(directory)) {
-        fs::remove_all(entry.path());
-    }
-}
-
 /// The library's places are fixed: only where they are the test's own may it empty them.
 bool InPrivateNamespace() {
     return ReadFile("/proc/self/mountinfo").find("fileindex-private") != std::string::npos;
@@ -113,7 +106,8 @@ struct stat StatusOf(const std::string &path) {
 
 void FileIndexTest::SetUp() {
     ASSERT_TRUE(InPrivateNamespace()) << "to be run by scripts/in-private-namespace";
-    Empty(kConfigDir);
+    fs::remove_all(kConfigDir);
+    fs::create_directories(kConfigDir);
     fs::remove(kFolderLock);
     fs::remove(kStatusLock);
     Platform::Current() = Platform();
@@ -202,6 +196,15 @@ std::string FileIndexTest::Left() {
     const int code = ErrorHandler::GetError();
     ErrorHandler::SetError(FILEINDEX_ERR_NONE);
     return code == FILEINDEX_ERR_NONE && records.empty() ? "" : std::to_string(code) + records;
+}
+
+std::string FileIndexTest::AskAlone(const std::string &call) {
+    const auto descriptors = OpenDescriptors();
+    const std::string answer = Ask(call);
+    const std::string left = Left();
+    EXPECT_EQ(descriptors, OpenDescriptors()) << call;
+    EXPECT_FALSE(IsLocked(kFolderLock) || IsLocked(kStatusLock)) << call;
+    return answer + (left.empty() ? "" : " " + left);
 }
 
 void FileIndexTest::Forget() {

@@ -92,6 +92,8 @@ protected:
     /// The error code and the records since the last look, "2 utils.cpp:418 message | utils.cpp:239 message";
     /// empty when there are neither. The line is left out for the modules that do not fix it. Forgets both.
     static std::string Left();
+    /// Answer, code and records of a call, which keeps no lock and no descriptor.
+    static std::string AskAlone(const std::string &call);
     static void Forget();
 
     static std::string FolderConf() { return Canonical(ReadFile(kFolderConf)); }

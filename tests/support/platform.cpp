@@ -19,6 +19,7 @@
 #include <strings.h>
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
@@ -62,12 +63,7 @@ int Effect(const char *call, const std::string &about, const std::string &line) 
 }
 
 bool StartsWithAny(const std::string &path, const std::set<std::string> &beginnings) {
-    for (const std::string &beginning : beginnings) {
-        if (path.starts_with(beginning)) {
-            return true;
-        }
-    }
-    return false;
+    return std::any_of(beginnings.begin(), beginnings.end(), [&](auto &begin) { return path.starts_with(begin); });
 }
 
 std::string OneLine(const Json::Value &value) {

@@ -45,14 +45,6 @@ TEST_F(DaemonSocket, WritesABodyInChunksOf1024Bytes) {
     EXPECT_EQ(1, Script::Current().Calls("write", "] " + std::to_string(text.size() + 1 - size_t{4} * 1024)));
 }
 
-TEST_F(DaemonSocket, WithoutAListenerFailsAndLeavesNothing) {
-    EXPECT_FALSE(SendPause());
-    daemon_.Start();
-    daemon_.Stop();
-    EXPECT_FALSE(SendPause());
-    EXPECT_EQ("", Left());
-}
-
 TEST_F(DaemonSocket, FailsWhenAStepDoes) {
     daemon_.Start();
     const std::string timeout = std::to_string(SO_SNDTIMEO);

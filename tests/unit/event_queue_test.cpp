@@ -63,14 +63,6 @@ TEST_F(EventQueue, IsNotReadInALineBeyondOneMebibyte) {
     EXPECT_THAT(Queue(), ElementsAre(endless, kSettingLine));
 }
 
-TEST_F(EventQueue, ThatCannotBeReadIsWrittenAllTheSame) {
-    GivenQueue(kReindexLine + "\n");
-    Fail({.call = "open", .about = kQueue, .error = EACCES});
-    EXPECT_TRUE(AddSetting());
-    EXPECT_THAT(Queue(), ElementsAre(kReindexLine, kSettingLine));
-    EXPECT_EQ(std::string("0 utils.cpp:95 Failed to open queue=") + kQueue + ", reason=Permission denied", Left());
-}
-
 TEST_F(EventQueue, HeldByAnotherLosesTheEventAfterThreeAttempts) {
     GivenQueue("");
     Script::Current().random = 13;
@@ -138,24 +130,18 @@ TEST_F(EventQueue, WrittenShortCountsAsWritten) {
 
 TEST_F(EventQueue, ThatCannotBeUsedMarksTheShareForReindexing) {
     const std::string elsewhere = "/vol1/photo/elsewhere";
-    const auto lockFails = [] { Fail({.call = "flock", .about = kQueue, .error = ENOLCK}); };
     const struct {
         const char *name;
         std::function<void()> plant;
         int logLevel;
         std::string left;
     } rows[] = {
-        {"not to be opened", [] { Fail({.call = "open", .about = kQueue, .error = EACCES}); }, 7, ""},
-        {"no lock", lockFails, 3, ""},
-        {"no lock, debugging", lockFails, 7,
+        {"no lock", [] { Fail({.call = "flock", .about = kQueue, .error = ENOLCK}); }, 7,
          std::string("0 utils.cpp:507 flock fail, path=") + kQueue + ", reason=No locks available"},
         {"directory", [] { fs::create_directory(kQueue); }, 7, ""},
         {"fifo", [] { ::mkfifo(kQueue, 0600); }, 7, ""},
         {"link", [&] { fs::create_symlink(elsewhere, kQueue); }, 7, ""},
         {"link to a file", [&] { WriteFile(elsewhere, ""), fs::create_symlink(elsewhere, kQueue); }, 7, ""},
-        {"share gone in between", [] { Fail({.call = "VORKShareGet", .error = 0x1400}); }, 3,
-         "0 utils.cpp:772 VORKShareGet failed, name=photo, code=5120 | "
-         "utils.cpp:478 FILEIDXQueuePathGet failed, share=photo"},
         {"out of memory",
          [] { Fail({.call = "open", .about = kQueue, .action = [] { throw std::bad_alloc(); }}); }, 3, ""},
     };

@@ -96,35 +96,21 @@ protected:
         return " | " + (all ? "all" : numbers.empty() ? "none" : Ranges(numbers)) + others;
     }
 
-    /// An exception out of the nth such call ends in the operation, which gives everything back.
-    void Throw(const Call &call, size_t nth) {
+    /// What comes of the operation when the fault has taken place.
+    std::string With(const Fault &fault) {
         Furnish();
-        const auto descriptors = OpenDescriptors();
-        Fail({.call = call.first, .about = call.second, .nth = static_cast<int>(nth), .action = [] {
-                  throw std::runtime_error("thrown");
-              }});
-        EXPECT_NO_THROW(Ask(call_)) << call.first << nth;
-        Left();
-        EXPECT_FALSE(IsLocked(kFolderLock) || IsLocked(kStatusLock));
-        EXPECT_EQ(descriptors, OpenDescriptors());
+        Fail(fault);
+        const std::string outcome = AskAlone(call_);
         EXPECT_THAT(Script::Current().Finish(), IsEmpty());
+        return outcome;
     }
 
     /// What became of the operation whose nth such call failed.
     std::string Outcome(const Call &call, size_t nth, const std::string &answer,
                         const std::vector<std::string> &steps, const std::string &list) {
-        Furnish();
-        const auto descriptors = OpenDescriptors();
-        Fail({.call = call.first,
-              .about = call.second,
-              .nth = static_cast<int>(nth),
-              .error = call.first == "flock" ? ENOLCK : EIO});
-        const std::string result = Ask(call_);
-        const std::string left = Left();
-        std::string outcome = result + (left.empty() ? "" : " " + left) + Done(steps);
-        EXPECT_FALSE(IsLocked(kFolderLock) || IsLocked(kStatusLock));
-        EXPECT_EQ(descriptors, OpenDescriptors());
-        EXPECT_THAT(Script::Current().Finish(), IsEmpty());
+        const int error = call.first == "flock" ? ENOLCK : EIO;
+        std::string outcome = With({call.first, call.second, static_cast<int>(nth), 1, -1, error});
+        outcome += Done(steps);
         const std::string again = Ask(call_);
         Left();
         if (again != answer || FolderConf() != list) {
@@ -166,7 +152,9 @@ protected:
             }
             same->second[call].push_back(nth);
             if (call.first != "flock" && isWrapped) {
-                Throw(call, nth);
+                const auto action = [] { throw std::runtime_error("thrown"); };  // ends in the operation
+                EXPECT_NO_THROW(With(
+                    {.call = call.first, .about = call.second, .nth = static_cast<int>(nth), .action = action}));
             }
         }
         for (const auto &[outcome, calls] : outcomes) {

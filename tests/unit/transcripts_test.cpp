@@ -51,12 +51,7 @@ protected:
         Forget();
         const std::string files[] = {kFolderConf, kStatusConf};
         const std::string before[] = {ReadFile(files[0]), ReadFile(files[1])};
-        const auto descriptors = OpenDescriptors();
-        const std::string answer = Ask(call);
-        const std::string left = Left();
-        EXPECT_EQ(descriptors, OpenDescriptors()) << call;
-        EXPECT_FALSE(IsLocked(kFolderLock) || IsLocked(kStatusLock)) << call;
-        std::string outcome = " | " + answer + " " + left;
+        std::string outcome = " | " + AskAlone(call);
         outcome.resize(outcome.find_last_not_of(' ') + 1);
         for (const std::string &step : Journal()) {
             outcome += "\n  " + step;
