@@ -50,10 +50,7 @@ Result Call(const char *name, const std::string &about, Arguments... arguments) 
 
 /// What is appended to a queue is a line of the journal.
 void RecordWrite(const std::string &path, const void *data, ssize_t size) {
-    if (size <= 0) {
-        return;
-    }
-    if (path.ends_with("/VORK@file_index_queue")) {
+    if (size > 0 && path.ends_with("/VORK@file_index_queue")) {
         std::string line(static_cast<const char *>(data), static_cast<size_t>(size));
         line.resize(line.find_last_not_of('\n') + 1);
         Script::Current().Record("event " + line);
