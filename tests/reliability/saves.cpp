@@ -147,7 +147,7 @@ void ReadWhileFlipping(int count, int reads) {
 
 void FullDisk(const std::string &fileSystem) {
     const std::string filler = std::string(kConfigDir) + "/filler";
-    constexpr std::uintmax_t kMetadata = 4 * 4096;  // a file system may keep the map of what was reserved
+    constexpr std::uintmax_t kMetadata = 4096;  // a file system may keep the map of what was reserved
     const int rounds = Rounds(10, 100);
     std::mt19937 random(1);
     int failures = 0;
