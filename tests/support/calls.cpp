@@ -46,20 +46,23 @@ Function Agree(Questions... questions) {
     };
 }
 
-/// The question for those who have the folders at hand.
-Function AsksOfList(bool (*function)(Text, const std::vector<Folder> &)) {
-    return [function](Text argument) {
-        std::vector<Folder> folders;
-        IndexMgr::List(folders);
-        return YesNo(function(argument, folders));
-    };
+std::vector<Folder> Listed() {
+    std::vector<Folder> folders;
+    IndexMgr::List(folders);
+    return folders;
 }
 
-/// [share, flag]
-Function Sets(bool (*function)(Text, bool)) {
+/// The question for those who have the folders at hand.
+Function AsksOfList(bool (*function)(Text, const std::vector<Folder> &)) {
+    return [function](Text argument) { return YesNo(function(argument, Listed())); };
+}
+
+/// A function of two arguments.
+template <typename Second>
+Function AsksOfTwo(bool (*function)(Text, Second)) {
     return [function](Text argument) {
         const Json::Value arguments = Parse(argument);
-        return YesNo(function(arguments[0].asString(), arguments[1].asBool()));
+        return YesNo(function(arguments[0].asString(), arguments[1].as<std::decay_t<Second>>()));
     };
 }
 
@@ -106,9 +109,7 @@ std::string PauseInfo(Text /*unused*/) {
 }
 
 std::string Governor(Text path) {
-    std::vector<Folder> folders;
-    IndexMgr::List(folders);
-    const Json::Value governor = GetMostSuitableCfg(folders, path);
+    const Json::Value governor = GetMostSuitableCfg(Listed(), path);
     return governor == Json::Value(Json::objectValue) ? "none" : Print(governor["path"]);
 }
 
@@ -246,14 +247,12 @@ const std::map<std::string, Function> kFunctions = {
     {"ShareIsNoSpace", Asks(StatusMgr::ShareIsNoSpace)},
     {"SharePause", Asks(IndexMgr::SharePause)},
     {"ShareRemove", Asks(IndexMgr::ShareRemove)},
-    {"ShareRename",
-     [](Text names) {
-         return YesNo(IndexMgr::ShareRename(Parse(names)[0].asString(), Parse(names)[1].asString()));
-     }},
+    {"ShareRename", AsksOfTwo(IndexMgr::ShareRename)},
     {"ShareResume", Asks(IndexMgr::ShareResume)},
     {"ShareRevive", Asks(StatusMgr::ShareRevive)},
-    {"ShareSetNeedReindex", Sets(StatusMgr::ShareSetNeedReindex)},
-    {"ShareSetNoSpace", Sets(StatusMgr::ShareSetNoSpace)},
+    {"ShareSetNeedReindex", AsksOfTwo(StatusMgr::ShareSetNeedReindex)},
+    {"ShareSetNoSpace", AsksOfTwo(StatusMgr::ShareSetNoSpace)},
+    {"StringStartWith", AsksOfTwo(StringStartWith)},
     {"Update", [](Text path) { return YesNo(IndexMgr::Update(path, "anything")); }},
     {"Updater_zol60_beta2", [](Text) { return YesNo(Updater_zol60_beta2()); }},
     {"Upsert", Asks(IndexMgr::Upsert)},

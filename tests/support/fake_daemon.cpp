@@ -6,6 +6,7 @@
 #include <sys/un.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstdint>
@@ -25,33 +26,13 @@ std::string ReadToEnd(int fd) {
 
 std::string Decode(const std::string &frame) {
     std::uint32_t length = 0;
-    if (frame.size() < sizeof length) {
-        return "malformed: " + frame;
-    }
-    std::memcpy(&length, frame.data(), sizeof length);
-    if (length == 0 || frame.size() != sizeof length + length ||
-        frame.find('\0', sizeof length) != frame.size() - 1) {
-        return "malformed: " + frame;
-    }
-    return frame.substr(sizeof length, length - 1);
+    std::memcpy(&length, frame.data(), std::min(frame.size(), sizeof length));
+    const bool isWhole = length > 0 && frame.size() == sizeof length + length &&
+                         frame.find('\0', sizeof length) == frame.size() - 1;
+    return isWhole ? frame.substr(sizeof length, length - 1) : "malformed: " + frame;
 }
 
 }  // namespace
-
-FakeDaemon *FakeDaemon::listening = nullptr;
-
-FakeDaemon::~FakeDaemon() {
-    Stop();
-}
-
-void FakeDaemon::Start(bool hangsUp) {
-    listening = this;
-    hangs_up_ = hangsUp;
-}
-
-void FakeDaemon::Stop() {
-    listening = nullptr;
-}
 
 int FakeDaemon::Connect(int fd, const sockaddr *address) {
     const char *path = reinterpret_cast<const sockaddr_un *>(address)->sun_path;

@@ -14,13 +14,16 @@ namespace fileindex_test {
 class FakeDaemon {
 public:
     FakeDaemon() = default;
-    ~FakeDaemon();
+    ~FakeDaemon() { Stop(); }
     FakeDaemon(const FakeDaemon &) = delete;
     FakeDaemon &operator=(const FakeDaemon &) = delete;
 
     /// Listens from now on; `hangsUp`: closes every connection at once.
-    void Start(bool hangsUp = false);
-    void Stop();
+    void Start(bool hangsUp = false) {
+        listening = this;
+        hangs_up_ = hangsUp;
+    }
+    static void Stop() { listening = nullptr; }
 
     /// What each connection brought, byte for byte.
     const std::vector<std::string> &Frames() const { return frames_; }
@@ -29,7 +32,7 @@ public:
     static void Closed(int fd);
 
 private:
-    static FakeDaemon *listening;
+    inline static FakeDaemon *listening = nullptr;
 
     bool hangs_up_ = false;
     std::map<int, int> far_ends_;  ///< by the caller's end

@@ -140,6 +140,8 @@ void FileIndexTest::Given(const std::string &line) {
         GivenQueue(text.empty() ? "" : Decoded(text) + "\n", what.substr(5));
         return;
     }
+    const std::string first = Split(text).first;
+    const std::string second = Split(text).second;
     Platform &platform = Platform::Current();
     const std::map<std::string, std::function<void()>> changes = {
         {"no", [&] { fs::remove_all(text.ends_with(".conf") ? kConfigDir + ("/" + text) : text); }},
@@ -148,11 +150,19 @@ void FileIndexTest::Given(const std::string &line) {
         {"locked", [&] { platform.shares.at(text).encrypted = true; }},
         {"encrypted", [&] { platform.shares.at(text).encryptionKind = true; }},
         {"read-only", [&] { platform.shares.at(text).readOnly = true; }},
-        {"share", [&] { platform.shares[Decoded(Split(text).first)].path = Split(text).second; }},
+        {"share", [&] { platform.shares[Decoded(first)].path = second; }},
+        {"directory", [&] { fs::create_directories(text); }},
+        {"link", [&] { fs::create_symlink(second, first); }},
+        {"type", [&] { platform.fsTypes[first] = std::stoi(second); }},
+        {"recycle-bin", [&] { platform.recycleBins.insert(text); }},
+        {"snapshot", [&] { platform.snapshots.insert(text); }},
+        {"mounted", [&] { platform.mountPoints.insert(text); }},
         {"result",
          [&] {
              Fault fault;
-             std::istringstream(text) >> fault.call >> fault.result >> std::hex >> fault.error >> fault.about;
+             std::istringstream words(text);
+             words >> fault.call >> fault.result >> std::hex >> fault.error >> std::ws;
+             std::getline(words, fault.about);
              Fail(fault);
          }},
     };

@@ -75,9 +75,10 @@ protected:
     /// records in the log, and with every scripted failure used.
     void TearDown() override;
 
-    /// A line of a table: "folder.conf TEXT", "queue TEXT" (of photo), "queue.tmp TEXT", "search on", "no PATH";
-    /// "share NAME PATH", without a directory, "gone NAME", "locked NAME", "encrypted NAME", "read-only NAME"; of
-    /// the next such call, "result CALL NUMBER ERROR ABOUT".
+    /// A line of a table: "folder.conf TEXT", "queue TEXT" (of photo), "queue.tmp TEXT", "search on"; "no PATH",
+    /// "directory PATH", "link PATH TARGET"; "share NAME PATH", without a directory, "gone NAME", "locked NAME",
+    /// "encrypted NAME", "read-only NAME"; "type PATH NUMBER" of a file system, "recycle-bin PATH", "snapshot
+    /// PATH", "mounted PATH"; of the next such call, "result CALL NUMBER ERROR ABOUT".
     void Given(const std::string &line);
     /// A share with a real directory; /vol1/NAME unless said otherwise.
     void GivenShare(const std::string &name, const std::string &path = "");

@@ -17,7 +17,6 @@ struct FakeShare {
 };
 
 constexpr int kPlainFs = 3;
-constexpr int kPseudoFs = 12;
 constexpr int kRemoteFs = 20;
 constexpr int kImageFs = 21;
 

@@ -11,14 +11,6 @@ Script &Script::Current() {
     return script;
 }
 
-void Script::Reset() {
-    rules_.clear();
-    calls_.clear();
-    journal_.clear();
-    now.reset();
-    random.reset();
-}
-
 std::vector<std::string> Script::Finish() {
     std::vector<std::string> unused;
     for (const Rule &rule : rules_) {
@@ -53,11 +45,6 @@ int Script::Calls(std::string_view call, std::string_view about) const {
     return static_cast<int>(std::count_if(calls_.begin(), calls_.end(), [&](const auto &made) {
         return made.first == call && made.second.find(about) != std::string::npos;
     }));
-}
-
-void Script::ClearJournal() {
-    calls_.clear();
-    journal_.clear();
 }
 
 }  // namespace fileindex_test

@@ -34,7 +34,7 @@ public:
     static Script &Current();
 
     /// Forgets all rules, counts and the journal.
-    void Reset();
+    void Reset() { *this = Script(); }
 
     void Fail(Fault fault) { rules_.push_back({std::move(fault)}); }
     /// Ends all rules; a rule that never matched its call is returned by name.
@@ -48,7 +48,7 @@ public:
 
     void Record(std::string effect) { journal_.push_back(std::move(effect)); }
     [[nodiscard]] std::vector<std::string> Journal() const { return journal_; }
-    void ClearJournal();
+    void ClearJournal() { calls_.clear(), journal_.clear(); }
 
     /// Fixed answers of time() and rand(), while set.
     std::optional<long> now;

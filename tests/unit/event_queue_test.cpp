@@ -26,9 +26,7 @@ protected:
         FileIndexTest::SetUp();
         GivenShare("photo");
     }
-    static bool AddSetting(const std::string &path = kPath) {
-        return AddCustomEvent(kSetting, path, Parse(R"({"audio":true})"));
-    }
+    static bool AddSetting() { return AddCustomEvent(kSetting, kPath, Parse(R"({"audio":true})")); }
 };
 
 TEST_F(EventQueue, GetsOneLineForEachEvent) {

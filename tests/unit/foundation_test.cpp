@@ -10,7 +10,6 @@ const _tag_fileindex_err_ kErrorAtStart = ErrorHandler::GetError();
 const int kLogLevelAtStart = LOG_LEVEL;
 
 class ErrorState : public FileIndexTest {};
-class Paths : public FileIndexTest {};
 
 TEST_F(ErrorState, IsNoneWhenTheLibraryIsLoadedAndOutlivesASuccess) {
     EXPECT_EQ(FILEINDEX_ERR_NONE, kErrorAtStart);
@@ -33,22 +32,12 @@ TEST_F(ErrorState, TheLogLevelDoesNotSelectTheRecords) {
     }
 }
 
-TEST_F(Paths, PrefixesAreBytes) {
-    EXPECT_TRUE(StringStartWith("/photo/a", "/photo"));
-    EXPECT_TRUE(StringStartWith("/photo", "/photo"));
-    EXPECT_TRUE(StringStartWith("", ""));
-    EXPECT_TRUE(StringStartWith("/photo", ""));
-    EXPECT_FALSE(StringStartWith("/phot", "/photo"));
-    EXPECT_FALSE(StringStartWith("/Photo/a", "/photo"));
-    EXPECT_TRUE(StringStartWith(std::string("a\0b", 3), std::string("a\0", 2)));
-    EXPECT_FALSE(StringStartWith(std::string("a\0b", 3), std::string("a\0c", 3)));
-}
-
-TEST_F(Paths, ANullPointerIsNone) {
+TEST_F(ErrorState, IsNoneAfterANullPointer) {
     EXPECT_EQ(0, FILEIDXIsPathIndexed(nullptr));
     EXPECT_EQ(0, FILEIDXIsFullPathIndexed(nullptr));
     EXPECT_EQ(0, FILEIDXIsShareIndexed(nullptr));
     EXPECT_FALSE(CanShareBeIndexed(nullptr));
+    EXPECT_EQ("", Left());
 }
 
 }  // namespace

@@ -55,12 +55,10 @@ TEST_F(StatusStore, ChangesOfAMemberOfAnotherTypePassTheException) {
 }
 
 TEST_F(StatusStore, ReadsWhileAnotherHoldsTheLock) {
-    GivenStatusConf(R"({"resume_time":3,"no_space":{"a":true},"need_reindex":{"a":true},"x":true})");
+    GivenStatusConf(R"({"resume_time":3,"no_space":{"a":true},"need_reindex":{"a":true},"a":true})");
     const LockAgent writer(kStatusLock);
-    long long resumeTime = 0;
-    EXPECT_TRUE(StatusMgr::GetPauseInfo(resumeTime));
-    EXPECT_EQ(3, resumeTime);
-    EXPECT_TRUE(StatusMgr::ShareIsNoSpace("a") && StatusMgr::ShareIsNeedReindex("a") && StatusMgr::IsUpdated("x"));
+    EXPECT_EQ("3", Ask("GetPauseInfo"));
+    EXPECT_EQ("no space yes, reindex yes, updated yes", Ask("FlagsOfA"));
     EXPECT_FALSE(StatusMgr::Resume());
     EXPECT_EQ(kBusy, Left());
 }
