@@ -78,7 +78,7 @@ Function Fills(bool (*function)(Out &, Text)) {
 }
 
 Function LocationFrom(int (*get)(const char *, char *, int)) {
-    return [get](Text share) {
+    return [get](Text share) -> std::string {
         std::array<char, 4096> path{};
         return get(share.c_str(), path.data(), path.size()) < 0 ? "no" : path.data();
     };
@@ -110,7 +110,7 @@ std::string PauseInfo(Text /*unused*/) {
 
 std::string Governor(Text path) {
     const Json::Value governor = GetMostSuitableCfg(Listed(), path);
-    return governor == Json::Value(Json::objectValue) ? "none" : Print(governor["path"]);
+    return governor.isObject() && governor.empty() ? "none" : Print(governor["path"]);
 }
 
 std::string PathsOfShare(Text share) {
@@ -191,8 +191,8 @@ std::string FlagsOfA(Text /*unused*/) {
 }
 
 const std::map<std::string, Function> kFunctions = {
-    {"AddCustomEvent", [](Text path) { return YesNo(AddCustomEvent(1, path, Json::Value())); }},
     {"Add", Asks(IndexMgr::Add)},
+    {"AddCustomEvent", [](Text path) { return YesNo(AddCustomEvent(1, path, Json::Value())); }},
     {"Additional", Additional},
     {"CanFullPathBeIndexed", Asks(CanFullPathBeIndexed)},
     {"CanPathBeIndexed", Asks(CanPathBeIndexed)},

@@ -81,14 +81,10 @@ std::string TestPath(const std::string &name) {
     return std::string(sources != nullptr ? sources : ".") + "/tests/unit/" + name;
 }
 
-std::string TestData(const std::string &name) {
-    return ReadFile(TestPath(name));
-}
-
-void ExpectTestData(const std::string &name, const std::string &found) {
-    EXPECT_EQ(TestData(name), found);
+void ExpectContent(const std::string &path, const std::string &found) {
+    EXPECT_EQ(ReadFile(path), found);
     if (std::getenv("REWRITE") != nullptr) {
-        WriteFile(TestPath(name), found);
+        WriteFile(path, found);
     }
 }
 
@@ -131,7 +127,8 @@ void FileIndexTest::TearDown() {
 }
 
 void FileIndexTest::Given(const std::string &line) {
-    const auto [what, text] = Split(line);
+    const std::string what = Split(line).first;
+    const std::string text = Split(line).second;
     if (what.ends_with(".conf")) {
         WriteFile(std::string(kConfigDir) + "/" + what, text);
         return;

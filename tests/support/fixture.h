@@ -52,9 +52,9 @@ std::string Decoded(const std::string &text);  ///< of a line that is a JSON str
 std::string Ask(const std::string &call);
 
 std::string ReadFile(const std::string &path);  ///< "(missing)" when there is no file
-std::string TestData(const std::string &name);  ///< a file below tests/unit
-/// Where REWRITE is set in the environment, the file is made what was found.
-void ExpectTestData(const std::string &name, const std::string &found);
+std::string TestPath(const std::string &name);  ///< of a file in tests/unit
+/// Where REWRITE is set in the environment, the file gets what was found: for deliberate changes.
+void ExpectContent(const std::string &path, const std::string &found);
 void WriteFile(const std::string &path, const std::string &text);
 
 struct stat StatusOf(const std::string &path);

@@ -100,7 +100,7 @@ protected:
     std::string With(const Fault &fault) {
         Furnish();
         Fail(fault);
-        const std::string outcome = AskAlone(call_);
+        std::string outcome = AskAlone(call_);
         EXPECT_THAT(Script::Current().Finish(), IsEmpty());
         return outcome;
     }
@@ -174,7 +174,7 @@ protected:
 
 TEST_F(Failures, OfEachCallEndAsTheTableSays) {
     daemon_.Start();
-    std::istringstream parts(TestData("failures.txt"));
+    std::istringstream parts(ReadFile(TestPath("failures.txt")));
     std::string tables;
     for (std::string line; std::getline(parts, line);) {
         if (line.starts_with("== ")) {
@@ -186,7 +186,7 @@ TEST_F(Failures, OfEachCallEndAsTheTableSays) {
             tables += Table() + "\n";
         }
     }
-    ExpectTestData("failures.txt", tables);
+    ExpectContent(TestPath("failures.txt"), tables);
 }
 
 }  // namespace

@@ -9,6 +9,7 @@
 #include "fixture.h"
 
 #include <filesystem>
+#include <set>
 #include <sstream>
 #include <string>
 
@@ -17,7 +18,7 @@ namespace fs = std::filesystem;
 namespace fileindex_test {
 namespace {
 
-class Transcripts : public FileIndexTest, public testing::WithParamInterface<const char *> {
+class Transcripts : public FileIndexTest, public testing::WithParamInterface<std::string> {
 protected:
     void SetUp() override {
         FileIndexTest::SetUp();
@@ -46,9 +47,9 @@ protected:
 };
 
 TEST_P(Transcripts, AreTrue) {
-    const std::string file = std::string("transcripts/") + GetParam() + ".txt";
+    const std::string file = TestPath("transcripts/" + GetParam() + ".txt");
     std::string found;
-    std::istringstream lines(TestData(file));
+    std::istringstream lines(ReadFile(file));
     for (std::string line; std::getline(lines, line);) {
         if (line.starts_with("  ")) {
             continue;
@@ -61,13 +62,18 @@ TEST_P(Transcripts, AreTrue) {
         }
         found += "\n";
     }
-    ExpectTestData(file, found);
+    ExpectContent(file, found);
 }
 
-INSTANTIATE_TEST_SUITE_P(Of, Transcripts,
-                         testing::Values("paths", "places", "folders", "documents", "listing", "progress",
-                                         "queues", "requests"),
-                         [](const auto &info) { return info.param; });
+std::set<std::string> Names() {
+    std::set<std::string> names;
+    for (const auto &entry : fs::directory_iterator(TestPath("transcripts"))) {
+        names.insert(entry.path().stem());
+    }
+    return names;
+}
+
+INSTANTIATE_TEST_SUITE_P(Of, Transcripts, testing::ValuesIn(Names()), [](const auto &info) { return info.param; });
 
 }  // namespace
 }  // namespace fileindex_test
