@@ -1,22 +1,81 @@
-// Generates texts that are JSON or nearly so: to check them at once, or as the seeds of the fuzz targets.
-//
-//   fuzz_generated check COUNT [SEED]    COUNT lines, folder files and documents, and some queues
-//   fuzz_generated seeds DIR             files below DIR/TARGET, and the dictionary DIR/dictionary
+// Generates texts of a grammar: checks so many lines, folder files and documents and some queues, or writes so
+// many texts into a directory as seeds of the fuzz targets.
 
-#include "json_checks.h"
-#include "near_valid.h"
-#include "queue_checks.h"
-#include "support.h"
+#include "checks.h"
 
 #include <cstdio>
-#include <cstdlib>
-#include <filesystem>
 #include <fstream>
-#include <string>
+#include <iterator>
+#include <map>
+#include <random>
+#include <sstream>
+#include <vector>
 
 namespace {
 
 using namespace fileindex_fuzz;  // NOLINT(google-build-using-namespace): this is their program
+
+using Grammar = std::map<std::string, std::vector<std::string>>;  ///< forms by name
+
+Grammar ReadGrammar(const char *path) {
+    Grammar grammar;
+    std::ifstream file(path);
+    for (std::string line, name; std::getline(file, line);) {
+        std::istringstream words(line);
+        words >> name;  // "#" is the name of the comments, which no form names
+        std::vector<std::string> &forms = grammar[name];
+        forms.insert(forms.end(), std::istream_iterator<std::string>(words), {});
+    }
+    return grammar;
+}
+
+/// Random texts, the same for the same seed.
+class Generator {
+public:
+    Generator(const Grammar &grammar, unsigned long seed) : grammar_(grammar), random_(seed) {}
+
+    std::size_t Below(std::size_t bound) { return random_() % bound; }
+    bool OneIn(std::size_t n) { return Below(n) == 0; }
+
+    std::string Text(const std::string &name) {
+        const std::string rare = name + "|";
+        const std::vector<std::string> &forms = grammar_.at(grammar_.contains(rare) && OneIn(10) ? rare : name);
+        const std::string &form = forms[Below(forms.size())];
+        std::string text;
+        for (std::size_t i = 0; i < form.size(); ++i) {
+            if (form[i] == '$') {
+                text += Text({form[++i]});
+            } else if (form[i] == '%') {
+                text += static_cast<char>(std::stoi(form.substr(i + 1, 2), nullptr, 16));
+                i += 2;
+            } else {
+                text += form[i];
+                const bool mayStandBeforeBlank = std::string_view("[{,:").find(form[i]) != std::string_view::npos;
+                text += mayStandBeforeBlank && OneIn(12) ? Text("w") : "";
+            }
+        }
+        return text;
+    }
+
+    /// One in four is broken somewhere.
+    std::string MaybeSpoilt(const std::string &name) {
+        std::string text = Text(name);
+        if (text.empty() || !OneIn(4)) {
+            return text;
+        }
+        const std::size_t at = OneIn(8) ? 0 : Below(text.size() + 1);
+        const std::size_t replaced = Below(2);
+        if (OneIn(3)) {
+            return text.substr(0, at);
+        }
+        return text.replace(at, replaced,
+                            OneIn(3) ? std::string(1, static_cast<char>(Below(256))) : Text(OneIn(2) ? "q" : "t"));
+    }
+
+private:
+    const Grammar &grammar_;
+    std::mt19937_64 random_;
+};
 
 /// Queues with a line of just about the sizes at which the reader's buffer ends, and the longest line.
 void CheckLongLines() {
@@ -33,80 +92,44 @@ void CheckLongLines() {
     }
 }
 
-int Check(unsigned long count, unsigned long seed) {
-    constexpr unsigned kTextsOfARound = 3;
-    const unsigned long rounds = count / kTextsOfARound;
-    CheckLongLines();
-    unsigned long events = 0;
-    unsigned long folders = 0;
-    unsigned long documents = 0;
-    for (unsigned long i = 0; i < rounds; ++i) {
-        NearValid next(seed + i);
-        events += CheckEvent(next.QueueLine()) ? 1 : 0;
-        folders += CheckFolders(next.FolderConf()) ? 1 : 0;
-        documents += CheckWriter(next.Document()) ? 1 : 0;
-        if (i % 10 == 0) {
-            const std::string queue = next.Queue();
+void Check(const Grammar &grammar, unsigned long count) {
+    struct {
+        const char *name;
+        const char *what;
+        bool (*check)(std::string_view);
+        unsigned long decided = 0;
+    } subjects[] = {
+        {"Q", "queue lines", CheckEvent}, {"F", "folder files", CheckFolders}, {"D", "documents", CheckWriter}};
+    for (unsigned long i = 0; i < count; ++i) {
+        Generator next(grammar, i);
+        auto &subject = subjects[i % std::size(subjects)];
+        subject.decided += subject.check(next.MaybeSpoilt(subject.name)) ? 1 : 0;
+        if (i % 32 == 0) {
+            const std::string queue = next.MaybeSpoilt("M");
             CheckQueue(queue, next.Below(queue.size() + 1));
         }
     }
-    std::printf("%lu texts: the fast reader decided %lu lines and %lu folder files; %lu documents were written\n",
-                count, events, folders, documents);
-    // A comparison that hardly ever takes place shows nothing.
-    const unsigned long enough = rounds / 10;
-    Require(events > enough && folders > enough && documents > enough, "too little was compared");
-    return 0;
-}
-
-int Seeds(const std::string &dir) {
-    using Make = std::string (NearValid::*)();
-    const struct {
-        const char *target;
-        Make make;
-    } rows[] = {
-        {"json_differential", &NearValid::QueueLine},
-        {"json_differential", &NearValid::FolderConf},
-        {"json_differential", &NearValid::Document},
-        {"queue_file", &NearValid::Queue},
-        {"folder_conf", &NearValid::FolderConf},
-        {"status_conf", &NearValid::Document},
-        {"requests", &NearValid::FolderConf},
-        {"paths", &NearValid::QueueLine},
-        {"operations", &NearValid::Queue},
-    };
-    constexpr unsigned kSeeds = 40;
-    unsigned number = 0;
-    for (const auto &row : rows) {
-        const std::filesystem::path corpus = std::filesystem::path(dir) / row.target;
-        std::filesystem::create_directories(corpus);
-        for (unsigned i = 0; i < kSeeds; ++i, ++number) {
-            NearValid next(number);
-            std::ofstream(corpus / ("seed" + std::to_string(number)), std::ios::binary) << (next.*row.make)();
-        }
+    for (const auto &subject : subjects) {
+        std::printf("%lu of %lu %s compared\n", subject.decided, count / std::size(subjects), subject.what);
+        Require(subject.decided > count / 32, "so little shows nothing");
     }
-    std::ofstream dictionary(dir + "/dictionary");
-    for (const char *word : {"event", "path", "path_old", "data", "name", "document", "audio", "video", "photo",
-                             "resume_time", "no_space", "need_reindex"}) {
-        dictionary << "\"\\\"" << word << "\\\":\"\n";
-    }
-    for (const char *word :
-         {"/photo", "/a/d", "/b", "/ro", "/away", "/vol1/a", "@eaDir", "/vol1/a/#recycle", "/vol1/a/#snapshot",
-          "65536", "true", "false", "null", "\\\\ud83d", "\\xef\\xbb\\xbf"}) {
-        dictionary << '"' << word << "\"\n";
-    }
-    return dictionary.good() ? 0 : 1;
 }
 
 }  // namespace
 
 int main(int argc, char **argv) {
-    const std::string mode = argc >= 3 ? argv[1] : "";
-    if (mode == "check") {
-        return Check(std::strtoul(argv[2], nullptr, 10), argc > 3 ? std::strtoul(argv[3], nullptr, 10) : 1);
+    if (argc < 3) {
+        std::fputs("usage: fuzz_generated GRAMMAR COUNT [DIRECTORY]\n", stderr);
+        return 2;
     }
-    if (mode == "seeds") {
-        return Seeds(argv[2]);
+    const Grammar grammar = ReadGrammar(argv[1]);
+    const unsigned long count = std::stoul(argv[2]);
+    if (argc == 3) {
+        CheckLongLines();
+        Check(grammar, count);
     }
-    std::fputs("usage: fuzz_generated check COUNT [SEED] | seeds DIR\n", stderr);
-    return 2;
+    for (unsigned long i = 0; argc > 3 && i < count; ++i) {
+        std::ofstream(argv[3] + ("/" + std::to_string(i))) << Generator(grammar, i).MaybeSpoilt({"QMFDUT"[i % 6]});
+    }
+    return 0;
 }

@@ -1,166 +1,291 @@
 // A sequence of operations on the library and on a model in memory: after each of them folder.conf, status.conf,
 // the queues and the daemon's commands are those of the model.
 
+#include "checks.h"
 #include "json/text.h"
-#include "model.h"
 #include "names.h"
-#include "support.h"
 
 #include <fileindex/index_mgr.h>
 #include <fileindex/status_mgr.h>
 
 #include <fuzzer/FuzzedDataProvider.h>
 
+#include <algorithm>
 #include <iterator>
-#include <string>
+#include <map>
+#include <set>
+#include <utility>
+#include <vector>
+
+namespace fileindex_fuzz {
 
 namespace {
 
-using namespace fileindex_fuzz;  // NOLINT(google-build-using-namespace): this is their program
 using VORK::FILEINDEX::IndexMgr;
 using VORK::FILEINDEX::StatusMgr;
 namespace names = VORK::FILEINDEX::internal;
 
 constexpr const char *kPaths[] = {"/a", "/a/d", "/a/d/e", "/a/dd", "/b", "/b/d", "/photo/d", "/ro", "/away/d"};
 constexpr const char *kNames[] = {"a", "b", "photo", "ro", "away"};
-constexpr const char *kMarkers[] = {"upgrade_1", "upgrade_2"};
+constexpr char kReindex[] = "65536";
+constexpr char kSetting[] = "131072";
 
-Json::Value SomeRecord(FuzzedDataProvider &input) {
-    Json::Value record(Json::objectValue);
-    record["path"] = input.PickValueInArray(kPaths);
-    for (const char *flag : names::kMediaKeys) {
-        if (input.ConsumeBool()) {
-            record[flag] = input.ConsumeBool();
-        }
+/// The record of the last folder in the list that covers the path; null when none does.
+Json::Value Governing(const Json::Value &folders, const std::string &path) {
+    Json::Value found;
+    for (const std::string &folder : folders.getMemberNames()) {
+        found = (path + "/").starts_with(folder + "/") ? folders[folder] : found;
     }
-    if (input.ConsumeBool()) {
-        record["name"] = input.ConsumeRandomLengthString(8);
-    }
-    return record;
+    return found;
 }
 
-Json::Value SomePaths(FuzzedDataProvider &input, std::size_t choices) {
+Json::Value Report(const Json::Value &before, const Json::Value &after) {
+    Json::Value report;
+    for (const char *flag : names::kMediaKeys) {
+        report[flag] = before.isNull() || after.isNull() || before[flag] != after[flag];
+    }
+    return report;
+}
+
+/// The report; null when the share is not known, and `folders` is then of no use.
+Json::Value Put(Json::Value &folders, const Json::Value &element) {
+    const std::string path = element["path"].asString();
+    const Json::Value before = Governing(folders, path);
+    Json::Value &record = folders[path];
+    record["path"] = path;
+    record["name"] = element.get("name", record.get("name", ""));
+    for (const char *flag : names::kMediaKeys) {
+        record[flag] = element.get(flag, record.get(flag, false));
+    }
+    const bool known = std::count(std::begin(kShares), std::end(kShares), ShareOf(path)) > 0;
+    return known ? Report(before, record) : Json::Value();
+}
+
+/// A line of a queue.
+std::string Line(const char *type, const std::string &path, const Json::Value &data) {
+    return R"({"data":)" + names::ToString(data) + R"(,"event":)" + type + R"(,"path":"/vol1)" + path + "\"}\n";
+}
+
+Json::Value PathsOf(const Json::Value &records) {
     Json::Value paths(Json::arrayValue);
-    for (auto left = input.ConsumeIntegralInRange(0, 3); left > 0; --left) {
-        paths.append(kPaths[input.ConsumeIntegralInRange<std::size_t>(0, choices - 1)]);
+    for (const Json::Value &record : records) {
+        paths.append(record["path"]);
     }
     return paths;
 }
 
-bool StepFolders(FuzzedDataProvider &input, Model &model, int operation) {
-    Json::Value request(Json::arrayValue);
-    switch (operation) {
-        case 0:
-            for (auto left = input.ConsumeIntegralInRange(0, 3); left > 0; --left) {
-                request.append(SomeRecord(input));
-            }
-            return IndexMgr::Upsert(request) == model.Upsert(request);
-        case 1:
-            request = SomePaths(input, std::size(kPaths) - 1);  // a share that is away has no event: see the tests
-            return IndexMgr::Delete(request) == model.Delete(request);
-        case 2:
-            request = SomePaths(input, std::size(kPaths));
-            return IndexMgr::Reindex(request) == model.Reindex(request);
-        case 3: {
-            const std::string from = input.PickValueInArray(kNames);
-            const std::string to = input.PickValueInArray(kNames);
-            return IndexMgr::ShareRename(from, to) == model.ShareRename(from, to);
-        }
-        default: {
-            const std::string share = input.PickValueInArray(kNames);
-            return IndexMgr::ShareRemove(share) == model.ShareRemove(share);
+/// What the operations mean, in documents and texts: the files, the queues and the commands as they have to be.
+struct Model {
+    Json::Value folders{Json::objectValue};
+    Json::Value status{Json::objectValue};
+    std::map<std::string, std::string> queues;  ///< by share
+    std::string commands;
+
+    std::vector<std::string> FoldersOf(const std::string &share) const {
+        std::vector<std::string> paths = folders.getMemberNames();
+        std::erase_if(paths, [&](const std::string &path) { return ShareOf(path) != share; });
+        return paths;
+    }
+
+    void Command(const char *type, const char *key = "", const std::string &value = "") {
+        commands += std::string(R"({"data":{)") + key + value + R"(},"type":")" + type + "\"}\n";
+    }
+
+    void Event(const char *type, const std::string &path, const Json::Value &data) {
+        std::string &queue = queues[ShareOf(path)];
+        if (queue.find(Line(kReindex, path, {})) == std::string::npos) {
+            queue += Line(type, path, data);
         }
     }
+
+    void ReportChanges(const char *command, const Json::Value &paths, const Json::Value &reports) {
+        for (const Json::Value &path : paths) {
+            Command(command, R"("folder_path":)", names::ToString(path));
+        }
+        for (const std::string &path : reports.getMemberNames()) {
+            Event(kSetting, path, reports[path]);
+        }
+    }
+
+    bool Upsert(const Json::Value &request) {
+        Json::Value changed = folders;
+        Json::Value reports;
+        for (const Json::Value &element : request) {
+            Json::Value &report = reports[element["path"].asString()];
+            report = Put(changed, element);
+            if (report.isNull()) {
+                return false;
+            }
+        }
+        folders = changed;
+        ReportChanges("upsert_folder_setting", PathsOf(request), reports);
+        return true;
+    }
+
+    bool Delete(const Json::Value &paths) {
+        Json::Value reports;
+        for (const Json::Value &element : paths) {
+            const std::string path = element.asString();
+            const Json::Value before = Governing(folders, path);
+            folders.removeMember(path);
+            reports[path] = Json::Value(Json::objectValue);
+            reports[path][path] = Report(before, Governing(folders, path));
+        }
+        if (!folders.empty()) {
+            ReportChanges("delete_folder_setting", paths, reports);
+        }
+        for (const Json::Value &path : paths) {
+            const std::string share = ShareOf(path.asString());
+            if (FoldersOf(share).empty()) {
+                queues.erase(share);
+            }
+        }
+        return true;
+    }
+
+    bool Reindex(const Json::Value &paths) {
+        std::set<std::string> shares;
+        for (const Json::Value &path : paths) {
+            shares.insert(ShareOf(path.asString()));
+            if (FoldersOf(ShareOf(path.asString())).empty()) {
+                return false;
+            }
+        }
+        for (const std::string &share : std::as_const(status)["no_space"].getMemberNames()) {
+            if (shares.contains(share)) {
+                Revive(share);
+            }
+        }
+        for (const Json::Value &path : paths) {
+            Event(kReindex, path.asString(), {});
+        }
+        return true;
+    }
+
+    bool ShareRename(const std::string &from, const std::string &to) {
+        Json::Value changed = folders;
+        for (const std::string &path : FoldersOf(from)) {
+            Json::Value record = folders[path];
+            record["path"] = "/" + to + path.substr(1 + from.size());
+            changed.removeMember(path);
+            if (Put(changed, record).isNull()) {
+                return false;
+            }
+        }
+        folders = changed;
+        return true;
+    }
+
+    void SetFlag(const char *key, const std::string &share, bool set) {
+        Json::Value &marked = status[key];  // comes into being in any case
+        if (set) {
+            marked[share] = true;
+        } else {
+            marked.removeMember(share);
+        }
+    }
+
+    void Revive(const std::string &share) {
+        SetFlag("no_space", share, false);
+        Command("revive_share_worker", R"("share_name":)", '"' + share + '"');
+    }
+};
+
+Json::Value SomeRecords(FuzzedDataProvider &input, int most) {
+    Json::Value records(Json::arrayValue);
+    for (auto left = input.ConsumeIntegralInRange(0, most); left > 0; --left) {
+        Json::Value &record = records.append(Json::objectValue);
+        record["path"] = input.PickValueInArray(kPaths);
+        for (const char *flag : names::kMediaKeys) {
+            if (input.ConsumeBool()) {
+                record[flag] = input.ConsumeBool();
+            }
+        }
+        if (input.ConsumeBool()) {
+            record["name"] = input.ConsumeRandomLengthString(8);
+        }
+    }
+    return records;
 }
 
-bool StepStatus(FuzzedDataProvider &input, Model &model, int operation) {
+/// Do the library and the model give the same answer?
+bool Step(FuzzedDataProvider &input, Model &model, int operation) {
     const std::string share = input.PickValueInArray(kNames);
+    const std::string to = input.PickValueInArray(kNames);
     const bool set = input.ConsumeBool();
+    const Json::Value records = SomeRecords(input, operation < 3 ? 3 : 0);
+    const Json::Value paths = PathsOf(records);
     switch (operation) {
         case 0:
-            model.Command("pause", "resume_time", 0);
+            return IndexMgr::Upsert(records) == model.Upsert(records);
+        case 1:  // a share that is away has no event: see the tests
+            return names::ToString(paths).find("away") != std::string::npos ||
+                   IndexMgr::Delete(paths) == model.Delete(paths);
+        case 2:
+            return IndexMgr::Reindex(paths) == model.Reindex(paths);
+        case 3:
+            return IndexMgr::ShareRename(share, to) == model.ShareRename(share, to);
+        case 4:
+            for (const std::string &path : model.FoldersOf(share)) {
+                model.folders.removeMember(path);
+            }
+            return IndexMgr::ShareRemove(share);
+        case 5:
+            model.Command("pause", R"("resume_time":0)");
             model.status["resume_time"] = 0;
             return StatusMgr::Pause(0) && !StatusMgr::Pause(-1);
-        case 1:
+        case 6:
             model.Command("resume");
             model.status["resume_time"] = -1;
             return StatusMgr::Resume();
-        case 2:
+        case 7:
             model.SetFlag("no_space", share, set);
             return StatusMgr::ShareSetNoSpace(share, set) && StatusMgr::ShareIsNoSpace(share) == set;
-        case 3:
+        case 8:
             model.SetFlag("need_reindex", share, set);
             return StatusMgr::ShareSetNeedReindex(share, set) && StatusMgr::ShareIsNeedReindex(share) == set;
-        case 4:
-            model.SetFlag("no_space", share, false);
-            model.Command("revive_share_worker", "share_name", share);
+        case 9:
+            model.Revive(share);
             return StatusMgr::ShareRevive(share);
-        case 5: {
-            const std::string marker = input.PickValueInArray(kMarkers);
-            model.status[marker] = true;
-            return StatusMgr::SetUpdated(marker) && StatusMgr::IsUpdated(marker);
-        }
-        default: {
-            const bool known = share != "away";
-            model.Command("delete_share_worker", "share_name", share);
-            return IndexMgr::SharePause(share) == known;
-        }
+        case 10:
+            model.status["upgrade_" + to] = true;
+            return StatusMgr::SetUpdated("upgrade_" + to) && StatusMgr::IsUpdated("upgrade_" + to);
+        default:
+            model.Command("delete_share_worker", R"("share_name":)", '"' + share + '"');
+            return IndexMgr::SharePause(share) == (share != "away");
     }
 }
 
-Json::Value FileAsJson(const char *path) {
+void Compare(const char *what, const std::string &is, const std::string &expected) {
+    Require(is == expected, what, "\nis       " + is + "\nexpected " + expected);
+}
+
+std::string FileAsText(const char *path) {
     Json::Value document(Json::objectValue);
     const std::string text = ReadWhole(path);
     Require(text.empty() || names::JsonReader().Parse(text, document), "a broken file", text);
-    return document;
-}
-
-void Compare(const char *what, const Json::Value &is, const Json::Value &expected) {
-    Require(is == expected, what, "\nis       " + names::ToString(is) + "\nexpected " + names::ToString(expected));
-}
-
-Json::Value QueueAsJson(const std::string &share) {
-    Json::Value lines(Json::arrayValue);
-    const std::string text = ReadWhole(QueueOf(share));
-    for (std::size_t begin = 0, end = 0; begin < text.size(); begin = end + 1) {
-        end = text.find('\n', begin);
-        Json::Value line;
-        Require(end != std::string::npos && names::JsonReader().Parse(text.substr(begin, end - begin), line),
-                "a broken line", text);
-        lines.append(line);
-    }
-    return lines;
+    return names::ToString(document);
 }
 
 void CompareAll(Model &model) {
-    Compare("folder.conf differs", FileAsJson(names::kFolderConf), model.folders);
-    Compare("status.conf differs", FileAsJson(names::kStatusConf), model.status);
-    for (const std::string share : kShares) {
-        Compare("a queue differs", QueueAsJson(share), model.QueueOfShare(share));
+    Compare("folder.conf differs", FileAsText(names::kFolderConf), names::ToString(model.folders));
+    Compare("status.conf differs", FileAsText(names::kStatusConf), names::ToString(model.status));
+    for (const char *share : kShares) {
+        Compare("a queue differs", ReadWhole(QueueOf(share)), model.queues[share]);
     }
-    Json::Value commands(Json::arrayValue);
-    for (const Json::Value &command : TakeCommands()) {
-        commands.append(command);
-    }
-    Compare("the commands differ", commands, model.TakeCommands());
+    Compare("the commands differ", TakeCommands(), std::exchange(model.commands, {}));
 }
 
 }  // namespace
 
-extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
-    ResetMachine();
-    FuzzedDataProvider input(data, size);
+void FeedOperations(const std::string &bytes) {
+    FuzzedDataProvider input(reinterpret_cast<const std::uint8_t *>(bytes.data()), bytes.size());
     Model model;
-    const LeakCheck leaks;
-    constexpr int kMaxSteps = 16;
-    for (int step = 0; step < kMaxSteps && input.remaining_bytes() > 0; ++step) {
+    for (int step = 0; step < 16 && input.remaining_bytes() > 0; ++step) {
         const int operation = input.ConsumeIntegralInRange(0, 11);
-        constexpr int kFolderOperations = 5;
-        const bool agreed = operation < kFolderOperations
-                                ? StepFolders(input, model, operation)
-                                : StepStatus(input, model, operation - kFolderOperations);
-        Require(agreed, "the answer differs", std::to_string(operation));
+        Require(Step(input, model, operation), "the answer differs", std::to_string(operation));
         CompareAll(model);
     }
-    return 0;
 }
+
+}  // namespace fileindex_fuzz

@@ -1,44 +1,40 @@
-#include "support.h"
-
+#include "checks.h"
 #include "names.h"
-#include "scoped.h"
+#include "support/fake_daemon.h"
 #include "support/platform.h"
 #include "support/script.h"
 #include "support/syslog_capture.h"
 
-#include <fcntl.h>
-#include <sys/file.h>
-#include <unistd.h>
+#include <sys/socket.h>
 
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <optional>
+#include <utility>
 
 namespace fileindex_fuzz {
 
 namespace {
 
-using VORK::FILEINDEX::internal::UniqueFd;
 namespace names = VORK::FILEINDEX::internal;
+using fileindex_test::FakeDaemon;
 
-void RequireFree(const char *lockFile) {
-    const UniqueFd fd(open(lockFile, O_RDWR | O_CLOEXEC));
-    Require(!fd || flock(fd.Get(), LOCK_EX | LOCK_NB) == 0, "a lock is still held", lockFile);
+/// The library's end of the last connection.
+int &LastConnection() {
+    static int fd = -1;
+    return fd;
 }
 
 }  // namespace
 
 void Require(bool holds, const char *what, std::string_view about) {
-    if (holds) {
-        return;
+    if (!holds) {
+        std::fprintf(stderr, "FAILED: %s\nabout: %.*s\n", what, static_cast<int>(about.size()), about.data());
+        std::abort();
     }
-    std::fprintf(stderr, "FAILED: %s\n", what);
-    if (!about.empty()) {
-        std::fprintf(stderr, "about: %.*s\n", static_cast<int>(about.size()), about.data());
-    }
-    std::abort();
 }
 
 std::string ReadWhole(const std::string &path) {
@@ -48,47 +44,52 @@ std::string ReadWhole(const std::string &path) {
 
 void WriteWhole(const std::string &path, std::string_view text) {
     std::ofstream file(path, std::ios::binary | std::ios::trunc);
-    file.write(text.data(), static_cast<std::streamsize>(text.size()));
-    file.close();
+    file << text << std::flush;
     Require(file.good(), "cannot write; not run in its own file system?", path);
+}
+
+std::string ShareOf(const std::string &path) {
+    return path.empty() ? path : path.substr(1, path.find('/', 1) - 1);
 }
 
 std::string QueueOf(const std::string &share) {
     return "/vol1/" + share + "/" + names::kMetadataDir + "/" + names::kQueueFile;
 }
 
-void ForgetCalls() {
+void ResetMachine() {
     fileindex_test::Script::Current().Reset();
     fileindex_test::SyslogCapture::Clear();
-}
-
-void ResetMachine() {
-    ForgetCalls();
     auto &platform = fileindex_test::Platform::Current();
     platform = {};
     platform.searchOn = true;
     platform.recycleBins = {"/vol1/a/#recycle"};
     platform.snapshots = {"/vol1/a/#snapshot"};
-    for (const char *share : kShares) {
-        platform.shares[share] = {.path = std::string("/vol1/") + share,
-                                  .readOnly = std::string_view(share) == "ro"};
-    }
     std::remove(names::kFolderConf);
     std::remove(names::kStatusConf);
     for (const std::string share : kShares) {
-        std::remove(QueueOf(share).c_str());
-        std::remove((QueueOf(share) + names::kQueueTmpSuffix).c_str());
+        platform.shares[share] = {.path = "/vol1/" + share, .readOnly = share == "ro"};
+        std::filesystem::remove_all("/vol1/" + share + "/" + names::kMetadataDir);
         std::filesystem::create_directories("/vol1/" + share + "/d/e");
     }
     TakeCommands();
 }
 
-LeakCheck::LeakCheck() : lowest_free_(UniqueFd(dup(0)).Get()) {}
-
-LeakCheck::~LeakCheck() {
-    Require(UniqueFd(dup(0)).Get() == lowest_free_, "a descriptor is left open");
-    RequireFree(names::kFolderLock);
-    RequireFree(names::kStatusLock);
+std::string TakeCommands() {
+    static std::optional<FakeDaemon> daemon(std::in_place);
+    FakeDaemon::Closed(LastConnection());
+    std::string commands;
+    for (const std::string &effect : fileindex_test::Script::Current().Journal()) {
+        Require(!effect.starts_with("command malformed"), "not a command's frame", effect);
+        commands += effect.starts_with("command ") ? effect.substr(effect.find(' ') + 1) + '\n' : "";
+    }
+    fileindex_test::Script::Current().ClearJournal();
+    daemon.emplace().Start();
+    return commands;
 }
 
 }  // namespace fileindex_fuzz
+
+extern "C" int connect(int fd, const sockaddr *address, socklen_t) {
+    fileindex_test::FakeDaemon::Closed(std::exchange(fileindex_fuzz::LastConnection(), fd));
+    return fileindex_test::FakeDaemon::Connect(fd, address);
+}
