@@ -36,8 +36,6 @@ constexpr char kStatusLock[] = "/tmp/fileidx_cfg_status.lock";
 
 // What FileIndexTest::Left() says when nothing else went wrong.
 const std::string kBusy = "9 config.cpp Failed to lock folder";
-const std::string kFolderConfUnreadable = std::string("6 config.cpp Failed to load json from ") + kFolderConf;
-const std::string kFolderConfUnwritable = std::string("7 config.cpp Failed to save json to ") + kFolderConf;
 const std::string kStatusConfUnreadable = std::string("6 config.cpp Failed to load json from ") + kStatusConf;
 const std::string kStatusConfUnwritable = std::string("7 config.cpp Failed to save json to ") + kStatusConf;
 

@@ -32,10 +32,6 @@ LockAgent::LockAgent(const std::string &path)
     }
 }
 
-LockAgent::~LockAgent() {
-    Release();
-}
-
 void LockAgent::Release() {
     if (fd_ >= 0) {
         ::syscall(SYS_close, fd_);

@@ -14,7 +14,7 @@ std::set<std::string> OpenDescriptors();
 class LockAgent {
 public:
     explicit LockAgent(const std::string &path);
-    ~LockAgent();
+    ~LockAgent() { Release(); }
     LockAgent(const LockAgent &) = delete;
     LockAgent &operator=(const LockAgent &) = delete;
 

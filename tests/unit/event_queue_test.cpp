@@ -6,7 +6,6 @@
 #include <cerrno>
 #include <filesystem>
 #include <string>
-#include <vector>
 
 namespace fs = std::filesystem;
 

@@ -4,7 +4,6 @@
 #include <cerrno>
 #include <filesystem>
 #include <string>
-#include <vector>
 
 namespace fs = std::filesystem;
 

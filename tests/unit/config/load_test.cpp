@@ -2,7 +2,6 @@
 #include "fixture.h"
 
 #include <sys/stat.h>
-#include <unistd.h>
 
 #include <cerrno>
 #include <filesystem>
