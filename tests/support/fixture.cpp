@@ -82,10 +82,10 @@ std::string TestPath(const std::string &name) {
 }
 
 void ExpectContent(const std::string &path, const std::string &found) {
-    EXPECT_EQ(ReadFile(path), found);
     if (std::getenv("REWRITE") != nullptr) {
         WriteFile(path, found);
     }
+    EXPECT_EQ(ReadFile(path), found);
 }
 
 void WriteFile(const std::string &path, const std::string &text) {
