@@ -4,13 +4,16 @@
 #include <iostream>
 #include <string>
 
+using VORK::FILEINDEX::ErrorHandler;
 using VORK::FILEINDEX::StatusMgr;
 
 int main() {
-    // False with the pause saved all the same, when the daemon could not be told: it reads the file when it
+    // A failure without a code: the pause is saved, but the daemon could not be told. It reads the file when it
     // starts.
+    ErrorHandler::SetError(VORK::FILEINDEX::FILEINDEX_ERR_NONE);
     if (!StatusMgr::Pause(8)) {
-        std::cout << "the daemon was not told\n";
+        const bool saved = ErrorHandler::GetError() == VORK::FILEINDEX::FILEINDEX_ERR_NONE;
+        std::cout << (saved ? "saved, the daemon was not told\n" : "the pause could not be saved\n");
     }
 
     long long resumeTime = -1;
