@@ -1,6 +1,6 @@
 /// \file
-/// Fixed paths, keys, limits and codes that other parties know as well. What one function alone spells out for a call,
-/// such as the arguments of the notification tool, stands there.
+/// Fixed paths, keys, limits and codes that other parties know as well. What one function alone spells out for a
+/// call, such as the arguments of the notification tool, stands there.
 #ifndef FILEINDEX_SRC_NAMES_H
 #define FILEINDEX_SRC_NAMES_H
 
