@@ -39,7 +39,8 @@ int InvalidArgument(const char *condition, int line) {
 /// Makes the share's metadata directory and sets `location` to its entry `leaf`. A directory that cannot be made
 /// is not fatal: the caller meets the problem where it matters, when it opens the file.
 ///
-/// The share's record, for the caller to hold until all is done, or null: an unknown share, which is recorded.
+/// Returns the share's record, which the caller holds until all is done; null, and a log record, for an unknown
+/// share.
 Share Locate(std::string &location, const char *shareName, const char *leaf, const RecordLines &lines) {
     Share share = FindShare(shareName);
     if (!share) {
