@@ -86,7 +86,7 @@ std::optional<State> StateOf(const std::string &path) {
     if (found->isRemote || IsSurelyPlain(found->path)) {
         return State::kPlain;
     }
-    const Descriptor directory(open(found->path.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+    const Descriptor directory = Open(found->path.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
     if (!directory) {
         return std::nullopt;
     }

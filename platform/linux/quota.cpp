@@ -62,7 +62,7 @@ int WhyNot(unsigned int uid, const char *path, uint64_t required) {
     if (place->isRemote) {
         return VORK_ERR_IO;  // asking could hang
     }
-    const Descriptor volume(open(place->path.c_str(), O_RDONLY | O_NONBLOCK | O_NOFOLLOW | O_CLOEXEC));
+    const Descriptor volume = Open(place->path.c_str(), O_RDONLY | O_NONBLOCK | O_NOFOLLOW | O_CLOEXEC);
     if (!volume) {
         return CodeOfErrno(errno);
     }

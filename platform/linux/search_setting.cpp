@@ -51,7 +51,7 @@ int VORKSMBIsEnableSpotlight(void) try {
 }
 
 int VORKSMBSetSpotlight(int enable) try {
-    const std::optional<Descriptor> lock = TakeLock(std::string(kPlatformFile) + ".lock");
+    const std::optional<FileLock> lock = TakeLock(std::string(kPlatformFile) + ".lock");
     if (!lock) {
         return FailErrno(errno);
     }

@@ -22,10 +22,14 @@ enum {
     VORK_ERR_IO = 0x0900,
     VORK_ERR_TIMEOUT = 0x0A00,
     VORK_ERR_MALFORMED = 0x0B00,
+    VORK_ERR_REGISTRATIONS = 0x0B01, /**< what the notification daemon's registrations are kept in is malformed */
     VORK_ERR_NO_SUCH_SHARE = 0x1400,
     VORK_ERR_SHARE_DIRECTORY_NAME = 0x1401, /**< a share whose directory does not bear its name */
     VORK_ERR_NO_SUCH_SERVICE = 0x1500,
     VORK_ERR_SERVICE = 0x1501,
+    VORK_ERR_UNIT_FAILED = 0x1502,  /**< systemd refused, or the unit failed: its journal tells */
+    VORK_ERR_UNIT_MASKED = 0x1503,  /**< the administrator has masked the unit */
+    VORK_ERR_UNIT_TIMEOUT = 0x1504, /**< systemd has not done it in time, and may still do it */
     VORK_ERR_EXEC = 0x1600
 };
 

@@ -27,7 +27,10 @@ int VORKFSIsRemoteFS(int type);
 /** Non-zero for the codes of image file systems: read-only images and loop mounts of files kept in a share. */
 int VORKFSIsImageFS(int type);
 
-/** 1 when the path is the root of a mount, 0 when not, negative on failure. */
+/**
+ * 1 when the path is the root of a mount, 0 when not, negative on failure. 0 also for the directory of a share: a
+ * disk of its own is what many shares have, and no reason to leave one out.
+ */
 int VORKFSDirIsMntPoint(const char *szPath);
 
 /**

@@ -6,7 +6,8 @@
  * The library holds a lock for which others wait no more than 30 ms: every call is bounded to ten seconds,
  * whatever the service does. Negative on failure, with the platform error set: VORK_ERR_NO_SUCH_SERVICE for an
  * unknown service, VORK_ERR_TIMEOUT for one that took longer (its start may still succeed), VORK_ERR_SERVICE for
- * one that refused.
+ * one that refused. Under systemd, which writes down why, these two are VORK_ERR_UNIT_TIMEOUT and
+ * VORK_ERR_UNIT_FAILED, or VORK_ERR_UNIT_MASKED for a unit that is masked.
  */
 #ifndef VORK_SERVICE_H
 #define VORK_SERVICE_H

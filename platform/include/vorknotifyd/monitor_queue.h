@@ -34,10 +34,13 @@ public:
     MonitorQueue &operator=(const MonitorQueue &) = delete;
 
     /// Creates the registration `name` of the queue, or replaces it whole. False, with the platform error set
-    /// and the former registration in place, when the description is malformed or cannot be stored.
+    /// and the former registration in place, when the description is malformed or cannot be stored:
+    /// VORK_ERR_REGISTRATIONS when the registrations there are cannot be understood, which somebody must set
+    /// right.
     static bool Upsert(const MonitorQueue &queue, const std::string &name, _tag_monitor_queue_type_ type);
 
     /// Withdraws the registration `name` that feeds `queuePath`; one that does not exist counts as withdrawn.
+    /// Result as above.
     static bool Delete(const std::string &queuePath, const std::string &name, _tag_monitor_queue_type_ type);
 
 private:

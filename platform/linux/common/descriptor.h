@@ -2,6 +2,9 @@
 #ifndef PLATFORM_LINUX_COMMON_DESCRIPTOR_H
 #define PLATFORM_LINUX_COMMON_DESCRIPTOR_H
 
+#include "common/cancellation.h"
+
+#include <fcntl.h>
 #include <unistd.h>
 
 #include <utility>
@@ -13,6 +16,7 @@ public:
     explicit Descriptor(int fd = -1) : fd_(fd) {}
     ~Descriptor() {
         if (fd_ >= 0) {
+            const CancellationOff guard;
             close(fd_);
         }
     }
@@ -29,6 +33,17 @@ public:
 private:
     int fd_;
 };
+
+/// Opens; a cancellation waits until the descriptor has its owner, or it could leave it open for ever.
+inline Descriptor OpenAt(int directory, const char *path, int flags, mode_t mode = 0) {
+    const CancellationOff guard;
+    return Descriptor(openat(directory, path, flags, mode));
+}
+
+inline Descriptor Open(const char *path, int flags, mode_t mode = 0) {
+    const CancellationOff guard;
+    return Descriptor(open(path, flags, mode));
+}
 
 }  // namespace VORK::PLATFORM
 

@@ -53,7 +53,7 @@ bool TakeOverModeAndOwner(int fd, const std::string &path, mode_t modeIfNew) {
 
 bool WriteTemporary(const std::string &temporary, const std::string &target, const std::string &text,
                     mode_t modeIfNew) {
-    const Descriptor file(open(temporary.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_NOFOLLOW | O_CLOEXEC, 0600));
+    const Descriptor file = Open(temporary.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_NOFOLLOW | O_CLOEXEC, 0600);
     if (!file) {
         return false;
     }
@@ -63,8 +63,8 @@ bool WriteTemporary(const std::string &temporary, const std::string &target, con
 
 // Makes the rename itself durable. The new text is in place whatever comes of it.
 void SyncDirectoryOf(const std::string &path) {
-    const Descriptor directory(
-        open(path.substr(0, path.rfind('/') + 1).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    const Descriptor directory =
+        Open(path.substr(0, path.rfind('/') + 1).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
     if (directory) {
         fsync(directory.Get());
     }
@@ -96,7 +96,7 @@ std::optional<std::string> ReadAll(int fd) {
 
 std::optional<std::string> ReadFile(const std::string &path) {
     // Non-blocking, so that a pipe in the file's place holds nobody up.
-    const Descriptor file(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
+    const Descriptor file = Open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
     if (!file) {
         return std::nullopt;
     }
@@ -138,8 +138,14 @@ bool ReplaceFile(const std::string &path, const std::string &text, unsigned int 
     return false;
 }
 
-std::optional<Descriptor> TakeLock(const std::string &lockPath) {
-    Descriptor file(open(lockPath.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0600));
+FileLock::~FileLock() {
+    if (file_) {
+        flock(file_.Get(), LOCK_UN);
+    }
+}
+
+std::optional<FileLock> TakeLock(const std::string &lockPath) {
+    Descriptor file = Open(lockPath.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0600);
     if (!file) {
         return std::nullopt;
     }
@@ -154,7 +160,7 @@ std::optional<Descriptor> TakeLock(const std::string &lockPath) {
         }
         std::this_thread::sleep_for(kLockRetry);
     }
-    return file;
+    return FileLock(std::move(file));
 }
 
 }  // namespace VORK::PLATFORM

@@ -8,6 +8,7 @@
 
 #include <optional>
 #include <string>
+#include <utility>
 
 namespace VORK::PLATFORM {
 
@@ -31,9 +32,22 @@ std::string FormatDocument(const Json::Value &document);
 /// The temporary file beside it has a fixed name, so that a crash leaves no more than one: hold the lock.
 bool ReplaceFile(const std::string &path, const std::string &text, unsigned int mode);
 
+/// A lock that was taken. It is given up by name at the end: a child that the host forked meanwhile may have a
+/// copy of the descriptor, and closing ours alone would leave the lock with the child.
+class FileLock {
+public:
+    explicit FileLock(Descriptor file) : file_(std::move(file)) {}
+    FileLock(FileLock &&) noexcept = default;
+    FileLock &operator=(FileLock &&) = delete;
+    ~FileLock();
+
+private:
+    Descriptor file_;
+};
+
 /// Takes the exclusive lock on the lock file, making the file when needed. Waits two seconds at most: the
 /// callers' own callers hold locks. Nothing, with errno set (ETIMEDOUT when others kept it), on failure.
-std::optional<Descriptor> TakeLock(const std::string &lockPath);
+std::optional<FileLock> TakeLock(const std::string &lockPath);
 
 }  // namespace VORK::PLATFORM
 

@@ -25,7 +25,7 @@ Descriptor OpenDirectoryOf(const std::string &path) {
         return Descriptor();
     }
     const std::string directory = S_ISDIR(status.st_mode) ? path : path.substr(0, path.rfind('/') + 1);
-    return Descriptor(open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+    return Open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
 }
 
 std::optional<Subvolume> SubvolumeAt(int fd) {

@@ -3,7 +3,7 @@
 #include "common/document.h"
 
 #include <algorithm>
-#include <sstream>
+#include <charconv>
 
 namespace VORK::PLATFORM {
 
@@ -28,26 +28,40 @@ std::string Unescape(std::string_view text) {
     return plain;
 }
 
+// No stream: making one takes a mutex of the C++ library where the host has set a locale, and a forked child may
+// find that taken for good.
+std::string_view TakeUntil(std::string_view &text, char end) {
+    const size_t length = std::min(text.find(end), text.size());
+    const std::string_view taken = text.substr(0, length);
+    text.remove_prefix(std::min(length + 1, text.size()));
+    return taken;
+}
+
+uint64_t TakeNumber(std::string_view &text) {
+    const std::string_view digits = TakeUntil(text, ' ');
+    uint64_t number = 0;
+    std::from_chars(digits.data(), digits.data() + digits.size(), number);
+    return number;
+}
+
 // "36 35 98:0 /root /point rw,noatime master:1 - ext3 /dev/sda1 rw,errors=continue"
-std::optional<Mount> ParseLine(const std::string &line) {
-    std::istringstream fields(line);
+std::optional<Mount> ParseLine(std::string_view line) {
     Mount mount;
-    fields >> mount.id >> mount.parentId >> mount.device >> mount.root >> mount.point >> mount.options;
-    std::string optional;
-    while (fields >> optional && optional != "-") {
+    mount.id = TakeNumber(line);
+    mount.parentId = TakeNumber(line);
+    mount.device = TakeUntil(line, ' ');
+    mount.root = Unescape(TakeUntil(line, ' '));
+    mount.point = Unescape(TakeUntil(line, ' '));
+    mount.options = TakeUntil(line, ' ');
+    while (!line.empty() && TakeUntil(line, ' ') != "-") {
     }
-    if (!(fields >> mount.type)) {
+    mount.type = Unescape(TakeUntil(line, ' '));
+    if (mount.type.empty()) {
         return std::nullopt;
     }
-    // An empty source leaves two blanks in a row, which the stream would take for one.
-    std::string rest;
-    std::getline(fields.ignore(1), rest);
-    const size_t end = rest.find(' ');
-    mount.source = Unescape(rest.substr(0, end));
-    mount.superOptions = end == rest.npos ? "" : rest.substr(end + 1);
-    mount.root = Unescape(mount.root);
-    mount.point = Unescape(mount.point);
-    mount.type = Unescape(mount.type);
+    // An empty source leaves two blanks in a row.
+    mount.source = Unescape(TakeUntil(line, ' '));
+    mount.superOptions = line;
     return mount;
 }
 
@@ -59,9 +73,8 @@ std::optional<MountTable> MountTable::Read() {
         return std::nullopt;
     }
     MountTable table;
-    std::istringstream lines(*text);
-    for (std::string line; std::getline(lines, line);) {
-        if (std::optional<Mount> mount = ParseLine(line)) {
+    for (std::string_view lines = *text; !lines.empty();) {
+        if (std::optional<Mount> mount = ParseLine(TakeUntil(lines, '\n'))) {
             table.mounts_.push_back(std::move(*mount));
         }
     }

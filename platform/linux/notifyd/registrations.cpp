@@ -65,7 +65,7 @@ std::optional<Stored> ReadStored() {
     std::optional<Json::Value> document = ParseObject(*text);
     if (!document || !(*document)[kList].isArray() ||
         !std::all_of((*document)[kList].begin(), (*document)[kList].end(), IsRegistration)) {
-        Fail(VORK_ERR_MALFORMED);
+        Fail(VORK_ERR_REGISTRATIONS);
         return std::nullopt;
     }
     return Stored{std::move(*document), std::move(*text)};
@@ -112,8 +112,8 @@ bool MakeDirectory() {
     return false;
 }
 
-std::optional<Descriptor> Lock() {
-    std::optional<Descriptor> lock = TakeLock(kLockFile);
+std::optional<FileLock> Lock() {
+    std::optional<FileLock> lock = TakeLock(kLockFile);
     if (!lock) {
         FailErrno(errno);
     }
@@ -134,7 +134,7 @@ bool StoreRegistration(const Json::Value &description, const std::string &name, 
     if (!MakeDirectory()) {
         return false;
     }
-    const std::optional<Descriptor> lock = Lock();
+    const std::optional<FileLock> lock = Lock();
     if (!lock) {
         return false;
     }
@@ -153,7 +153,7 @@ bool StoreRegistration(const Json::Value &description, const std::string &name, 
 }
 
 bool RemoveRegistration(const std::string &queuePath, const std::string &name) {
-    const std::optional<Descriptor> lock = TakeLock(kLockFile);
+    const std::optional<FileLock> lock = TakeLock(kLockFile);
     if (!lock && errno == ENOENT) {
         return true;  // no directory: nothing was ever registered
     }

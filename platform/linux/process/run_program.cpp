@@ -1,6 +1,10 @@
 #include "process/run_program.h"
 
+#include "common/cancellation.h"
 #include "common/descriptor.h"
+#include "common/failure.h"
+
+#include <vork/error.h>
 
 #include <fcntl.h>
 #include <poll.h>
@@ -29,11 +33,14 @@ public:
     FileActions &operator=(const FileActions &) = delete;
     ~FileActions() { posix_spawn_file_actions_destroy(&actions_); }
 
-    int Prepare(bool discardOutput) {
+    int Prepare(const RunOptions &options) {
+        if (options.directory >= 0) {
+            Note(posix_spawn_file_actions_addfchdir_np(&actions_, options.directory));
+        }
         // The host's input is not the program's to read.
         Note(posix_spawn_file_actions_addopen(&actions_, STDIN_FILENO, "/dev/null", O_RDONLY, 0));
         for (const int output : {STDOUT_FILENO, STDERR_FILENO}) {
-            if (discardOutput) {
+            if (options.discardOutput) {
                 Note(posix_spawn_file_actions_addopen(&actions_, output, "/dev/null", O_WRONLY, 0));
             }
         }
@@ -123,9 +130,10 @@ bool EndsBefore(pid_t child, std::chrono::steady_clock::time_point deadline) {
 }  // namespace
 
 RunResult RunProgram(const char *path, const char *const argv[], const RunOptions &options) {
+    const CancellationOff guard;
     FileActions actions;
     Attributes attributes;
-    int error = actions.Prepare(options.discardOutput);
+    int error = actions.Prepare(options);
     error = error != 0 ? error : attributes.Prepare(options.deadline.has_value());
     if (error != 0) {
         return {RunResult::End::kNotRun, error};
@@ -145,6 +153,18 @@ RunResult RunProgram(const char *path, const char *const argv[], const RunOption
         return {RunResult::End::kOverdue, 0};
     }
     return Reap(child);
+}
+
+int ResultOf(const RunResult &result) {
+    switch (result.end) {
+        case RunResult::End::kExited:
+            return result.status;
+        case RunResult::End::kUnknownStatus:
+            // It ran to its end; calling that a failure would make every call fail in such a host.
+            return 0;
+        default:
+            return Fail(VORK_ERR_EXEC);
+    }
 }
 
 }  // namespace VORK::PLATFORM

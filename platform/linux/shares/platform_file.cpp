@@ -7,6 +7,7 @@
 #include <vork/error.h>
 
 #include <fcntl.h>
+#include <pthread.h>
 
 #include <cerrno>
 #include <ctime>
@@ -107,35 +108,40 @@ ShareSource::Snapshot PlatformFileShares::Current() {
 }
 
 void PlatformFileShares::Load() {
-    const Descriptor file(open(path_.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
+    const Descriptor file = Open(path_.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
     struct stat status {};
     if (!file || fstat(file.Get(), &status) != 0) {
         Keep(CodeOfErrno(errno));
         return;
     }
-    // The identity is taken before the text: a change in between is seen by the next call.
-    identity_ = IdentityOf(status);
-    mayHaveChangedUnseen_ = IsRecent(status.st_mtim) || IsRecent(status.st_ctim);
-    LoadText(file.Get());
+    // The identity is taken before the text: a change in between is seen by the next call. It counts only once the
+    // text has been read: an exception, or the end of the thread, may come first.
+    const bool isRecent = IsRecent(status.st_mtim) || IsRecent(status.st_ctim);
+    mayHaveChangedUnseen_ = true;
+    if (LoadText(file.Get())) {
+        identity_ = IdentityOf(status);
+        mayHaveChangedUnseen_ = isRecent;
+    }
 }
 
-void PlatformFileShares::LoadText(int fd) {
+bool PlatformFileShares::LoadText(int fd) {
     const std::optional<std::string> text = ReadAll(fd);
     if (!text) {
         Keep(CodeOfErrno(errno));
-        return;
+        return false;
     }
     const std::optional<Json::Value> document = ParseObject(*text);
     if (!document) {
         snapshot_.error = VORK_ERR_MALFORMED;
-        return;
+        return true;
     }
     const Json::Value &shares = (*document)["shares"];
     if (!shares.isNull() && !shares.isObject()) {
         snapshot_.error = VORK_ERR_MALFORMED;
-        return;
+        return true;
     }
     snapshot_ = {TableOf(shares), 0};
+    return true;
 }
 
 // Trouble with reading may pass without the file changing: it is tried again each time.
@@ -144,10 +150,27 @@ void PlatformFileShares::Keep(int error) {
     mayHaveChangedUnseen_ = true;
 }
 
-ShareSource &Shares() {
+namespace {
+
+PlatformFileShares &Source() {
     // Never destroyed: destructors of other libraries may still ask for shares.
     static auto *const source = new PlatformFileShares(kPlatformFile);
     return *source;
+}
+
+// A forked child has one thread. What others held or were making at that moment stays so in it for good, and its
+// first lookup would wait for ever. So the source, and the one static of jsoncpp, are made when the library is
+// loaded, and a fork waits until no lookup is reading.
+[[gnu::constructor]] void PrepareForForks() {
+    Json::Value::nullSingleton();
+    Source();
+    pthread_atfork([] { Source().BeforeFork(); }, [] { Source().AfterFork(); }, [] { Source().AfterFork(); });
+}
+
+}  // namespace
+
+ShareSource &Shares() {
+    return Source();
 }
 
 }  // namespace VORK::PLATFORM

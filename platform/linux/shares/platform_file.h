@@ -20,6 +20,10 @@ public:
 
     Snapshot Current() override;
 
+    /// Around a fork, so that the child is not left with a mutex that a thread it does not have was holding.
+    void BeforeFork() { mutex_.lock(); }
+    void AfterFork() { mutex_.unlock(); }
+
 private:
     struct Identity {
         dev_t device = 0;
@@ -34,7 +38,7 @@ private:
     static Identity IdentityOf(const struct stat &status);
     bool IsKnown(const struct stat &status) const;
     void Load();
-    void LoadText(int fd);
+    bool LoadText(int fd);
     void Keep(int error);
 
     const std::string path_;
