@@ -20,6 +20,15 @@ struct FolderAccess {
 
     static const std::map<std::string, Folder> &All(const Folders &store) { return store.folders_; }
 
+    /// As Folders::Load, without making the document: for a store that nobody but the library will look into.
+    static bool Load(Folders &store);
+
+    /// As Folders::Save, likewise.
+    static bool Save(const Folders &store);
+
+    /// Fills the list from the document. Not an object: one record, FILEINDEX_ERR_MALFORMED_CONFIG, false.
+    static bool TakeDocument(Folders &store);
+
     /// Finds the full path anew. One of another path is worse than none, so the former is forgotten first.
     static bool Resolve(Folder &folder) {
         folder.full_path_.clear();

@@ -43,7 +43,6 @@ inline constexpr char kQueueTmpSuffix[] = ".tmp";
 // Queue records.
 inline constexpr char kEventKey[] = "event";
 inline constexpr char kOldPathKey[] = "path_old";
-inline constexpr char kDataKey[] = "data";
 inline constexpr unsigned kRenameEvent = 256;
 inline constexpr int kReindexEvent = 0x10000;
 inline constexpr int kSettingEvent = 0x20000;

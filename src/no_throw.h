@@ -9,8 +9,10 @@ namespace VORK::FILEINDEX::internal {
 
 /// The operation's result, or `onException` (false, 0, empty by default) when the JSON library, an allocation
 /// or the platform throws. The cancellation of a thread is no failure and goes on.
+// A forced unwinding carries no object: the reference is null, which is not looked at.
 template <typename Operation>
-auto NoThrow(Operation operation, decltype(operation()) onException = {}) -> decltype(operation()) {
+__attribute__((no_sanitize("null"))) auto NoThrow(Operation operation, decltype(operation()) onException = {})
+    -> decltype(operation()) {
     try {
         return operation();
     } catch (const abi::__forced_unwind &) {

@@ -1,5 +1,8 @@
 /// \file
 /// Owners of everything that has to be given back: descriptors, share records, a held configuration lock.
+///
+/// None of them can be cancelled while it gives back: a cancellation is an exception, and one that leaves a
+/// destructor ends the process.
 #ifndef FILEINDEX_SRC_SCOPED_H
 #define FILEINDEX_SRC_SCOPED_H
 
@@ -7,6 +10,8 @@
 
 #include <vork/share.h>
 
+#include <fcntl.h>
+#include <pthread.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -15,6 +20,25 @@
 #include <utility>
 
 namespace VORK::FILEINDEX::internal {
+
+/// Holds a cancellation of the calling thread off until this object is gone.
+class NoCancellation {
+public:
+    NoCancellation() { pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &before_); }
+    ~NoCancellation() { pthread_setcancelstate(before_, nullptr); }
+    NoCancellation(const NoCancellation &) = delete;
+    NoCancellation &operator=(const NoCancellation &) = delete;
+
+private:
+    int before_ = PTHREAD_CANCEL_ENABLE;
+};
+
+/// `open`, after which a cancellation waits until the descriptor has an owner: it could land between the kernel's
+/// answer and ours, and leave the descriptor open for ever.
+inline int OpenUncancelled(const char *path, int flags, mode_t mode = 0) {
+    const NoCancellation opening;
+    return open(path, flags, mode);
+}
 
 class UniqueFd {
 public:
@@ -38,6 +62,7 @@ public:
         if (fd_ < 0) {
             return true;
         }
+        const NoCancellation closing;
         return close(std::exchange(fd_, -1)) == 0;
     }
 
@@ -46,7 +71,10 @@ private:
 };
 
 struct ShareDeleter {
-    void operator()(_tag_VORKSHARE *share) const { VORKShareFree(share); }
+    void operator()(_tag_VORKSHARE *share) const {
+        const NoCancellation freeing;
+        VORKShareFree(share);
+    }
 };
 using Share = std::unique_ptr<_tag_VORKSHARE, ShareDeleter>;
 
@@ -56,6 +84,7 @@ inline Share FindShare(const std::string &name) {
     if (name.find('\0') != std::string::npos) {
         return nullptr;
     }
+    const NoCancellation finding;  // or a record that was just made could get lost on its way here
     _tag_VORKSHARE *record = nullptr;
     if (VORKShareGet(name.c_str(), &record) < 0) {
         return nullptr;
@@ -72,7 +101,10 @@ inline Share FindShare(const std::string &name) {
 class ConfigUnlocker {
 public:
     explicit ConfigUnlocker(Config &config) : config_(config) {}
-    ~ConfigUnlocker() { config_.Unlock(); }
+    ~ConfigUnlocker() {
+        const NoCancellation unlocking;
+        config_.Unlock();
+    }
     ConfigUnlocker(const ConfigUnlocker &) = delete;
     ConfigUnlocker &operator=(const ConfigUnlocker &) = delete;
 

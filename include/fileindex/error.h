@@ -18,13 +18,13 @@ enum _tag_fileindex_err_ {
     FILEINDEX_ERR_NONE = 0,               ///< nothing has failed since the library was loaded
     FILEINDEX_ERR_BAD_PARAM = 1,          ///< a malformed argument
     FILEINDEX_ERR_PATH = 2,               ///< a path or share that cannot be resolved to a volume path
-    FILEINDEX_ERR_RESERVED = 3,           ///< never set; keeps the numbering of the codes above it
+    FILEINDEX_ERR_RESERVED = 3,           ///< never set; the number is reserved
     FILEINDEX_ERR_NO_SUCH_FOLDER = 4,     ///< no record under that path
     FILEINDEX_ERR_EXCEED_MAX_FOLDER = 5,  ///< the 1001st folder
     FILEINDEX_ERR_LOAD_JSON = 6,          ///< a configuration file exists but cannot be read as JSON
-    FILEINDEX_ERR_SAVE_JSON = 7,          ///< a configuration file cannot be written; the old one stands
+    FILEINDEX_ERR_SAVE_JSON = 7,          ///< a configuration file cannot be written; it stays as it was
     FILEINDEX_ERR_MALFORMED_CONFIG = 8,   ///< folder.conf is JSON, but not an object
-    FILEINDEX_ERR_LOCK = 9                ///< a lock file is busy or cannot be opened; try again later
+    FILEINDEX_ERR_LOCK = 9                ///< a lock file is busy or cannot be used; try again later
 };
 
 /// The code of the last failure. Read it only after a call has failed: success never resets it.
@@ -36,12 +36,12 @@ public:
     /// The code of the last failure in this process, by any thread; FILEINDEX_ERR_NONE before the first.
     FILEINDEX_API static _tag_fileindex_err_ GetError();
 
-    /// The code itself. Programs of old read it as a variable; new ones call GetError.
+    /// The code itself, for older programs that read it as a variable. Call GetError instead.
     FILEINDEX_API static _tag_fileindex_err_ g_error_code;
 };
 
-/// 7 adds the three debug records of the queue writer (short write, hard lock failure, lock busy three
-/// times); every other value, 3 at the start, leaves them out. All other records are written at any level.
+/// At 7, the three debug records of the queue writer are written (short write, hard lock failure, lock busy three
+/// times); at every other value they are not. All other records are written at any level. The initial value is 3.
 FILEINDEX_API extern int LOG_LEVEL;
 
 }  // namespace FILEINDEX

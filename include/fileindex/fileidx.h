@@ -7,7 +7,7 @@
  *  2. A share path begins with "/" and the share's name ("/photo/2015"); a full path is the place on the
  *     volume ("/vol1/photo/2015"). A function takes the one it names and never converts.
  *  3. The questions answer 1 or 0. They answer 0 to a null pointer and when folder.conf cannot be read.
- *  4. The locations answer the length of the text written, without its NUL, or -1. A text that does not fit
+ *  4. The locations return the length of the text written, without its NUL, or -1. A text that does not fit
  *     is cut to the buffer and always NUL-terminated; the length is that of the cut text.
  *  5. The lock files are not touched, and no exception leaves a function.
  *
@@ -40,7 +40,8 @@ FILEINDEX_API int FILEIDXQueuePathGet(const char *szName, char *szOutQueuePath, 
  * Writes the path of the share's index database directory, `SHAREDIR/@eaDir/VORK@.fileindexdb`, to `szOutDBPath`.
  *
  * As FILEIDXQueuePathGet, and also makes the database directory itself (mode 0777 less the umask), whole even
- * when the text was cut to a short buffer; failing to make it is logged and not fatal.
+ * when the text was cut to a short buffer; failing to make it is logged and not fatal. It is not made where
+ * `@eaDir` is a link.
  *
  * @param szName        the share's name, not a path
  * @param szOutDBPath   the caller's buffer

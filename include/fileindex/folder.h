@@ -33,8 +33,8 @@ public:
     bool photo = false;     ///< index photos
 
     /// Sets `path` from the argument (never from the record), then each field that `record` holds with the
-    /// right type; the others stay as they are. False only when the path cannot be resolved
-    /// (FILEINDEX_ERR_PATH; an empty path sets no code and leaves a record); the fields are set all the same.
+    /// right type; the others stay as they are. False only when the path cannot be resolved (FILEINDEX_ERR_PATH
+    /// and no record; for an empty path no code and record utils.cpp:389); the fields are set all the same.
     FILEINDEX_API bool Load(const std::string &sharePath, const Json::Value &record);
 
     /// Load into a folder whose fields have first been reset to empty and false.
@@ -45,15 +45,16 @@ public:
 
     /// The full path: "/vol1/photo/2015" for "/photo/2015" when the share photo is at /vol1/photo.
     ///
-    /// One that could not be resolved is tried again at each call; if that fails too, one record is written
-    /// and the result is empty.
+    /// One that could not be resolved is tried again at each call. If that fails too, the result is empty, and
+    /// there is a record of folder.cpp, with FILEINDEX_ERR_PATH; for an empty path record utils.cpp:389 comes
+    /// first, and no code.
     FILEINDEX_API std::string GetFullPath() const;
 
     /// The record as stored in folder.conf: exactly "path", "name", "document", "audio", "video", "photo".
     FILEINDEX_API Json::Value asJson() const;
 
     /// The record with one more member, "additional", as GetAdditional fills it from the keys `additional`.
-    /// Never fails: bad keys are logged and leave FILEINDEX_ERR_BAD_PARAM.
+    /// Never fails: bad keys leave the records and the code of GetAdditional, and one record more where it failed.
     FILEINDEX_API Json::Value asJson(const Json::Value &additional) const;
 
     /// Stores asJson() in `obj` under the name `path`, replacing what was there. False, with nothing changed
@@ -62,12 +63,14 @@ public:
 
     /// One computed fact: "status" (string: "finished", "paused", "processing", "err_no_space") or "is_valid"
     /// (bool: may the path be indexed at present). Any other key: one record, FILEINDEX_ERR_BAD_PARAM, false,
-    /// `out` untouched. "status" reads the share's whole queue.
+    /// `out` untouched. "status" reads the share's whole queue. Both write the records, and set the codes, of
+    /// StatusMgr::GetFolderStatus and CanPathBeIndexed.
     FILEINDEX_API bool GetAdditional(Json::Value &out, const std::string &key) const;
 
-    /// The facts named by the array `keys`, as members of the object `out`. An unknown key is logged and
-    /// stays null; `keys` that is not an array, or an element that is not a string, ends with false and
-    /// FILEINDEX_ERR_BAD_PARAM (facts found before it stay in `out`).
+    /// The facts named by the array `keys`, as members of the object `out`. An unknown key stays null, with two
+    /// records of folder.cpp and FILEINDEX_ERR_BAD_PARAM, and the result is true all the same. `keys` that is not
+    /// an array, or an element that is not a string, ends with one record, the same code and false (facts found
+    /// before it stay in `out`).
     FILEINDEX_API bool GetAdditional(Json::Value &out, const Json::Value &keys) const;
 };
 

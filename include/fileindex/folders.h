@@ -29,8 +29,8 @@ public:
     ~Folders() override;
 
     /// Reads folder.conf into a fresh object. A missing file is an empty list. A record whose share is away is
-    /// loaded all the same, without a full path. Not an object: one record, FILEINDEX_ERR_MALFORMED_CONFIG,
-    /// false; unreadable: see Config::LoadJson.
+    /// loaded all the same, without a full path, and leaves FILEINDEX_ERR_PATH behind. Not an object: one record,
+    /// FILEINDEX_ERR_MALFORMED_CONFIG, false; unreadable: see Config::LoadJson.
     bool Load() override;
 
     /// Writes all folders to folder.conf (Config::SaveJson). Only "path", "name" and the four flags survive.
@@ -71,7 +71,8 @@ public:
     /// @param out     the change report: {"document", "audio", "video", "photo"}, true where what is indexed
     ///                at that path changes
     /// @param folder  a record with at least a string "path" (share path) on an existing share; otherwise
-    ///                one record, FILEINDEX_ERR_BAD_PARAM, false
+    ///                a record of folders.cpp, FILEINDEX_ERR_BAD_PARAM, false (for an empty path record
+    ///                utils.cpp:389 comes first)
     /// @return false also for the 1001st folder, with one record and FILEINDEX_ERR_EXCEED_MAX_FOLDER; this object
     ///         must not be saved any more then
     bool Upsert(Json::Value &out, const Json::Value &folder);
@@ -80,7 +81,9 @@ public:
     ///
     /// @param out   {path: change report}; untouched when the path no longer resolves, which is still true, so
     ///              that folders of a vanished share can be removed
-    /// @param path  share path, exactly as stored
+    /// @param path  share path, exactly as stored; one that no longer resolves leaves FILEINDEX_ERR_PATH behind,
+    /// an
+    ///              empty one record utils.cpp:389 and no code
     bool Delete(Json::Value &out, const std::string &path);
 
 private:

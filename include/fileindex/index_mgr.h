@@ -1,13 +1,17 @@
 /// \file
-/// The front door: which folders are indexed, adding, changing, removing and reindexing them, and keeping the
-/// index in step with shares. Pausing and progress are in status_mgr.h.
+/// The header to open first: which folders are indexed; adding, changing, removing and reindexing them; keeping
+/// the index in step with shares. Pausing and progress are in status_mgr.h.
 ///
-/// Success means that the configuration is saved and every party has been told, except for what an operation says
-/// is only logged; the daemon acts later. Changes are serialised between processes by
-/// /tmp/fileidx_cfg_folder.lock, held from the load to the last notification; a call that finds it busy fails with
-/// FILEINDEX_ERR_LOCK after at most 27 ms of sleep. Nothing is rolled back: folder.conf is saved before anyone is
-/// told, and after a failure the same call repeated tells everyone again (its events then report no change against
-/// what was saved: Reindex has the folders read anew). Nothing here throws.
+/// A change that succeeds is saved, and everybody has been told; each operation says which failures it only logs.
+/// The daemon acts later. Changes are serialised between processes by /tmp/fileidx_cfg_folder.lock, held from the
+/// load to the last notification; a call that finds it busy fails with FILEINDEX_ERR_LOCK after at most 27 ms of
+/// sleep. Nothing is rolled back: folder.conf is saved before anyone is told, and a failed call can be repeated,
+/// which tells everyone again. The events of the second call report no change, since the first has saved it: call
+/// Reindex to have the folders read again. Nothing here throws.
+///
+/// A request nested deeper than 256 levels of arrays and objects is a bad parameter, and so is one to Upsert with
+/// an infinite number or NaN. Its record shows "..." in the place of what is deeper. The value is only looked at;
+/// to copy or destroy such a one takes a deep stack, and is the caller's.
 #ifndef FILEINDEX_INDEX_MGR_H
 #define FILEINDEX_INDEX_MGR_H
 
@@ -22,14 +26,14 @@
 namespace VORK {
 namespace FILEINDEX {
 
-/// All of it is static: an operation needs no object and leaves none.
+/// All operations are static: no object is needed.
 class IndexMgr {
 public:
     /// \name Questions
     /// Plain byte comparison on component boundaries; nothing is normalised. A trailing "/" of the path
-    /// asked for is harmless, except in IsPathContainIndexed, which looks for folders behind it. The
+    /// asked for is harmless, except in IsPathContainIndexed, where "/photo/" does not find "/photo/2015". The
     /// one-argument forms read folder.conf without a lock and answer false when it cannot be read; the others
-    /// ask a list that the caller holds (from List).
+    /// look into a list that the caller holds (from List).
     /// @{
 
     /// Does the share path lie at or under an indexed folder? "/photo/2015" covers "/photo/2015/a", not
@@ -64,7 +68,8 @@ public:
                                    const Json::Value &additional);
 
     /// The record of the folder stored under exactly this share path. Takes the exclusive lock, so it never sees
-    /// a change half announced, and fails with FILEINDEX_ERR_LOCK while one is under way. Unknown:
+    /// a change half announced, and fails with FILEINDEX_ERR_LOCK while one is under way; so where only root may
+    /// open the lock files, as the packages make them, it fails for everybody else. List does not. Unknown:
     /// FILEINDEX_ERR_NO_SUCH_FOLDER.
     FILEINDEX_API static bool Get(Json::Value &result, const std::string &path);
     /// @}
@@ -78,29 +83,30 @@ public:
     /// `folders` is an array of objects with at least "path" (share path); "name", "document", "audio",
     /// "video" and "photo" as wanted. Then, in this order: the monitor of each share is registered anew, the
     /// daemon is started, the search setting is switched on if it was off (its failure is only logged), the
-    /// daemon gets one command for each element, and each path gets one event in its share's queue.
-    /// Codes: BAD_PARAM, EXCEED_MAX_FOLDER, LOCK, LOAD_JSON, MALFORMED_CONFIG, SAVE_JSON, PATH; a refusing
-    /// daemon, service or monitor sets none, and is in the log.
+    /// daemon gets one command for each element, and one event for each path is put into its share's queue.
+    /// Codes: BAD_PARAM, EXCEED_MAX_FOLDER, LOCK, LOAD_JSON, MALFORMED_CONFIG, SAVE_JSON, PATH. A daemon,
+    /// service or monitor that refuses sets none; the log tells.
     FILEINDEX_API static bool Upsert(const Json::Value &folders);
-    /// Upsert under another name: it adds as well.
+    /// The same as Upsert: it adds folders as well.
     FILEINDEX_API static bool Set(const Json::Value &folders);
-    /// Upsert under another name: it changes as well.
+    /// The same as Upsert: it changes folders as well.
     FILEINDEX_API static bool Add(const Json::Value &folders);
 
     /// Queues a settings-changed event with the payload `data` for the folder (share path). folder.conf is
-    /// neither read nor locked. Unknown share: FILEINDEX_ERR_PATH.
+    /// neither read nor locked. Unknown share: FILEINDEX_ERR_PATH. Data that no event can have (see
+    /// AddCustomEvent): FILEINDEX_ERR_BAD_PARAM, and the share is marked as waiting to be reindexed whole.
     FILEINDEX_API static bool Update(const std::string &path, const Json::Value &data);
 
     /// Removes folders: `paths` is an array of share paths; one that is not indexed is no error. Takes the lock. A
     /// share left without folders loses its queue, index database and monitor; when no folder is left anywhere,
     /// the daemon is stopped and the search setting switched off. A folder whose share is gone is removed and
     /// saved, but the call fails where its event cannot be queued or its share not be cleaned. Codes: BAD_PARAM,
-    /// LOCK, LOAD_JSON, MALFORMED_CONFIG, SAVE_JSON, PATH; as for Upsert, those who refuse set none.
+    /// LOCK, LOAD_JSON, MALFORMED_CONFIG, SAVE_JSON, PATH; those who refuse set none, as with Upsert.
     FILEINDEX_API static bool Delete(const Json::Value &paths);
 
-    /// Queues a reindex of each share path of the array, whose shares must be indexed, and revives shares that
-    /// were out of space. Takes no folder.conf lock. A share that is not indexed: false without a record.
-    /// Codes: BAD_PARAM, PATH.
+    /// Queues a reindex of each share path of the array, and revives those of their shares that were out of
+    /// space. Each share must have an indexed folder: otherwise false without a record. Takes no folder.conf
+    /// lock. Codes: BAD_PARAM, PATH.
     FILEINDEX_API static bool Reindex(const Json::Value &jsArrPath);
     /// @}
 
@@ -139,8 +145,9 @@ public:
     FILEINDEX_API static bool ShareResume(const std::string &share);
 
     /// Deletes the share's queue file, its ".tmp" companion and its index database directory. No lock. The
-    /// caller sees to it that the share is not in use. Refused, with nothing deleted, when the share's "@eaDir"
-    /// is a link or a path might have been cut.
+    /// caller sees to it that the share is not in use. Refused when a path might have been cut. Whether all is
+    /// gone afterwards is not looked at: the platform removes nothing that lies behind a link in place of
+    /// "@eaDir".
     FILEINDEX_API static bool CleanShareIndexData(const std::string &share);
     /// @}
 };

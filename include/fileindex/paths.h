@@ -13,9 +13,9 @@
 namespace VORK {
 namespace FILEINDEX {
 
-/// "/media/photos" -> "/vol1/media/photos". The directory above the share's, then the share path unchanged, so
-/// a share's directory bears the share's name. Unknown share: FILEINDEX_ERR_PATH, false, no record, `out`
-/// untouched; an empty path: one record, no code.
+/// "/media/photos" -> "/vol1/media/photos": the directory above the share's own, followed by the share path as it
+/// is. So a share's directory must bear the share's name. Unknown share: FILEINDEX_ERR_PATH, false, no record,
+/// `out` untouched; an empty path: one record, no code.
 FILEINDEX_API bool GetFullPath(std::string &out, const std::string &sharePath);
 
 /// "/media/photos" -> "media"; "/" -> "". The first character is skipped whatever it is. False only for an

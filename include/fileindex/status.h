@@ -47,17 +47,17 @@ public:
     /// a notification that fails is logged and changes nothing. Always true.
     bool ShareSetNoSpace(const std::string &share, bool noSpace);
 
-    /// Only membership counts: a stored false still reads as set.
+    /// Only membership counts: a share stored with false is marked all the same.
     bool ShareIsNoSpace(const std::string &share);
 
     /// Marks or unmarks the share as waiting to be reindexed whole. Always true.
     bool ShareSetNeedReindex(const std::string &share, bool needReindex);
 
-    /// Only membership counts: a stored false still reads as set.
+    /// Only membership counts: a share stored with false is marked all the same.
     bool ShareIsNeedReindex(const std::string &share);
 
-    /// Sets the caller's marker. Markers share their names with the file's own members: "resume_time",
-    /// "no_space" and "need_reindex" are not to be used. Always true.
+    /// Sets the caller's marker, which becomes a member of the file beside its own: so its name must not be
+    /// "resume_time", "no_space" or "need_reindex". Always true.
     bool SetUpdated(const std::string &key);
 
     /// The marker's value, read as a boolean; false when it is absent or cannot be read as one.

@@ -33,37 +33,37 @@ public:
     /// Marks or unmarks a share (its name) as out of space; the first mark notifies the administrators.
     FILEINDEX_API static bool ShareSetNoSpace(const std::string &share, bool noSpace);
 
-    /// Is the share marked? No, when status.conf cannot be read.
+    /// Is the share marked? False also when status.conf cannot be read.
     FILEINDEX_API static bool ShareIsNoSpace(const std::string &share);
 
     /// Unmarks the share and sends "revive_share_worker" to the daemon, whether it was marked or not. False when
-    /// the daemon cannot be told; saved even so.
+    /// the daemon cannot be told, and it is never told a name with a NUL inside; saved even so.
     FILEINDEX_API static bool ShareRevive(const std::string &share);
 
     /// Marks or unmarks a share as waiting to be reindexed whole.
     FILEINDEX_API static bool ShareSetNeedReindex(const std::string &share, bool needReindex);
 
-    /// Is the share marked? No, when status.conf cannot be read.
+    /// Is the share marked? False also when status.conf cannot be read.
     FILEINDEX_API static bool ShareIsNeedReindex(const std::string &share);
 
     /// Sets a marker of the caller's own; see Status::SetUpdated for the names to avoid.
     FILEINDEX_API static bool SetUpdated(const std::string &key);
 
-    /// Is the marker set? No, when status.conf cannot be read.
+    /// Is the marker set? False also when status.conf cannot be read.
     FILEINDEX_API static bool IsUpdated(const std::string &key);
 
     /// The service as a whole: "processing", "paused" or "finished".
     ///
-    /// Inferred from the queue files of the shares that have an indexable folder: one that exists, even empty,
-    /// is work left; only then does a pause show. False, `status` untouched, when a configuration file cannot
-    /// be read, a folder's path is empty or a share's queue cannot be located. Folders whose share is away do not
-    /// count.
+    /// Inferred from the queue files of the shares that have an indexable folder: a file that exists, even an
+    /// empty one, means work left, and only while there is work is a pause shown. False, `status` untouched, when
+    /// a configuration file cannot be read, a folder's path is empty or a share's queue cannot be located. Folders
+    /// whose share is away do not count.
     FILEINDEX_API static bool GetStatus(std::string &status);
 
     /// One folder (share path): "finished", "paused", "processing" or "err_no_space".
     ///
-    /// Reads the share's whole queue for events at or under the folder. A folder that may not be indexed at
-    /// present reads as "paused", and every failure as "finished".
+    /// Searches the share's whole queue for events at or under the folder. A folder that may not be indexed at
+    /// present is "paused", and after any failure the answer is "finished".
     FILEINDEX_API static std::string GetFolderStatus(const std::string &path);
 };
 

@@ -11,8 +11,8 @@ namespace FILEINDEX {
 /// Brings the system into line with folder.conf: with folders, starts the daemon, switches the search setting
 /// on, registers each share's monitor and queues a reindex of every folder; without any, stops the daemon.
 ///
-/// Stops at the first failure with false, and what was done stays done; it may be run again. Takes no lock and
-/// remembers nothing: whether it has run is the caller's business.
+/// Stops at the first failure with false, and what was done stays done; it may be run again. Takes no lock. The
+/// caller has to remember whether it has run.
 FILEINDEX_API bool Updater_zol60_beta2();
 
 }  // namespace FILEINDEX

@@ -1,18 +1,19 @@
 #include "config/load_save.h"
 #include "json/text.h"
 #include "names.h"
+#include "scoped.h"
 
 #include <fileindex/config.h>
 #include <fileindex/error.h>
 
 #include <fcntl.h>
 #include <sys/file.h>
+#include <sys/stat.h>
 #include <syslog.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <cstdlib>
-#include <new>
 
 namespace VORK {
 namespace FILEINDEX {
@@ -22,6 +23,14 @@ using internal::kConfigModule;
 namespace {
 
 constexpr int kLockAttempts = 3;
+
+/// /tmp is open to everyone. A lock on a file that has lost its name, or that a stranger made and can take away at
+/// any moment, would keep nobody out who finds another file there.
+bool IsTrustworthy(int fd) {
+    struct stat status = {};
+    return fstat(fd, &status) == 0 && S_ISREG(status.st_mode) && status.st_nlink > 0 &&
+           (status.st_uid == 0 || status.st_uid == geteuid());
+}
 
 }  // namespace
 
@@ -33,17 +42,21 @@ bool Config::Lock(bool exclusive) {
     const int operation = (exclusive ? LOCK_EX : LOCK_SH) | LOCK_NB;
     for (int attempt = 0; attempt < kLockAttempts; ++attempt) {
         if (attempt > 0) {
+            const internal::NoCancellation closing;
             close(lock_fd_);
             lock_fd_ = -1;
         }
-        lock_fd_ = open(GetLockPath().c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0644);
+        // Non-blocking: a stranger's lease on the file would hold the call for the kernel's whole grace time.
+        lock_fd_ = internal::OpenUncancelled(GetLockPath().c_str(),
+                                             O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0644);
         if (lock_fd_ < 0) {
             break;
         }
         if (flock(lock_fd_, operation) == 0) {
-            return true;
-        }
-        if (errno != EINTR && errno != EAGAIN) {
+            if (IsTrustworthy(lock_fd_)) {
+                return true;
+            }
+        } else if (errno != EINTR && errno != EAGAIN) {
             break;
         }
         // Up to 9 ms, so that processes that collided once do not collide for ever.
@@ -59,26 +72,20 @@ void Config::Unlock() {
     if (lock_fd_ < 0) {
         return;
     }
+    const internal::NoCancellation closing;
     flock(lock_fd_, LOCK_UN);
     close(lock_fd_);
 }
 
 bool Config::LoadJson() {
-    return internal::LoadConfig(GetPath(), [this](const std::string &text) {
-        unparsed_.clear();
-        return internal::JsonReader().Parse(text, document_);
-    });
+    return internal::LoadConfig(
+        GetPath(), [this](const std::string &text) { return internal::JsonReader().Parse(text, document_); });
 }
 
 bool Config::SaveJson() {
-    return internal::SaveConfig(GetPath(), [this] {
-        if (!unparsed_.empty()) {
-            if (!internal::JsonReader().Parse(unparsed_, document_)) {
-                throw std::bad_alloc();  // it has been parsed before; an empty document must not take its place
-            }
-            unparsed_.clear();
-        }
-        return internal::ToString(document_) + '\n';
+    return internal::SaveConfig(GetPath(), [this](std::string &text) {
+        text = internal::ToString(document_) + '\n';
+        return internal::CanBeWritten(document_);
     });
 }
 

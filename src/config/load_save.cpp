@@ -1,6 +1,6 @@
 #include "config/load_save.h"
 
-#include "json/file.h"
+#include "config/in_place_file.h"
 #include "names.h"
 #include "no_throw.h"
 
@@ -61,7 +61,11 @@ bool LoadConfig(const std::string &path, const TextParser &parse) {
 }
 
 bool SaveConfig(const std::string &path, const TextMaker &make) {
-    if (!NoThrow([&] { return WriteFile(path, make()); })) {
+    const auto write = [&] {
+        std::string text;
+        return make(text) && WriteFile(path, text);
+    };
+    if (!NoThrow(write)) {
         syslog(LOG_ERR, "%s:%d Failed to save json to %s", kConfigModule, __LINE__, path.c_str());
         ErrorHandler::SetError(FILEINDEX_ERR_SAVE_JSON);
         return false;

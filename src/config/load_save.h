@@ -14,8 +14,8 @@ using TextParser = std::function<bool(std::string &text)>;
 /// True also when there is no file; then `parse` is not called. Otherwise one record and FILEINDEX_ERR_LOAD_JSON.
 bool LoadConfig(const std::string &path, const TextParser &parse);
 
-/// Makes the JSON text.
-using TextMaker = std::function<std::string()>;
+/// Makes the JSON text; false when there is none that a load would accept.
+using TextMaker = std::function<bool(std::string &text)>;
 
 /// Writes the text, mode 0644. On failure one record and FILEINDEX_ERR_SAVE_JSON; the old file stands.
 bool SaveConfig(const std::string &path, const TextMaker &make);

@@ -76,53 +76,78 @@ void AppendRecord(std::string &out, const Folder &folder) {
     out.back() = '}';
 }
 
+/// All records as ToString writes the document, byte for byte.
+std::string TextOf(const std::map<std::string, Folder> &folders) {
+    std::string text;
+    for (const auto &[path, folder] : folders) {
+        text += text.empty() ? '{' : ',';
+        internal::AppendQuoted(text, path);
+        text += ':';
+        AppendRecord(text, folder);
+    }
+    text += text.empty() ? "{}" : "}";
+    return text;
+}
+
 }  // namespace
 
 bool Folders::Load() {
-    bool done = false;
-    const bool loaded = internal::LoadConfig(GetPath(), [&](std::string &text) {
-        done = LoadOrdinary(folders_, text);
-        if (done) {
-            unresolved_ = CountUnresolved(folders_);
-            unparsed_ = std::move(text);
-            return true;
-        }
-        unparsed_.clear();
-        return internal::JsonReader().Parse(text, document_);
-    });
-    if (!loaded || done) {
-        return loaded;
-    }
-    if (!document_.isObject()) {
-        syslog(LOG_ERR, "%s:%d Malformed folders: %s", internal::kFoldersModule, __LINE__,
-               internal::ToString(document_).c_str());
-        ErrorHandler::SetError(FILEINDEX_ERR_MALFORMED_CONFIG);
-        return false;
-    }
-    for (auto it = document_.begin(); it != document_.end(); ++it) {
-        const std::string path = it.name();
-        Folder folder;
-        folder.Load(path, *it);  // a folder whose share is away stays in the list
-        folders_.emplace(path, std::move(folder));
-    }
-    unresolved_ = CountUnresolved(folders_);
-    return true;
+    return LoadJson() && internal::FolderAccess::TakeDocument(*this);
 }
 
 bool Folders::Save() {
-    return internal::SaveConfig(GetPath(), [this]() -> const std::string & {
-        std::string text;
-        for (const auto &[path, folder] : folders_) {
-            text += text.empty() ? '{' : ',';
-            internal::AppendQuoted(text, path);
-            text += ':';
-            AppendRecord(text, folder);
+    document_ = Json::Value(Json::objectValue);
+    for (const auto &[path, folder] : folders_) {
+        if (!folder.AddToJson(document_)) {
+            return false;
         }
-        text += text.empty() ? "{}\n" : "}\n";
-        unparsed_ = std::move(text);
-        return unparsed_;
+    }
+    return SaveJson();
+}
+
+namespace internal {
+
+bool FolderAccess::Load(Folders &store) {
+    bool done = false;
+    const bool loaded = LoadConfig(store.GetPath(), [&](std::string &text) {
+        done = LoadOrdinary(store.folders_, text);
+        return done || JsonReader().Parse(text, store.document_);
+    });
+    if (!loaded) {
+        return false;
+    }
+    if (!done) {
+        return TakeDocument(store);
+    }
+    store.unresolved_ = CountUnresolved(store.folders_);
+    return true;
+}
+
+bool FolderAccess::Save(const Folders &store) {
+    return SaveConfig(store.GetPath(), [&](std::string &text) {
+        text = TextOf(store.folders_) + '\n';
+        return true;
     });
 }
+
+bool FolderAccess::TakeDocument(Folders &store) {
+    if (!store.document_.isObject()) {
+        syslog(LOG_ERR, "%s:%d Malformed folders: %s", kFoldersModule, __LINE__,
+               ToString(store.document_).c_str());
+        ErrorHandler::SetError(FILEINDEX_ERR_MALFORMED_CONFIG);
+        return false;
+    }
+    for (auto it = store.document_.begin(); it != store.document_.end(); ++it) {
+        const std::string path = it.name();
+        Folder folder;
+        folder.Load(path, *it);  // a folder whose share is away stays in the list
+        store.folders_.emplace(path, std::move(folder));
+    }
+    store.unresolved_ = CountUnresolved(store.folders_);
+    return true;
+}
+
+}  // namespace internal
 
 }  // namespace FILEINDEX
 }  // namespace VORK

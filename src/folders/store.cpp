@@ -37,7 +37,7 @@ const Folder *FirstCovering(Iterator it, Iterator end, const std::string &fullPa
 class StoreWith {
 public:
     StoreWith(const FolderMap &folders, const std::string &path, const Folder *own)
-        : folders_(folders), own_(own), before_(folders.lower_bound(path)), behind_(folders.upper_bound(path)) {}
+        : folders_(folders), own_(own), before_(folders.lower_bound(path)), after_(folders.upper_bound(path)) {}
 
     /// Null when no folder governs the full path. Where some have no full path each folder is asked in the list's
     /// order, because each of those leaves a record; otherwise from the end, as the last one that covers governs.
@@ -54,14 +54,14 @@ private:
         if (own_ != nullptr) {
             governing.Consider(*own_);
         }
-        for (auto it = behind_; it != folders_.end(); ++it) {
+        for (auto it = after_; it != folders_.end(); ++it) {
             governing.Consider(it->second);
         }
         return governing.Get();
     }
 
     const Folder *LastCovering(const std::string &fullPath) const {
-        const Folder *found = FirstCovering(folders_.rbegin(), std::make_reverse_iterator(behind_), fullPath);
+        const Folder *found = FirstCovering(folders_.rbegin(), std::make_reverse_iterator(after_), fullPath);
         if (found == nullptr && own_ != nullptr && internal::Covers(*own_, fullPath)) {
             found = own_;
         }
@@ -72,7 +72,7 @@ private:
     const FolderMap &folders_;
     const Folder *own_;
     FolderMap::const_iterator before_;
-    FolderMap::const_iterator behind_;
+    FolderMap::const_iterator after_;
 };
 
 bool IsUnresolved(const Folder &folder) {

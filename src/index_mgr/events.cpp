@@ -29,6 +29,9 @@ bool UpdateOne(PendingReindexes &pending, const std::string &path, const Json::V
     }
     if (!AddEvent(pending, kSettingEvent, fullPath, path, data)) {
         syslog(LOG_ERR, "%s:%d AddCustomEvent failed", kIndexMgrModule, 436);
+        if (!CanBeQueued(data)) {
+            ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);
+        }
         return false;
     }
     return true;

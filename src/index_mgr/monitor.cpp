@@ -1,3 +1,4 @@
+#include "folder_access.h"
 #include "json/text.h"
 #include "names.h"
 #include "no_throw.h"
@@ -54,7 +55,7 @@ bool IndexMgr::UpsertVorkNotifydCfg(const std::string &share) {
         }
         Folders store;
         std::vector<Folder> folders;
-        if (!store.Load() || !store.List(folders, share)) {
+        if (!FolderAccess::Load(store) || !store.List(folders, share)) {
             return false;
         }
         Json::Value config(Json::arrayValue);

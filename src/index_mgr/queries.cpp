@@ -1,4 +1,5 @@
 #include "coverage.h"
+#include "folder_access.h"
 #include "names.h"
 #include "no_throw.h"
 #include "scoped.h"
@@ -25,7 +26,7 @@ template <typename Question>
 bool AnyStored(Question question) {
     return NoThrow([&] {
         Folders store;
-        if (!store.Load()) {
+        if (!FolderAccess::Load(store)) {
             return false;
         }
         const auto &folders = FolderAccess::All(store);
@@ -80,7 +81,7 @@ bool IndexMgr::IsShareIndexed(const std::string &share) {
 bool IndexMgr::List(std::vector<Folder> &folders) {
     return NoThrow([&] {
         Folders store;
-        return store.Load() && store.List(folders);
+        return FolderAccess::Load(store) && store.List(folders);
     });
 }
 
@@ -88,7 +89,7 @@ bool IndexMgr::List(Json::Value &out, unsigned long offset, unsigned long limit,
                     const std::string &sort_direction, const Json::Value &additional) {
     return NoThrow([&] {
         Folders store;
-        return store.Load() && store.List(out, offset, limit, sort_by, sort_direction, additional);
+        return FolderAccess::Load(store) && store.List(out, offset, limit, sort_by, sort_direction, additional);
     });
 }
 
@@ -96,7 +97,7 @@ bool IndexMgr::Get(Json::Value &result, const std::string &path) {
     return NoThrow([&] {
         Folders store;
         const ConfigUnlocker unlocker(store);
-        return store.Lock(true) && store.Load() && store.Get(result, path);
+        return store.Lock(true) && FolderAccess::Load(store) && store.Get(result, path);
     });
 }
 

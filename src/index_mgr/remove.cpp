@@ -1,3 +1,4 @@
+#include "folder_access.h"
 #include "index_mgr/changes.h"
 #include "index_mgr/events.h"
 #include "index_mgr/share_folders.h"
@@ -7,6 +8,7 @@
 #include "names.h"
 #include "no_throw.h"
 #include "scoped.h"
+#include "utils/storage.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/error.h>
@@ -57,6 +59,9 @@ bool DeleteAll(Folders &store, const Json::Value &paths, Changes &changes) {
 bool SendCommands(const Json::Value &paths) {
     Json::Value command(Json::objectValue);
     for (const Json::Value &path : Elements(paths)) {
+        if (HasNul(path.asString())) {
+            continue;  // the daemon may take it for another path; its event is refused below, with a record
+        }
         command[kFolderPathKey] = path.asString();
         if (!SendCammandToDaemon(kDeleteCommand, command)) {
             syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", kIndexMgrModule, 104);
@@ -112,7 +117,8 @@ bool IndexMgr::Delete(const Json::Value &paths) {
         Folders store;
         const ConfigUnlocker unlocker(store);
         Changes changes;
-        if (!store.Lock(true) || !store.Load() || !DeleteAll(store, paths, changes) || !store.Save()) {
+        if (!store.Lock(true) || !FolderAccess::Load(store) || !DeleteAll(store, paths, changes) ||
+            !FolderAccess::Save(store)) {
             return false;
         }
         if (IsEmpty(store)) {

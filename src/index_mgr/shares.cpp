@@ -1,3 +1,4 @@
+#include "folder_access.h"
 #include "index_mgr/share_folders.h"
 #include "index_mgr/stop_indexing.h"
 #include "names.h"
@@ -13,7 +14,6 @@
 
 #include <vork/process.h>
 
-#include <sys/stat.h>
 #include <syslog.h>
 
 #include <vector>
@@ -33,15 +33,9 @@ bool SendShareCommand(const char *command, const std::string &share) {
     return SendCammandToDaemon(command, data);
 }
 
-/// A location that is surely the share's own. One that fills the buffer may be cut, and then names something
-/// else; one behind a link in place of the metadata directory lies outside the share.
-bool IsOwnLocation(const char (&location)[kPathSize], int length) {
-    if (length < 0 || length >= kPathSize - 1) {
-        return false;
-    }
-    const std::string path = location;
-    struct stat status = {};
-    return lstat(path.substr(0, path.rfind('/')).c_str(), &status) != 0 || !S_ISLNK(status.st_mode);
+/// One that fills the buffer may be cut, and then names something else.
+bool IsWhole(int length) {
+    return length >= 0 && length < kPathSize - 1;
 }
 
 /// The result is of no use: what cannot be deleted now is deleted with the share, or reused.
@@ -55,7 +49,7 @@ bool IndexMgr::ShareRename(const std::string &oldShare, const std::string &newSh
     return NoThrow([&] {
         Folders store;
         const ConfigUnlocker unlocker(store);
-        if (!store.Lock(true) || !store.Load()) {
+        if (!store.Lock(true) || !FolderAccess::Load(store)) {
             return false;
         }
         Json::Value scratch;
@@ -68,7 +62,7 @@ bool IndexMgr::ShareRename(const std::string &oldShare, const std::string &newSh
                 return false;
             }
         }
-        return store.Save();
+        return FolderAccess::Save(store);
     });
 }
 
@@ -76,7 +70,7 @@ bool IndexMgr::ShareRemove(const std::string &share) {
     return NoThrow([&] {
         Folders store;
         const ConfigUnlocker unlocker(store);
-        if (!store.Lock(true) || !store.Load()) {
+        if (!store.Lock(true) || !FolderAccess::Load(store)) {
             return false;
         }
         Json::Value scratch;
@@ -85,7 +79,7 @@ bool IndexMgr::ShareRemove(const std::string &share) {
                 return false;
             }
         }
-        if (!store.Save()) {
+        if (!FolderAccess::Save(store)) {
             return false;
         }
         if (IsEmpty(store)) {
@@ -97,7 +91,9 @@ bool IndexMgr::ShareRemove(const std::string &share) {
 
 bool IndexMgr::SharePause(const std::string &share) {
     return NoThrow([&] {
-        if (!SendShareCommand(kDeleteShareCommand, share)) {
+        // The daemon may take a name with a NUL for that of another share. The next step refuses it, with a
+        // record.
+        if (!HasNul(share) && !SendShareCommand(kDeleteShareCommand, share)) {
             return false;
         }
         if (!DeleteVorkNotifydCfg(share)) {
@@ -121,13 +117,13 @@ bool IndexMgr::ShareResume(const std::string &share) {
 bool IndexMgr::CleanShareIndexData(const std::string &share) {
     return NoThrow([&] {
         char location[kPathSize] = {};
-        if (!IsOwnLocation(location, QueuePathOf(share, location))) {
+        if (!IsWhole(QueuePathOf(share, location))) {
             syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kIndexMgrModule, 653, share.c_str());
             return false;
         }
         Remove(location);
         Remove(std::string(location) + kQueueTmpSuffix);
-        if (!IsOwnLocation(location, FILEIDXDBPathGet(share.c_str(), location, sizeof(location)))) {
+        if (!IsWhole(FILEIDXDBPathGet(share.c_str(), location, sizeof(location)))) {
             syslog(LOG_ERR, "%s:%d FILEIDXDBPathGet failed, share=%s", kIndexMgrModule, 661, share.c_str());
             return false;
         }

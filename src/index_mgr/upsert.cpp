@@ -1,3 +1,4 @@
+#include "folder_access.h"
 #include "index_mgr/changes.h"
 #include "index_mgr/events.h"
 #include "json/elements.h"
@@ -94,7 +95,7 @@ bool QueueEvents(const Json::Value &reports) {
 
 bool IndexMgr::Upsert(const Json::Value &folders) {
     return NoThrow([&] {
-        if (!folders.isArray()) {
+        if (!folders.isArray() || !CanBeWritten(folders)) {
             syslog(LOG_ERR, "%s:%d Bad param: %s", kIndexMgrModule, 569, ToString(folders).c_str());
             ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);
             return false;
@@ -102,7 +103,8 @@ bool IndexMgr::Upsert(const Json::Value &folders) {
         Folders store;
         const ConfigUnlocker unlocker(store);
         Changes changes;
-        if (!store.Lock(true) || !store.Load() || !UpsertAll(store, folders, changes) || !store.Save()) {
+        if (!store.Lock(true) || !FolderAccess::Load(store) || !UpsertAll(store, folders, changes) ||
+            !FolderAccess::Save(store)) {
             return false;
         }
         // Saved before anyone is told, and never taken back: the daemons read the file when they hear of it, and

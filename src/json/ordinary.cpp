@@ -6,10 +6,13 @@
 #include <simdjson.h>
 
 #include <algorithm>
+#include <atomic>
+#include <chrono>
 #include <cmath>
 #include <cstdint>
 #include <iterator>
 #include <limits>
+#include <thread>
 
 namespace VORK::FILEINDEX::internal {
 
@@ -93,6 +96,35 @@ bool ReadRecord(const object &members, FolderRecord &record) {
     return true;
 }
 
+/// Set while the process ends, when the JSON library's own objects are about to be destroyed.
+constinit std::atomic<bool> isEnding = false;
+
+/// How many threads use these objects just now.
+constinit std::atomic<int> users = 0;
+
+struct AtExit {
+    AtExit() = default;
+    AtExit(const AtExit &) = delete;
+    AtExit &operator=(const AtExit &) = delete;
+
+    /// Waits for a thread in the middle of its use. Not for ever: after a fork it may have stayed in the parent.
+    ~AtExit() {
+        isEnding = true;
+        for (int pauses = 0; users != 0 && pauses < 100; ++pauses) {
+            std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        }
+    }
+};
+
+/// When the library is loaded, and so before the host can register anything that asks us at exit: the JSON library
+/// makes its objects now, and they are destroyed after all that is made or registered later. The first of these is
+/// the mark for who asks nevertheless: a thread that outlives main, or a handler registered still earlier.
+[[gnu::constructor]] void ChooseInstructions() {
+    // Chosen by us: left alone, the JSON library would ask an environment variable which instructions to use.
+    simdjson::get_active_implementation() = simdjson::get_available_implementations().detect_best_supported();
+    static const AtExit mark;
+}
+
 }  // namespace
 
 struct OrdinaryReader::Parser {
@@ -107,19 +139,19 @@ struct OrdinaryReader::Parser {
 private:
     /// Allocates ahead of need, so that slowly growing lines do not allocate each time.
     bool HasRoomFor(std::size_t size) {
-        return size <= parser.capacity() ||
-               parser.allocate(std::max(size, 2 * parser.capacity()), kMaxDepth) == simdjson::SUCCESS;
+        return size <= parser.capacity() || Allocate(std::max(size, 2 * parser.capacity()));
+    }
+
+    /// The one place that asks an object of the JSON library's own; a parser that is made does without them.
+    bool Allocate(std::size_t size) {
+        ++users;
+        const bool done = !isEnding && parser.allocate(size, kMaxDepth) == simdjson::SUCCESS;
+        --users;
+        return done;
     }
 };
 
-OrdinaryReader::OrdinaryReader() {
-    // Chosen by us: left alone, the JSON library would ask an environment variable which instructions to use.
-    [[maybe_unused]] static const bool chosen = [] {
-        simdjson::get_active_implementation() = simdjson::get_available_implementations().detect_best_supported();
-        return true;
-    }();
-    parser_ = std::make_unique<Parser>();
-}
+OrdinaryReader::OrdinaryReader() : parser_(std::make_unique<Parser>()) {}
 
 OrdinaryReader::~OrdinaryReader() = default;
 

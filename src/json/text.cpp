@@ -5,6 +5,7 @@
 #include <json/writer.h>
 
 #include <algorithm>
+#include <cmath>
 #include <exception>
 
 namespace VORK::FILEINDEX::internal {
@@ -22,6 +23,7 @@ std::unique_ptr<Json::CharReader> NewReader() {
     builder["strictRoot"] = false;  // a lone number or string is valid JSON
     builder["failIfExtra"] = true;
     builder["rejectDupKeys"] = false;
+    builder["skipBom"] = false;             // a byte-order mark is no part of JSON
     builder["stackLimit"] = kMaxDepth + 1;  // a number or string counts as a level to the parser
     return std::unique_ptr<Json::CharReader>(builder.newCharReader());
 }
@@ -129,6 +131,10 @@ private:
     int depth_ = 0;
 };
 
+bool IsNest(const Json::Value &value) {
+    return value.isArray() || value.isObject();
+}
+
 bool NeedsEscape(char c) {
     return static_cast<unsigned char>(c) < 0x20 || c == '"' || c == '\\';
 }
@@ -165,19 +171,20 @@ void AppendEscaped(std::string &out, char c) {
     }
 }
 
-void Append(std::string &out, const Json::Value &value);
+/// `levels`: how many more of arrays and objects are written.
+void Append(std::string &out, const Json::Value &value, int levels);
 
-void AppendArray(std::string &out, const Json::Value &array) {
+void AppendArray(std::string &out, const Json::Value &array, int levels) {
     char separator = '[';
     for (const Json::Value &element : Elements(array)) {
         out += separator;
-        Append(out, element);
+        Append(out, element, levels);
         separator = ',';
     }
     out += array.empty() ? "[]" : "]";
 }
 
-void AppendObject(std::string &out, const Json::Value &object) {
+void AppendObject(std::string &out, const Json::Value &object, int levels) {
     char separator = '{';
     for (auto member = object.begin(); member != object.end(); ++member) {
         char const *end = nullptr;
@@ -185,13 +192,17 @@ void AppendObject(std::string &out, const Json::Value &object) {
         out += separator;
         AppendQuoted(out, {name, static_cast<std::size_t>(end - name)});
         out += ':';
-        Append(out, *member);
+        Append(out, *member, levels);
         separator = ',';
     }
     out += object.empty() ? "{}" : "}";
 }
 
-void Append(std::string &out, const Json::Value &value) {
+void Append(std::string &out, const Json::Value &value, int levels) {
+    if (IsNest(value) && levels == 0) {
+        out += "...";
+        return;
+    }
     switch (value.type()) {
         case Json::nullValue:
             out += "null";
@@ -216,10 +227,10 @@ void Append(std::string &out, const Json::Value &value) {
             out += value.asBool() ? "true" : "false";
             return;
         case Json::arrayValue:
-            AppendArray(out, value);
+            AppendArray(out, value, levels - 1);
             return;
         case Json::objectValue:
-            AppendObject(out, value);
+            AppendObject(out, value, levels - 1);
             return;
     }
 }
@@ -242,8 +253,17 @@ bool JsonReader::Parse(std::string_view text, Json::Value &out) const {
 // Not the JSON library's writer: setting one up costs as much as sending the text it makes.
 std::string ToString(const Json::Value &value) {
     std::string out;
-    Append(out, value);
+    Append(out, value, kMaxDepth);
     return out;
+}
+
+bool CanBeWritten(const Json::Value &value, int levels) {
+    if (value.type() == Json::realValue) {
+        return std::isfinite(value.asDouble());
+    }
+    return !IsNest(value) ||
+           (levels < kMaxDepth && std::all_of(value.begin(), value.end(),
+                                              [&](const auto &inner) { return CanBeWritten(inner, levels + 1); }));
 }
 
 void AppendQuoted(std::string &out, std::string_view content) {

@@ -2,6 +2,7 @@
 #include "names.h"
 #include "no_throw.h"
 #include "scoped.h"
+#include "utils/storage.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/error.h>
@@ -27,10 +28,11 @@ struct Announcement {
     const char *command;
     Json::Value data;
     int failureLine;
+    bool canBeSent = true;
 
     /// A failure leaves the change saved: the daemon reads the file when it starts.
     bool Send() const {
-        if (SendCammandToDaemon(command, data)) {
+        if (canBeSent && SendCammandToDaemon(command, data)) {
             return true;
         }
         syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", kStatusMgrModule, failureLine);
@@ -113,7 +115,8 @@ bool StatusMgr::ShareIsNoSpace(const std::string &share) {
 
 bool StatusMgr::ShareRevive(const std::string &share) {
     return NoThrow([&] {
-        const Announcement revive = {kReviveShareCommand, Object(kShareNameKey, share), 321};
+        // The daemon may take a name with a NUL for that of another share.
+        const Announcement revive = {kReviveShareCommand, Object(kShareNameKey, share), 321, !HasNul(share)};
         return Change([&](Status &status) { return status.ShareSetNoSpace(share, false); }, &revive);
     });
 }

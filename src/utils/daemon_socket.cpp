@@ -31,6 +31,7 @@ constexpr int kEmptyWriteRetries = 3;
 constexpr std::ptrdiff_t kBackwardRoom = 64 * 1024;
 constexpr timeval kSendTimeout = {1, 0};
 constexpr std::chrono::seconds kWholeSendLimit(10);
+constexpr std::chrono::seconds kLastWrite = kWholeSendLimit - std::chrono::seconds(kSendTimeout.tv_sec);
 
 /// A frame as it goes over the wire: 4 bytes of length in host order, the JSON text and a NUL, both counted by
 /// the length. In front of it lie zeros that belong to the same buffer; see WriteAll.
@@ -67,11 +68,14 @@ using Clock = std::chrono::steady_clock;
 /// moves back by a byte and one more is to be written. The daemon has always been spoken to like this, and frames
 /// that it resynchronises on must not change. Where a step would leave the zeros in front the frame is given up,
 /// which soon ends the loop when the peer is gone. A peer that is there and does not read costs a timeout for each
-/// step, hence the deadline.
+/// step, and one that reads slowly nearly as much, hence the deadline: no write begins after it.
 bool WriteAll(int fd, std::size_t size, Frame &frame, std::ptrdiff_t offset, Clock::time_point deadline) {
     std::size_t remaining = size;
     int retries = kEmptyWriteRetries;
     while (remaining > 0) {
+        if (Clock::now() >= deadline) {
+            return false;
+        }
         const ssize_t count = write(fd, frame.At(offset), std::min(remaining, kChunkSize));
         if (count == 0) {
             if (errno != EINTR || retries == 0) {
@@ -80,7 +84,7 @@ bool WriteAll(int fd, std::size_t size, Frame &frame, std::ptrdiff_t offset, Clo
             --retries;
             continue;
         }
-        if (count < 0 && (offset == -kBackwardRoom || (errno == EAGAIN && Clock::now() >= deadline))) {
+        if (count < 0 && offset == -kBackwardRoom) {
             return false;
         }
         remaining -= static_cast<std::size_t>(count);
@@ -105,8 +109,12 @@ bool Connect(int fd) {
 
 bool SendCammandToDaemon(const std::string &command, const Json::Value &data) {
     return NoThrow([&] {
+        const Clock::time_point deadline = Clock::now() + kLastWrite;
         // For the whole process and for good: a daemon that hangs up must not kill a management program.
         signal(SIGPIPE, SIG_IGN);
+        if (!CanBeWritten(data, 1)) {
+            return false;
+        }
         const UniqueFd fd(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
         if (!fd) {
             return false;
@@ -119,7 +127,6 @@ bool SendCammandToDaemon(const std::string &command, const Json::Value &data) {
         std::string text = "{\"data\":" + ToString(data) + ",\"type\":";
         AppendQuoted(text, command);
         Frame frame(text + "}");
-        const Clock::time_point deadline = Clock::now() + kWholeSendLimit;
         return WriteAll(fd.Get(), Frame::kLengthSize, frame, 0, deadline) &&
                WriteAll(fd.Get(), frame.Size() - Frame::kLengthSize, frame, Frame::kLengthSize, deadline);
     });

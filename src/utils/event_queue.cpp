@@ -4,6 +4,7 @@
 #include "names.h"
 #include "no_throw.h"
 #include "scoped.h"
+#include "utils/metadata_entry.h"
 #include "utils/storage.h"
 
 #include <fileindex/daemon.h>
@@ -56,42 +57,57 @@ bool IsReindexQueued(const std::string &fullPath, const std::string &queueFile) 
     return queued;
 }
 
-UniqueFd OpenForAppend(const std::string &queuePath) {
-    constexpr int kFlags = O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK;
-    UniqueFd fd(open(queuePath.c_str(), kFlags, 0644));
-    struct stat status = {};
-    if (!fd || fstat(fd.Get(), &status) != 0 || !S_ISREG(status.st_mode)) {
-        return {};
-    }
-    return fd;
-}
-
-/// The daemon takes a queue by renaming it; a line written to the file it has taken might never be read.
-bool StillNames(const std::string &queuePath, int fd) {
+/// The daemon takes a queue by renaming it; a line written to the file it has taken might never be read. `opened`
+/// is what the descriptor's file is now.
+bool StillNames(const MetadataEntry &queue, int fd, struct stat &opened) {
     struct stat named = {};
-    struct stat opened = {};
-    if (lstat(queuePath.c_str(), &named) != 0) {
+    if (fstat(fd, &opened) != 0) {
+        return false;
+    }
+    if (!queue.Look(named)) {
         return errno != ENOENT && errno != ENOTDIR;  // what cannot be told must not lose the event
     }
-    return fstat(fd, &opened) == 0 && named.st_dev == opened.st_dev && named.st_ino == opened.st_ino;
+    return named.st_nlink == 1 && named.st_dev == opened.st_dev && named.st_ino == opened.st_ino;
 }
 
-void WriteLine(int fd, const std::string &line) {
-    const ssize_t written = write(fd, line.data(), line.size());
-    if (written < static_cast<ssize_t>(line.size()) && WantDebugRecords()) {
+/// Has a writer died before it came to the newline of its line? No when that cannot be seen.
+bool LacksNewline(const MetadataEntry &queue, const struct stat &opened) {
+    if (opened.st_size == 0) {
+        return false;
+    }
+    struct stat status = {};
+    const UniqueFd fd = queue.OpenFile(O_RDONLY, status);
+    char last = '\n';
+    return fd && status.st_dev == opened.st_dev && status.st_ino == opened.st_ino &&
+           pread(fd.Get(), &last, 1, opened.st_size - 1) == 1 && last != '\n';
+}
+
+/// In one write. What a dying writer left gets its newline first, so as not to take this line with it; what is
+/// written short is cut off again, so as not to take the next one.
+void WriteLine(const MetadataEntry &queue, int fd, const struct stat &opened, const std::string &line) {
+    const std::string text = (LacksNewline(queue, opened) ? "\n" : "") + line;
+    const ssize_t written = write(fd, text.data(), text.size());
+    if (written == static_cast<ssize_t>(text.size())) {
+        return;
+    }
+    if (written > 0) {
+        (void)ftruncate(fd, opened.st_size);  // or else the next writer sees that the newline lacks
+    }
+    if (WantDebugRecords()) {
         syslog(LOG_ERR, "%s:%d write fail, (%ld, %ld)", kUtilsModule, 502, static_cast<long>(written),
-               static_cast<long>(line.size()));
+               static_cast<long>(text.size()));
     }
 }
 
 /// Appends the line under the queue's own lock. True also when the line was written short, and when the lock
-/// stayed busy and the line was dropped: a caller must not be held up, and the daemon rescans what it misses.
-/// False when the queue cannot be used at all.
+/// stayed busy and the line was dropped: a caller must not be held up. False when the queue cannot be used at all.
 bool Append(const std::string &queuePath, const std::string &line) {
     int reopens = 0;
     int lockError = 0;
     for (int attempt = 0; attempt < kLockAttempts;) {
-        UniqueFd fd = OpenForAppend(queuePath);
+        const MetadataEntry queue(queuePath);
+        struct stat opened = {};
+        UniqueFd fd = queue.OpenFile(O_WRONLY | O_APPEND | O_CREAT, opened);
         if (!fd) {
             return false;
         }
@@ -108,13 +124,13 @@ bool Append(const std::string &queuePath, const std::string &line) {
             ++attempt;
             continue;
         }
-        if (!StillNames(queuePath, fd.Get())) {
+        if (!StillNames(queue, fd.Get(), opened)) {
             if (++reopens > kMaxReopens) {
                 return false;
             }
             continue;
         }
-        WriteLine(fd.Get(), line);
+        WriteLine(queue, fd.Get(), opened, line);
         flock(fd.Get(), LOCK_UN);
         return true;
     }
@@ -146,11 +162,13 @@ bool QueueEventOf(std::string &share, int type, const std::string &fullPath, con
     if (isReindexQueued(queuePath) || isReindexQueued(queuePath + kQueueTmpSuffix)) {
         return true;
     }
-    Json::Value record(Json::objectValue);
-    record[kEventKey] = type;
-    record[kPathKey] = fullPath;
-    record[kDataKey] = data;
-    return Append(queuePath, ToString(record) + "\n");
+    if (!CanBeQueued(data)) {
+        return false;
+    }
+    // As ToString writes the object of the three, without a copy of the data.
+    std::string line = "{\"data\":" + ToString(data) + ",\"event\":" + std::to_string(type) + ",\"path\":";
+    AppendQuoted(line, fullPath);
+    return Append(queuePath, line + "}\n");
 }
 
 bool QueueOrMark(int type, const std::string &fullPath, const Json::Value &data,
@@ -169,6 +187,10 @@ bool QueueOrMark(int type, const std::string &fullPath, const Json::Value &data,
 }  // namespace
 
 namespace internal {
+
+bool CanBeQueued(const Json::Value &data) {
+    return CanBeWritten(data, 1);
+}
 
 PendingReindexes::PendingReindexes(std::vector<std::string> sharePaths) : share_paths_(std::move(sharePaths)) {}
 

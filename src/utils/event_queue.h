@@ -50,6 +50,9 @@ private:
     std::map<std::string, KnownQueue> queues_;
 };
 
+/// Not when those who read the line would refuse it.
+bool CanBeQueued(const Json::Value &data);
+
 /// AddCustomEvent for one of several paths of a request; `sharePath` is the tail of `fullPath`.
 bool AddEvent(PendingReindexes &pending, int type, const std::string &fullPath, const std::string &sharePath,
               const Json::Value &data);

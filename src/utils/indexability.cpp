@@ -1,6 +1,7 @@
 #include "names.h"
 #include "no_throw.h"
 #include "scoped.h"
+#include "utils/storage.h"
 
 #include <fileindex/error.h>
 #include <fileindex/indexability.h>
@@ -19,19 +20,22 @@
 #include <cstdlib>
 #include <iterator>
 #include <string>
+#include <string_view>
 
 namespace VORK {
 namespace FILEINDEX {
 
+using internal::HasNul;
 using internal::kUtilsModule;
 
 namespace {
 
-const std::string kSystemPreservedNames[] = {
+// Constants in the program text, so that a thread or a handler that runs at exit finds them as ever.
+constexpr std::string_view kSystemPreservedNames[] = {
     ".TemporaryItems", internal::kDatabaseDir, internal::kQueueFile, ".VORKPPSDB", ".DS_Store",
 };
 
-const std::string kSkippedShares[] = {"surveillance", "NetBackup"};
+constexpr std::string_view kSkippedShares[] = {"surveillance", "NetBackup"};
 
 constexpr unsigned long long kRequiredSpace = 10485760;  // 10 MiB
 
@@ -39,7 +43,7 @@ constexpr int kUnknownFileSystem = -1;
 constexpr int kPseudoFileSystem = 12;
 
 template <typename Table>
-bool Contains(const Table &table, const std::string &entry) {
+bool Contains(const Table &table, std::string_view entry) {
     return std::find(std::begin(table), std::end(table), entry) != std::end(table);
 }
 
@@ -62,6 +66,15 @@ bool IsForeignFileSystem(int type) {
     return VORKFSIsRemoteFS(type) != 0 || VORKFSIsImageFS(type) != 0 || type == kPseudoFileSystem;
 }
 
+/// Anything that is no part of the share's own data, or may not be.
+bool IsExcludedPlace(const std::string &fullPath) {
+    if (IsInRecycleBin(fullPath) || IsInSnapshot(fullPath)) {
+        return true;
+    }
+    const int type = VORKGetFSType(fullPath.c_str(), 0);
+    return type == kUnknownFileSystem || IsForeignFileSystem(type);
+}
+
 /// A mount point is a volume of its own, except that an encrypted share is mounted in its place.
 bool IsForeignMountPoint(const std::string &fullPath, const _tag_VORKSHARE *share) {
     if (VORKFSDirIsMntPoint(fullPath.c_str()) != 1) {
@@ -80,11 +93,14 @@ bool IsRealPath(const std::string &fullPath) {
 }  // namespace
 
 bool IsSystemPreservedFileName(const std::string &name) {
-    return VORKEAIsHiddenDir(name.c_str()) == 1 || Contains(kSystemPreservedNames, name);
+    return (!HasNul(name) && VORKEAIsHiddenDir(name.c_str()) == 1) || Contains(kSystemPreservedNames, name);
 }
 
 bool IsSkipIndex(const std::string &fullPath) {
     return internal::NoThrow([&] {
+        if (HasNul(fullPath)) {
+            return true;  // there is nothing to index; the platform would answer for another path
+        }
         const int type = VORKGetFSType(fullPath.c_str(), 0);
         const std::size_t slash = fullPath.rfind('/');
         if (slash == std::string::npos || IsSystemPreservedFileName(fullPath.substr(slash + 1)) ||
@@ -111,11 +127,8 @@ bool CanPathBeIndexed(const std::string &sharePath) {
 
 bool CanFullPathBeIndexed(const std::string &fullPath) {
     return internal::NoThrow([&] {
-        if (IsInRecycleBin(fullPath) || IsInSnapshot(fullPath)) {
-            return false;
-        }
-        const int type = VORKGetFSType(fullPath.c_str(), 0);
-        if (type == kUnknownFileSystem || IsForeignFileSystem(type)) {
+        // The platform is not asked about a path with a NUL: it would answer for another one.
+        if (!HasNul(fullPath) && IsExcludedPlace(fullPath)) {
             return false;
         }
         std::string shareName;

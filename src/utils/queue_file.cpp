@@ -4,6 +4,7 @@
 #include "json/text.h"
 #include "names.h"
 #include "scoped.h"
+#include "utils/metadata_entry.h"
 
 #include <json/value.h>
 
@@ -15,6 +16,7 @@
 #include <cerrno>
 #include <cstring>
 #include <iterator>
+#include <limits>
 #include <memory>
 #include <optional>
 #include <utility>
@@ -31,8 +33,9 @@ constexpr std::size_t kRoomForMore = 1024;
 /// Some whole lines, newlines included; the file's last line may lack it.
 struct Lines {
     std::string_view text;
-    bool tooLong = false;  ///< the beginning of one line that is passed over
-    off_t offset = 0;      ///< where the text begins in the file
+    bool passed =
+        false;         ///< the beginning of one malformed line that is passed over: too long, or with a hole in it
+    off_t offset = 0;  ///< where the text begins in the file
 };
 
 /// Reads a queue file in blocks and cuts them between lines.
@@ -40,12 +43,8 @@ class BlockReader {
 public:
     /// False with the reason in `errno`.
     bool Open(const std::string &path, struct stat &status) {
-        fd_ = UniqueFd(open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
-        if (!fd_ || fstat(fd_.Get(), &status) != 0) {
-            return false;
-        }
-        if (!S_ISREG(status.st_mode)) {
-            errno = EINVAL;
+        fd_ = MetadataEntry(path).OpenFile(O_RDONLY, status);
+        if (!fd_) {
             return false;
         }
         // Most queues are short: they get no more than they need.
@@ -53,10 +52,10 @@ public:
         return true;
     }
 
-    void StartAt(off_t offset) { read_ = behind_whole_ = offset; }
+    void StartAt(off_t offset) { read_ = after_whole_ = offset; }
 
     /// Where in the file the first line begins that has not been delivered whole.
-    off_t BehindWholeLines() const { return behind_whole_; }
+    off_t AfterWholeLines() const { return after_whole_; }
 
     bool Next(Lines &lines) {
         DropDelivered();
@@ -72,9 +71,10 @@ public:
             if (end > 0) {
                 return Deliver(lines, end);
             }
-            if (!skipping_ && filled_ > kMaxLine) {
+            const bool isPassed = filled_ > kMaxLine || PassHole();
+            if (!skipping_ && isPassed) {
                 skipping_ = true;
-                lines = {{buffer_.get(), kShownOfLongLine}, true, 0};
+                lines = {{buffer_.get(), std::min(filled_, kShownOfLongLine)}, true, 0};
                 return true;
             }
             if (skipping_) {
@@ -103,7 +103,7 @@ private:
         lines = {{buffer_.get(), size}, false, read_ - static_cast<off_t>(filled_)};
         delivered_ = size;
         Pad();
-        behind_whole_ = read_ - static_cast<off_t>(filled_ - size);
+        after_whole_ = read_ - static_cast<off_t>(filled_ - size);
         return true;
     }
 
@@ -117,8 +117,28 @@ private:
     void SkipToNewline() {
         const void *newline = std::memchr(buffer_.get(), '\n', filled_);
         Drop(static_cast<std::size_t>(static_cast<const char *>(newline) - buffer_.get()) + 1);
-        behind_whole_ = read_ - static_cast<off_t>(filled_);
+        after_whole_ = read_ - static_cast<off_t>(filled_);
         skipping_ = false;
+    }
+
+    /// Goes on after a hole, of which what was read last may be the beginning: it reads as NULs, which no line
+    /// holds, and can be longer than anybody could read. False when there is none, or the file system tells of
+    /// none.
+    bool PassHole() {
+        if (!ends_in_nul_) {
+            return false;
+        }
+        off_t data = lseek(fd_.Get(), read_, SEEK_DATA);
+        if (data < 0 && errno == ENXIO) {
+            // No data is left. The end is read all the same: Linux does not find data in the last page a file can
+            // have.
+            data = lseek(fd_.Get(), 0, SEEK_END) - static_cast<off_t>(kBlockSize);
+        }
+        if (data <= read_) {
+            return false;
+        }
+        read_ = data;
+        return true;
     }
 
     /// False at the end of the file; a read error ends it too.
@@ -127,15 +147,19 @@ private:
             // A file that grew, or a line longer than the block and shorter than the longest allowed.
             Grow(std::min(std::max(filled_ * 2, kBlockSize), kMaxLine + kBlockSize));
         }
+        // No further than a file can reach, and no more than a block, of which a hole cannot hide much.
+        const auto upToLast = static_cast<std::size_t>(std::numeric_limits<off_t>::max() - read_);
+        const std::size_t wanted = std::min({capacity_ - filled_, upToLast, kBlockSize});
         ssize_t count = 0;
         do {
-            count = pread(fd_.Get(), buffer_.get() + filled_, capacity_ - filled_, read_);
+            count = pread(fd_.Get(), buffer_.get() + filled_, wanted, read_);
         } while (count < 0 && errno == EINTR);
         if (count <= 0) {
             return false;
         }
         filled_ += static_cast<std::size_t>(count);
         read_ += count;
+        ends_in_nul_ = buffer_[filled_ - 1] == '\0';
         return true;
     }
 
@@ -154,7 +178,8 @@ private:
     std::size_t filled_ = 0;
     std::size_t delivered_ = 0;
     off_t read_ = 0;
-    off_t behind_whole_ = 0;
+    off_t after_whole_ = 0;
+    bool ends_in_nul_ = false;
     bool skipping_ = false;
     bool at_end_ = false;
 };
@@ -233,7 +258,7 @@ bool Contains(std::string_view text, std::string_view part) {
 /// Visits the lines that `wanted` lets pass. False when the visitor has seen enough.
 template <typename Wanted>
 bool Visit(const Lines &lines, LineReader &reader, const QueueVisitor &visit, Wanted wanted) {
-    if (lines.tooLong) {
+    if (lines.passed) {
         return visit(lines.text, nullptr);
     }
     for (std::string_view rest = lines.text; !rest.empty();) {
@@ -286,7 +311,7 @@ bool ScanQueueFrom(const std::string &queueFile, QueuePosition &position, const 
     Lines lines;
     while (blocks.Next(lines) && Visit(lines, reader, visit, kEveryLine)) {
     }
-    position.offset = blocks.BehindWholeLines();
+    position.offset = blocks.AfterWholeLines();
     return true;
 }
 
@@ -331,7 +356,7 @@ bool FindInQueue(const std::string &queueFile, unsigned type, const std::string 
     LineReader reader;
     Lines lines;
     while (blocks.Next(lines)) {
-        if (!lines.tooLong && mayName(lines.text) && !Visit(lines, reader, visit, mayName)) {
+        if (!lines.passed && mayName(lines.text) && !Visit(lines, reader, visit, mayName)) {
             break;
         }
     }

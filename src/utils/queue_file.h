@@ -3,7 +3,8 @@
 ///
 /// The daemon consumes and other processes append while we read: a scan sees what is there when it gets to it.
 /// Lines are separated by "\n"; a last one without it counts. No lock is taken, and no more than a block, or one
-/// line if that is longer, is held in memory.
+/// line if that is longer, is held in memory. A hole in the file reads as NULs and so makes its line malformed; a
+/// large one is passed over without being read.
 #ifndef FILEINDEX_SRC_UTILS_QUEUE_FILE_H
 #define FILEINDEX_SRC_UTILS_QUEUE_FILE_H
 
@@ -25,23 +26,24 @@ struct QueueEvent {
     off_t offset = 0;          ///< where the line begins in the file
 };
 
-/// Gets each line without its newline (of one beyond 1 MiB only the beginning), and its event or null when it is
-/// malformed. False ends the scan.
+/// Gets each line without its newline (of one beyond 1 MiB, or with a large hole in it, only the beginning), and
+/// its event or null when it is malformed. False ends the scan.
 using QueueVisitor = std::function<bool(std::string_view line, const QueueEvent *event)>;
 
-/// Visits all lines in order. False when the file cannot be opened as a regular file, with the reason in `errno`.
+/// Visits all lines in order. False when the file cannot be opened as the share's own regular file
+/// (MetadataEntry), with the reason in `errno`.
 bool ScanQueue(const std::string &queueFile, const QueueVisitor &visit);
 
 /// Where a scan of the same file can go on later.
 struct QueuePosition {
     dev_t device = 0;
     ino_t inode = 0;
-    off_t offset = 0;  ///< behind the last whole line
+    off_t offset = 0;  ///< after the last whole line
 };
 
-/// Visits the well-formed lines of exactly that type, from `position` on: from the start when the file at the path
-/// is another one by now or has become shorter. Moves `position` behind the last whole line; a line without its
-/// newline is visited now and again later. Result as ScanQueue.
+/// Visits all lines from `position` on: from the start when the file at the path is another one by now or has
+/// become shorter. Moves `position` past the last whole line; a line without its newline is visited now and again
+/// later. Result as ScanQueue.
 ///
 /// `restarted` is called before the first line when the scan begins at the start.
 bool ScanQueueFrom(const std::string &queueFile, QueuePosition &position, const std::function<void()> &restarted,

@@ -1,13 +1,13 @@
 #include "names.h"
 #include "no_throw.h"
 #include "scoped.h"
+#include "utils/metadata_entry.h"
 
 #include <fileindex/fileidx.h>
 
 #include <vork/error.h>
 #include <vork/metadata.h>
 
-#include <sys/stat.h>
 #include <syslog.h>
 
 #include <cerrno>
@@ -102,7 +102,7 @@ int FILEIDXDBPathGet(const char *szName, char *szOutDBPath, int cbOutLen) {
             }
             const int length = CopyOut(location, szOutDBPath, cbOutLen);
             // From the whole path: a caller's short buffer must not make a directory of another name.
-            if (mkdir(location.c_str(), 0777) != 0 && errno != EEXIST) {
+            if (!MetadataEntry(location).MakeDirectory(0777) && errno != EEXIST) {
                 syslog(LOG_ERR, "%s:%d mkdir failed, path=%s, reason=%m", kUtilsModule, kDatabaseMkdirLine,
                        location.c_str());
             }

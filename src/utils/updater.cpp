@@ -1,3 +1,4 @@
+#include "folder_access.h"
 #include "names.h"
 #include "no_throw.h"
 #include "utils/services.h"
@@ -67,7 +68,7 @@ bool Updater_zol60_beta2() {
     return NoThrow([] {
         Folders store;
         std::vector<Folder> folders;
-        if (!store.Load() || !store.List(folders)) {
+        if (!FolderAccess::Load(store) || !store.List(folders)) {
             return false;
         }
         return folders.empty() ? StopIndexing() : StartIndexing(folders);
