@@ -13,7 +13,7 @@
 
 namespace fileindexctl {
 
-/// What comes behind a parameter's name; for a positional argument, how often it may stand.
+/// What comes after a parameter's name; for a positional argument, how often it may stand.
 enum class Takes {
     Nothing,
     One,
@@ -27,7 +27,8 @@ enum class Takes {
 struct Parameter {
     std::string_view name;
     Takes takes;
-    std::string_view value;  ///< what an option takes, for the help; empty for flags and positional arguments
+    std::string_view value;  ///< what an option takes, for the help; what completion offers for a positional
+                             ///< argument, if its name does not say so
     std::string_view help;
     std::span<const std::string_view> choices{};  ///< the only values allowed; none given: any
     std::string_view letter{};                    ///< a short form of the name: "-o"
@@ -42,7 +43,7 @@ struct Command {
     std::string_view help;
     std::span<const Parameter> parameters;
     ExitStatus (*run)(const Arguments &, Output &);
-    bool hidden = false;  ///< for the build, not for users
+    bool hidden = false;  ///< for the build and the completions, not for users
 };
 
 /// All commands, in the order in which help shows them.

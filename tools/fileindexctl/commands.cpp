@@ -13,7 +13,8 @@ constexpr Parameter kName = {"--name", Takes::One, "NAME", "the name that people
 
 constexpr Parameter kWait = {
     "--wait", Takes::Number, "SECONDS",
-    "how long to go on trying while another program holds a lock, before exit status 75; 0 if not given"};
+    "how long to keep trying while another program holds a lock (default 5; 0 tries once); "
+    "then exit status 75"};
 
 constexpr Parameter kList[] = {
     {"--share", Takes::One, "SHARE", "only the folders of this share"},
@@ -26,10 +27,11 @@ constexpr Parameter kList[] = {
 };
 constexpr Parameter kFolder[] = {{"PATH", Takes::One, "", "the indexed folder: /SHARE/..."}};
 constexpr Parameter kAdd[] = {
-    {"PATH", Takes::One, "", "the folder: /SHARE/..."},
+    {"PATH", Takes::One, "PLACE", "the folder: /SHARE/..."},
     {"--name", Takes::One, "NAME", "the name that people are shown; if not given, the last part of the path"},
     {"--media", Takes::One, "KINDS",
      "what to index: document, audio, video and photo, with commas between; all (if not given); none"},
+    {"--force", Takes::Nothing, "", "also a folder that is yet to come"},
     kWait,
 };
 constexpr Parameter kSet[] = {{"PATH", Takes::One, "", "the indexed folder: /SHARE/..."}, kName, kMedia, kWait};
@@ -40,10 +42,10 @@ constexpr Parameter kRemove[] = {
     kYes,
     kWait,
 };
-constexpr Parameter kQuestion[] = {{"PATH", Takes::One, "", "a share path (/SHARE/...) or a full path"}};
+constexpr Parameter kQuestion[] = {{"PATH", Takes::One, "ENTRY", "a share path (/SHARE/...) or a full path"}};
 constexpr Parameter kPause[] = {
-    {"HOURS", Takes::Optional, "", "for how long: 8h or 8; 0 or nothing: without an end"},
-    {"--until", Takes::One, "HH:MM", "until this local time comes next"},
+    {"TIME", Takes::Optional, "", "for how long: 8h or 8, 90m, 1h30m, 2d; 0 or nothing: without an end"},
+    {"--until", Takes::One, "HH:MM", "until this local time comes next: 07:00 or 7:00"},
     kWait,
     {"--run", Takes::Rest, "COMMAND ...",
      "while this command, the rest of the line, runs; its exit status is kept; SIGKILL leaves the pause behind, "
@@ -58,17 +60,19 @@ constexpr Parameter kStatus[] = {
 };
 constexpr Parameter kDoctor[] = {
     {"--fix", Takes::Nothing, "",
-     "mend what can be mended: shows the difference first, and keeps copies of files"},
+     "mend what doctor can: shows each change first and keeps copies of files; configuration that is another's is "
+     "given to root, a lock file that is another's is removed and made anew"},
     {"--yes", Takes::Nothing, "", "mend without asking"},
     kWait,
 };
-constexpr Parameter kReindex[] = {{"PATH", Takes::Many, "", "share paths in or of indexed folders"}, kWait};
+constexpr Parameter kReindex[] = {{"PATH", Takes::Many, "PLACE", "share paths in or of indexed folders"}, kWait};
 constexpr Parameter kRevive[] = {{"SHARE", Takes::Many, "", "names of shares"}, kWait};
 constexpr Parameter kShare[] = {{"SHARE", Takes::One, "", "the name of the share"}};
 constexpr Parameter kShareRename[] = {
     {"OLD", Takes::One, "", "the name that the share had"},
     {"NEW", Takes::One, "", "the name that the share has now"},
-    {"--yes", Takes::Nothing, "", "overwrite the settings of folders that both names have without asking"},
+    {"--yes", Takes::Nothing, "",
+     "without asking, overwrite settings of folders that are indexed under both names"},
     kWait,
 };
 constexpr Parameter kShareRemove[] = {{"SHARE", Takes::One, "", "the name of the share"}, kYes, kWait};
@@ -81,6 +85,11 @@ constexpr Parameter kQueueShow[] = {kOneShare, {"--limit", Takes::Number, "N", "
 constexpr Parameter kQueueCount[] = {kOneShare};
 constexpr std::string_view kShells[] = {"bash", "zsh", "fish"};
 constexpr Parameter kCompletion[] = {{"SHELL", Takes::One, "", "the shell that reads it", kShells}};
+constexpr Parameter kHelp[] = {
+    {"COMMAND", Takes::Optional, "", "the command, or the first word of one that has two"},
+    {"WORD", Takes::Optional, "", "its second word"},
+};
+constexpr Parameter kPlaces[] = {{"WORD", Takes::Optional, "", "the word so far"}};
 constexpr Parameter kExport[] = {
     {"--output", Takes::One, "FILE", "write this file, whole or not at all", {}, "-o"},
 };
@@ -91,7 +100,10 @@ constexpr Parameter kImport[] = {
     kYes,
     kWait,
 };
-constexpr Parameter kMigrate[] = {{"--dry-run", Takes::Nothing, "", "only say what would be done"}};
+constexpr Parameter kMigrate[] = {
+    {"--dry-run", Takes::Nothing, "", "only say what would be done"},
+    {"--yes", Takes::Nothing, "", "also go on with shares that are paused, without asking"},
+};
 
 constexpr struct {
     std::string_view name;
@@ -103,37 +115,46 @@ constexpr struct {
 constexpr Command kCommands[] = {
     {"", "list", "Show the indexed folders", kList, ListFolders},
     {"", "show", "Show one indexed folder", kFolder, ShowFolder},
-    {"", "add", "Have a folder indexed", kAdd, AddFolder},
+    {"", "add", "Have a folder indexed; the first folder restarts the file-sharing service", kAdd, AddFolder},
     {"", "set", "Change an indexed folder; without options, tell everybody about it again", kSet, SetFolder},
-    {"", "remove", "Stop indexing folders", kRemove, RemoveFolders},
-    {"", "check", "Is the path indexed?", kQuestion, CheckPath},
+    {"", "remove", "Stop indexing folders; the last one restarts the file-sharing service", kRemove,
+     RemoveFolders},
+    {"", "check", "Would the path be found in the index? If not, exit status 1 and the reason", kQuestion,
+     CheckPath},
     {"", "contains", "Does an indexed folder lie at or under the path?", kQuestion, ContainsFolder},
-    {"", "governs", "Whose settings hold for the path?", kQuestion, GoverningFolder},
+    {"", "governs", "Which indexed folders cover the path, and whose settings hold for it?", kQuestion,
+     GoverningFolder},
     {"", "explain", "Why a path is indexed or not, rule by rule; exit status 1 if it may not be", kQuestion,
      ExplainPath},
     {"", "status", "How far indexing is, and what waits", kStatus, ShowStatus},
-    {"", "doctor", "Find out what is wrong, and mend it; exit status 1 while something is", kDoctor,
-     ExamineSystem},
+    {"", "doctor", "Find out what is wrong; --fix mends it; exit status 1 while something is (notes do not count)",
+     kDoctor, ExamineSystem},
     {"", "pause", "Pause indexing", kPause, PauseIndexing},
     {"", "resume", "Go on with indexing", kResume, ResumeIndexing},
     {"", "reindex", "Have paths indexed again", kReindex, ReindexPaths},
     {"", "revive", "Go on with shares that were out of space", kRevive, ReviveShares},
     {"share", "rename", "Move the indexed folders of a share that was renamed", kShareRename, RenameShare},
-    {"share", "remove", "Forget the indexed folders of a share", kShareRemove, RemoveShare},
+    {"share", "remove", "Forget the indexed folders of a share; the last one restarts the file-sharing service",
+     kShareRemove, RemoveShare},
     {"share", "pause", "Stop the worker and the monitor of a share", kShare, PauseShare},
     {"share", "resume", "Start the monitor and the worker of a share again", kShare, ResumeShare},
     {"share", "clean", "Delete the queue and the index database of a share", kShareClean, CleanShare},
     {"monitor", "show", "Compare what is watched with what should be", kMonitorShow, ShowMonitor},
-    {"monitor", "refresh", "Have watched what should be, also on shares that are paused", kMonitorRefresh,
-     RefreshMonitors},
+    {"monitor", "refresh", "Register what should be watched; a paused share only when it is named",
+     kMonitorRefresh, RefreshMonitors},
     {"queue", "show", "Show the events that wait, the oldest first", kQueueShow, ShowQueue},
     {"queue", "count", "Count the events that wait", kQueueCount, CountQueue},
     {"", "metrics", "Write what can be measured in the text format of Prometheus", {}, ShowMetrics},
     {"", "export", "Write folders and status as one JSON document", kExport, ExportConfiguration},
     {"", "import", "Bring folders and status into the state that a document holds", kImport, ImportConfiguration},
     {"", "completion", "Write what completes command lines in a shell", kCompletion, WriteCompletion},
+    {"", "help", "Show what there is, or what a command takes", kHelp, ShowHelp},
     {"", "manual", "Write the manual page", {}, WriteManual, true},
-    {"", "migrate", "Bring everything into line with the folders after an upgrade", kMigrate, Migrate},
+    {"", "places", "Write what a share path can go on with", kPlaces, WritePlaces, true},
+    {"", "migrate",
+     "Bring everything into line with the folders after an upgrade; switches search on; the file-sharing service "
+     "learns of it at its next start",
+     kMigrate, Migrate},
 };
 
 }  // namespace

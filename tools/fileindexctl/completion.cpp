@@ -1,9 +1,17 @@
 #include "completion.h"
 
 #include "handlers.h"
+#include "paths.h"
+#include "platform_file.h"
+
+#include <fileindex/indexability.h>
+#include <fileindex/paths.h>
+
+#include <vork/filesystem.h>
 
 #include <algorithm>
 #include <array>
+#include <filesystem>
 
 namespace fileindexctl {
 
@@ -15,11 +23,18 @@ std::string OfferFor(const Parameter &parameter) {
     if (!words.empty()) {
         return words;
     }
-    const std::string_view placeholder = parameter.IsOption() ? parameter.value : parameter.name;
+    const std::string_view placeholder =
+        parameter.IsOption() || !parameter.value.empty() ? parameter.value : parameter.name;
+    if (placeholder == "COMMAND" && !parameter.IsOption()) {
+        for (const auto &word : WordsOf("")) {
+            words += (words.empty() ? "" : " ") + std::string(word.word);
+        }
+        return words;
+    }
     if (placeholder == "OLD" || placeholder == "NEW") {
         return "SHARE";
     }
-    constexpr std::array<std::string_view, 4> kOffered = {"PATH", "SHARE", "FILE", "KINDS"};
+    constexpr std::array<std::string_view, 6> kOffered = {"PATH", "ENTRY", "PLACE", "SHARE", "FILE", "KINDS"};
     const bool isOffered = std::find(kOffered.begin(), kOffered.end(), placeholder) != kOffered.end();
     return isOffered ? std::string(placeholder) : std::string();
 }
@@ -68,6 +83,35 @@ std::string SingleQuoted(std::string_view text, std::string_view quote) {
     return result + "'";
 }
 
+// For the scripts: the shares, or what the indexer would go into in the directory that the word names so far. A
+// share path ends with "/", so that the next part can follow.
+ExitStatus WritePlaces(const Arguments &arguments, Output &output) {
+    const std::string word = arguments.One("WORD");
+    const std::string head = word.substr(0, word.rfind('/') + 1);
+    if (head.size() <= 1) {
+        for (const auto &share : ConfiguredShares()) {
+            output.Raw(IsSharePresent(share) ? "/" + share + "/\n" : "");
+        }
+        return ExitStatus::Done;
+    }
+    std::string directory;
+    if (!VORK::FILEINDEX::GetFullPath(directory, head.substr(0, head.size() - 1)) ||
+        VORKFSIsRemoteFS(VORKGetFSType(directory.c_str(), 0)) != 0) {
+        return ExitStatus::Done;  // such a server may never answer
+    }
+    std::error_code error;
+    for (std::filesystem::directory_iterator entry(directory, error), end; !error && entry != end;
+         entry.increment(error)) {
+        // As the listing tells, for the server of one that is mounted here may be dead.
+        const std::string name = entry->path().filename();
+        const bool isOffered = !entry->is_symlink(error) && entry->is_directory(error) &&
+                               name.find('\n') == std::string::npos &&
+                               !VORK::FILEINDEX::IsSkipIndex(entry->path());
+        output.Raw(isOffered ? head + name + "/\n" : "");
+    }
+    return ExitStatus::Done;
+}
+
 ExitStatus WriteCompletion(const Arguments &arguments, Output &output) {
     const std::string shell = arguments.One("SHELL");
     const std::string script = shell == "bash"  ? BashCompletion()
@@ -75,7 +119,7 @@ ExitStatus WriteCompletion(const Arguments &arguments, Output &output) {
                                                 : FishCompletion();
     output.Data()["shell"] = shell;
     output.Data()["script"] = script;
-    output.Text(script);
+    output.Raw(script);
     return ExitStatus::Done;
 }
 

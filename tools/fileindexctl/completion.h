@@ -18,8 +18,9 @@ std::string FishCompletion();
 /// \name For the three of them
 /// @{
 
-/// What a parameter takes: "PATH", "SHARE", "FILE", "KINDS" (kKinds, with commas
-/// between), or its choices with blanks between; empty: nothing to offer.
+/// What a parameter takes: "PATH" (an indexed folder), "ENTRY" (one, or a full path), "PLACE" (a share path, part
+/// by part), "SHARE", "FILE", "KINDS" (kKinds, with commas between), or its choices with blanks between; empty:
+/// nothing to offer.
 std::string OfferFor(const Parameter &parameter);
 
 /// The kinds of files.

@@ -10,10 +10,12 @@ constexpr const char *kHead = R"bash(# bash completion for fileindexctl, made by
 _fileindexctl_offer() {
     local kind
     case $1 in
-    PATH)
+    PATH) fileindexctl list --paths 2>/dev/null ;;
+    ENTRY)
         fileindexctl list --paths 2>/dev/null
-        compgen -f -- "$2"
+        [[ $2 != /* ]] || compgen -f -- "$2"
         ;;
+    PLACE) fileindexctl places "$2" 2>/dev/null ;;
     SHARE) fileindexctl list --paths 2>/dev/null | cut -d / -f 2 | sort -u ;;
     FILE) compgen -f -- "$2" ;;
     KINDS)
@@ -73,7 +75,8 @@ constexpr const char *kTail = R"bash(    *) return ;;
     # The word as typed: without its quotes.
     cur=${cur#[\"\']}
     cur=${cur//\\/}
-    [[ $offer != PATH && $offer != FILE ]] || compopt -o filenames 2>/dev/null
+    [[ $offer != @(PATH|ENTRY|PLACE|FILE) ]] || compopt -o filenames 2>/dev/null
+    [[ $offer != PLACE ]] || compopt -o nospace 2>/dev/null
     while IFS= read -r word; do
         [[ $word != "$cur"* ]] || COMPREPLY+=("$word")
     done < <(_fileindexctl_offer "$offer" "$cur")

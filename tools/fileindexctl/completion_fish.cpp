@@ -24,6 +24,15 @@ function __fileindexctl_paths
     fileindexctl list --paths 2>/dev/null
 end
 
+function __fileindexctl_entries
+    __fileindexctl_paths
+    string match -q -- '/*' (commandline -ct); and __fish_complete_path (commandline -ct)
+end
+
+function __fileindexctl_places
+    fileindexctl places (string unescape -- (commandline -ct)) 2>/dev/null
+end
+
 function __fileindexctl_shares
     fileindexctl list --paths 2>/dev/null | string replace -r '^/([^/]*).*' '$1' | sort -u
 end
@@ -42,7 +51,13 @@ std::string Quoted(std::string_view text) {
 std::string OfferOf(const Parameter &parameter) {
     const std::string offer = OfferFor(parameter);
     if (offer == "PATH") {
-        return " -F -a '(__fileindexctl_paths)'";
+        return " -a '(__fileindexctl_paths)'";
+    }
+    if (offer == "ENTRY") {
+        return " -a '(__fileindexctl_entries)'";
+    }
+    if (offer == "PLACE") {
+        return " -a '(__fileindexctl_places)'";
     }
     if (offer == "SHARE") {
         return " -a '(__fileindexctl_shares)'";

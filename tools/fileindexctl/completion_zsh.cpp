@@ -11,7 +11,17 @@ _fileindexctl_paths() {
     local -a folders
     folders=(${(f)"$(fileindexctl list --paths 2>/dev/null)"})
     compadd -a folders
-    _files
+}
+
+_fileindexctl_entries() {
+    _fileindexctl_paths
+    [[ $PREFIX != /* ]] || _files
+}
+
+_fileindexctl_places() {
+    local -a places
+    places=(${(f)"$(fileindexctl places "${(Q)PREFIX}" 2>/dev/null)"})
+    compadd -S '' -a places
 }
 
 _fileindexctl_shares() {
@@ -50,6 +60,12 @@ std::string ActionOf(const Parameter &parameter) {
     const std::string offer = OfferFor(parameter);
     if (offer == "PATH") {
         return "_fileindexctl_paths";
+    }
+    if (offer == "ENTRY") {
+        return "_fileindexctl_entries";
+    }
+    if (offer == "PLACE") {
+        return "_fileindexctl_places";
     }
     if (offer == "SHARE") {
         return "_fileindexctl_shares";

@@ -12,7 +12,10 @@ namespace fileindexctl {
 
 class ConfigLock {
 public:
-    ConfigLock(VORK::FILEINDEX::Config &config, Patience &patience) : config_(config), held_(config.Lock(true)) {
+    /// Throws Failure when this user may not change the configuration.
+    ConfigLock(VORK::FILEINDEX::Config &config, Patience &patience) : config_(config) {
+        RequireMayChange();
+        held_ = config.Lock(true);
         while (!held_ && FailureOf(config_).Status() == ExitStatus::Busy && patience.Again()) {
             config_.Unlock();
             held_ = config_.Lock(true);
@@ -27,7 +30,7 @@ public:
 
 private:
     VORK::FILEINDEX::Config &config_;
-    bool held_;
+    bool held_ = false;
 };
 
 }  // namespace fileindexctl

@@ -19,6 +19,7 @@ namespace fileindexctl {
 namespace {
 
 constexpr int kVersion = 1;
+constexpr int kDeepest = 256;  // as in the configuration files
 constexpr long long kNotPaused = -1;
 
 // Shares and markers are members with names of their own, which the library's questions cannot list.
@@ -84,6 +85,7 @@ public:
     Json::Value Parse(const std::string &text) const {
         Json::CharReaderBuilder builder;
         Json::CharReaderBuilder::strictMode(&builder.settings_);
+        builder.settings_["stackLimit"] = kDeepest;
         const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
         Json::Value document;
         std::string errors;
@@ -91,8 +93,8 @@ public:
             if (reader->parse(text.data(), text.data() + text.size(), &document, &errors)) {
                 return document;
             }
-        } catch (const Json::Exception &exception) {  // nested too deeply
-            errors = exception.what();
+        } catch (const Json::Exception &) {
+            Fault({}, "it is nested more deeply than " + std::to_string(kDeepest) + " levels");
         }
         std::replace(errors.begin(), errors.end(), '\n', ' ');
         Fault({}, "this is no JSON: " + errors.substr(0, errors.find_last_not_of(' ') + 1));

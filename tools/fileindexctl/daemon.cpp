@@ -61,17 +61,17 @@ DaemonCondition ConditionOf(int error) {
 DaemonState ProbeDaemon() {
     const int error = FindOut();
     if (error == 0) {
-        return {true, "reachable", DaemonCondition::Listening, true};
+        return {"reachable", DaemonCondition::Listening, true};
     }
     if (error == EAGAIN) {
-        return {true, "reachable, but its backlog is full", DaemonCondition::Full, true};
+        return {"reachable, but its backlog is full", DaemonCondition::Full, true};
     }
     const DaemonCondition condition = ConditionOf(error);
     if (condition == DaemonCondition::Denied && FindListener(kDaemonSocket) != Listener::NotSeen) {
-        return {false, "at work, but not reachable by this user", condition, true};
+        return {"listening, but not reachable by this user", condition, true};
     }
     const bool none = condition == DaemonCondition::Absent || condition == DaemonCondition::Stale;
-    return {false, std::string("not reachable: ") + std::strerror(error), condition,
+    return {std::string("not reachable: ") + std::strerror(error), condition,
             none ? std::optional(false) : std::nullopt};
 }
 

@@ -3,6 +3,8 @@
 #ifndef FILEINDEXCTL_DAEMON_H
 #define FILEINDEXCTL_DAEMON_H
 
+#include <json/value.h>
+
 #include <optional>
 #include <string>
 
@@ -20,10 +22,12 @@ enum class DaemonCondition {
 };
 
 struct DaemonState {
-    bool reachable;  ///< by this user
     std::string text;
     DaemonCondition condition;
-    std::optional<bool> listens;  ///< nothing when it cannot be told
+    std::optional<bool> listens;  ///< to whomever; nothing when it cannot be told
+
+    /// "daemon" for programs: whether it listens, null when that cannot be told.
+    Json::Value ForPrograms() const { return listens ? Json::Value(*listens) : Json::Value(); }
 };
 
 /// Asks the kernel who listens. Only when it sees nobody, a connection is tried, without sending anything: a

@@ -12,7 +12,7 @@ namespace fileindexctl {
 enum class ExitStatus {
     Done = 0,            ///< done, or the answer is yes
     No = 1,              ///< the answer is no, or the person asked said no
-    Usage = 64,          ///< the command line asks for something that cannot be meant
+    Usage = 64,          ///< the command line is wrong or makes no sense
     Malformed = 65,      ///< a configuration file is not what it should be
     NoSuchFolder = 66,   ///< no such folder, or no such share
     Unreachable = 69,    ///< the daemon or a service failed, and nothing has been changed

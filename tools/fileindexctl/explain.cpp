@@ -2,6 +2,7 @@
 #include "failure.h"
 #include "folder_text.h"
 #include "handlers.h"
+#include "kinds.h"
 #include "paths.h"
 #include "queue.h"
 #include "rules.h"
@@ -38,6 +39,8 @@ struct Explanation {
     std::vector<std::string> covering{};
     Json::Value governing{};   // the record; null when there is none
     std::string passedOver{};  // the first part of the path that the indexer passes over
+    std::string kind{};        // of a file
+    std::string kindOff{};     // why that keeps it out of the governing folder
     std::optional<Backlog> backlog{};
     std::string queueTrouble{};            // why there is none
     std::vector<std::string> reindexed{};  // full paths above the place whose reindex is queued
@@ -67,29 +70,6 @@ Place PlaceToExplain(const std::string &given, const Folders &folders) {
         place.fullPath += place.fullPath.empty() && !place.isFull ? "" : tail;
     }
     return place;
-}
-
-// `path` and what it lies in, the outermost first, as far as `top`.
-std::vector<std::string> DownFrom(const std::string &top, const std::string &path) {
-    std::vector<std::string> result{path};
-    for (std::string outer = path; outer.size() > top.size();) {
-        outer.erase(outer.rfind('/'));
-        if (!LiesIn(outer, top)) {
-            break;
-        }
-        result.insert(result.begin(), outer);
-    }
-    return result;
-}
-
-// The indexer walks down from a folder and goes into nothing that it passes over.
-std::string FirstPassedOver(const std::string &top, const std::string &path) {
-    for (const auto &part : DownFrom(top, path)) {
-        if (VORK::FILEINDEX::IsSkipIndex(part)) {
-            return part;
-        }
-    }
-    return {};
 }
 
 ShareFlags FlagsOf(const std::string &share) {
@@ -140,7 +120,14 @@ Explanation Look(const Place &place, const Folders &folders) {
     const std::string share = ShareOf(place.sharePath);
     const std::string top = TopOf(explanation.covering, place.fullPath, folders);
     if (!place.fullPath.empty()) {
-        explanation.passedOver = FirstPassedOver(top, place.fullPath);
+        std::string folder = place.fullPath;
+        if (!explanation.governing.isNull()) {
+            VORK::FILEINDEX::GetFullPath(folder, explanation.governing["path"].asString());
+        }
+        explanation.passedOver = FirstPassedOver(folder, place.fullPath);
+        if (explanation.verdict.indexable && !explanation.governing.isNull()) {
+            explanation.kindOff = ObstacleOfKind(place.fullPath, explanation.governing, explanation.kind);
+        }
     }
     if (!place.fullPath.empty() && !share.empty()) {
         AddQueued(share, top, explanation);
@@ -165,6 +152,10 @@ std::string RemedyFor(const Explanation &explanation) {
     }
     if (explanation.covering.empty()) {
         return "\"fileindexctl add " + ShellWord(explanation.place.sharePath) + "\" has it indexed";
+    }
+    if (!explanation.kindOff.empty()) {
+        return explanation.kindOff + "; \"fileindexctl set " +
+               ShellWord(explanation.governing["path"].asString()) + " --media\" changes what is indexed";
     }
     if (!explanation.share.hasRoom) {
         return "make room on the volume of the share (10 MiB), then \"fileindexctl revive " + share + "\"";
@@ -194,6 +185,11 @@ std::string QueuedText(const Explanation &explanation) {
         text += "; covered by the queued reindex of " + Enumerate(explanation.reindexed);
     }
     return text;
+}
+
+std::string KindText(const Explanation &explanation) {
+    const std::string kind = explanation.kind.empty() ? "no file" : explanation.kind;
+    return explanation.kindOff.empty() ? kind : explanation.kindOff;
 }
 
 std::string FlagsText(const ShareFlags &flags) {
@@ -240,6 +236,7 @@ void ShowFacts(const Explanation &explanation, Output &output) {
          {"indexable", explanation.verdict.indexable ? "yes" : "no" + reason},
          {"covered by", explanation.covering.empty() ? "no indexed folder" : Enumerate(explanation.covering)},
          {"governed by", settings},
+         {"kind", KindText(explanation)},
          {"passed over", explanation.passedOver.empty() ? "no" : "yes, at " + explanation.passedOver},
          {"queued", QueuedText(explanation)},
          {"share", FlagsText(explanation.share)},
@@ -260,7 +257,7 @@ void ShowRules(const Verdict &verdict, Output &output) {
     output.Line("");
     output.Line(lines.front());
     for (std::size_t i = 0; i < verdict.rules.size(); ++i) {
-        output.Line(output.Paint(kColours[static_cast<int>(verdict.rules[i].result)], lines[i + 1]));
+        output.Line(lines[i + 1], kColours[static_cast<int>(verdict.rules[i].result)]);
     }
 }
 
@@ -294,6 +291,8 @@ void FillData(const Explanation &explanation, const std::string &remedy, Json::V
     data["remedy"] = Text(remedy);
     data["covered_by"] = ToArray(explanation.covering);
     data["governed_by"] = explanation.governing;
+    data["kind"] = Text(explanation.kind);
+    data["kind_off"] = Text(explanation.kindOff);
     data["passed_over"] = Text(explanation.passedOver);
     data["queue"] = explanation.backlog ? BacklogJson(*explanation.backlog) : Json::Value();
     data["reindexed_with"] = ToArray(explanation.reindexed);

@@ -23,7 +23,7 @@ ExitStatus ExportConfiguration(const Arguments &arguments, Output &output) {
     const Json::Value document = DocumentOf(folders, StoredStatus());
     if (!arguments.Has("--output")) {
         output.Data() = document;
-        output.Line(Serialise(document));
+        output.Raw(Serialise(document) + "\n");
         return ExitStatus::Done;
     }
     const std::string file = arguments.One("--output");

@@ -1,12 +1,16 @@
 #include "failure.h"
 
 #include "records.h"
+#include "status_file.h"
 
 #include <fileindex/error.h>
+#include <fileindex/folders.h>
+#include <fileindex/status.h>
 
 #include <vork/error.h>
 
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <sys/statvfs.h>
 #include <unistd.h>
 
@@ -24,23 +28,23 @@ bool IsDenied(int error) {
     return error == EACCES || error == EPERM || error == EROFS;
 }
 
-// A lock that cannot be opened has the same code as one that is busy. The flags are those of the library: a
-// sticky directory may deny O_CREAT where it would allow a plain open.
-bool MayNotOpenLock(const std::string &path) {
-    const int descriptor = open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0644);
-    if (descriptor < 0) {
-        return IsDenied(errno);
-    }
-    close(descriptor);
-    return false;
-}
-
 bool MayNot(const std::string &path, int mode) {
     return faccessat(AT_FDCWD, path.c_str(), mode, AT_EACCESS) != 0 && IsDenied(errno);
 }
 
+// All causes have one code. The file is only looked at: one that is made here might be a stranger's for root.
 Failure LockFailure(const std::string &path) {
-    if (MayNotOpenLock(path)) {
+    struct stat status {};
+    const bool isThere = lstat(path.c_str(), &status) == 0;
+    if (isThere && !S_ISREG(status.st_mode)) {
+        return {ExitStatus::CannotSave, path + " is no regular file, so it does not count as a lock; remove it"};
+    }
+    if (isThere && status.st_uid != 0 && status.st_uid != geteuid()) {
+        return {ExitStatus::Permission, path + " belongs to user " + std::to_string(status.st_uid) +
+                                            ", so it does not count as a lock; \"fileindexctl doctor --fix\" "
+                                            "replaces it if it is empty"};
+    }
+    if (MayNotWrite(path)) {
         return Denied(path);
     }
     return {ExitStatus::Busy, path + " is locked by another program; try again"};
@@ -61,7 +65,11 @@ Failure SaveFailure(const std::string &path) {
     if (access(directory.c_str(), F_OK) != 0) {
         return {ExitStatus::CannotSave, path + " cannot be saved: there is no directory " + directory};
     }
-    return {ExitStatus::CannotSave, path + " cannot be saved; the old content stands"};
+    struct statvfs status {};
+    const bool isFull = statvfs(directory.c_str(), &status) == 0 && status.f_bavail == 0;
+    return {ExitStatus::CannotSave, path + " cannot be saved" +
+                                        (isFull ? ": no room is left on its file system" : "") +
+                                        (access(path.c_str(), F_OK) == 0 ? "; the old content stands" : "")};
 }
 
 }  // namespace
@@ -73,6 +81,24 @@ Failure Denied(const std::string &path) {
         return {ExitStatus::Permission, path + " cannot be written: " + std::strerror(EROFS)};
     }
     return {ExitStatus::Permission, "no permission for " + path + "; run this as the administrator"};
+}
+
+Failure ErrnoFailure(const std::string &path, const char *what) {
+    const int error = errno;
+    return {IsDenied(error) ? ExitStatus::Permission : ExitStatus::CannotSave,
+            path + " cannot be " + what + ": " + std::strerror(error)};
+}
+
+void RequireMayChange() {
+    if (geteuid() == 0) {
+        return;  // what root makes counts for everybody
+    }
+    for (const std::string &path : {VORK::FILEINDEX::Folders().GetPath(), VORK::FILEINDEX::Status().GetPath()}) {
+        const std::string directory = path.substr(0, path.rfind('/'));
+        if (MayNotWrite(path) || access(directory.c_str(), F_OK) != 0) {
+            throw Denied(path);
+        }
+    }
 }
 
 bool MayNotWrite(const std::string &path) {
@@ -106,6 +132,10 @@ Failure FailureOf(const Config &config) {
         case FILEINDEX_ERR_BAD_PARAM:
             return {ExitStatus::Usage, "the library refused the request: " + Records().Last()};
         default:
+            if (StatusFile file;
+                file.GetPath() == config.GetPath() && file.Load() && !file.Document().isObject()) {
+                return {ExitStatus::Malformed, config.GetPath() + " is not a JSON object"};
+            }
             return {ExitStatus::Partly, "the library failed without a reason: " + Records().Last()};
     }
 }

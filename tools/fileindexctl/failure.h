@@ -32,8 +32,15 @@ void ForgetErrors();
 /// Is it for lack of permission that the file cannot be written, or made in its directory?
 bool MayNotWrite(const std::string &path);
 
+/// Throws Failure unless this user may write both files of the configuration. Comes before all that may take one
+/// of their locks, as events that cannot be queued do: a lock file that an ordinary user made would keep root out.
+void RequireMayChange();
+
 /// What to say when a file may not be read or written.
 Failure Denied(const std::string &path);
+
+/// "PATH cannot be WHAT", for the reason in errno.
+Failure ErrnoFailure(const std::string &path, const char *what);
 
 /// The library's last error code in words and as an exit status, for an operation on the file of `config`.
 Failure FailureOf(const VORK::FILEINDEX::Config &config);

@@ -3,16 +3,23 @@
 #include "folder_text.h"
 #include "handlers.h"
 #include "paths.h"
+#include "registrations.h"
+#include "rules.h"
 #include "steps.h"
+#include "system_services.h"
 #include "text.h"
 
 #include <fileindex/folders.h>
 #include <fileindex/index_mgr.h>
 #include <fileindex/indexability.h>
 
+#include <vork/filesystem.h>
 #include <vork/search.h>
 
+#include <sys/stat.h>
+
 #include <algorithm>
+#include <cerrno>
 
 namespace fileindexctl {
 
@@ -23,14 +30,19 @@ using VORK::FILEINDEX::IndexMgr;
 
 constexpr std::string_view kIndexMgr = "index_mgr.cpp";
 
-std::vector<PlannedStep> UpsertPlan() {
+std::vector<PlannedStep> UpsertPlan(const std::set<std::string> &shares) {
     return {
         SaveStep(),
         {"monitor", "the file-change monitor could not be registered", {{kIndexMgr, 598}}},
         {"service", "fileindexd could not be started", {{kIndexMgr, 605}}},
         {"search setting", "the search setting did not take effect", {}, {{kIndexMgr, 611}, {kIndexMgr, 613}}},
         {"daemon told", "fileindexd cannot be reached", {{kIndexMgr, 621}}},
-        {"events queued", "the event could not be queued", {{kIndexMgr, 629}, {kIndexMgr, 634}}},
+        {"events queued",
+         "the event could not be queued",
+         {{kIndexMgr, 629}, {kIndexMgr, 634}},
+         {},
+         Evidence::Record,
+         shares},
     };
 }
 
@@ -50,8 +62,10 @@ void StateFolder(const std::string &path, Output &output) {
     output.Line(Printable(path + " is indexed as \"" + found->name + "\": " + MediaText(record)));
 }
 
-ExitStatus Upsert(const Json::Value &record, Patience patience, Output &output) {
+ExitStatus Upsert(const Json::Value &record, const Folders &folders, Patience patience, Output &output) {
     const std::string path = record["path"].asString();
+    WarnOfResumption({ShareOf(path)}, SharesOf(folders), output);
+    AnnounceRestart(RestartWith(true, false), output);
     Json::Value request(Json::arrayValue);
     request.append(record);
     const StepReport report = PerformUpsert(request, patience);
@@ -80,9 +94,64 @@ void WarnOfNesting(const std::string &path, const Folders &folders, Output &outp
 
 }  // namespace
 
+std::optional<Failure> WhyNoFolder(const std::string &fullPath) {
+    if (const auto found = FirstUnreachable(fullPath)) {
+        if (found->error == ENAMETOOLONG) {
+            return Failure(ExitStatus::Usage, Quoted(found->part) + " is longer than a name or a path can be");
+        }
+        if (found->error != ENOENT && found->error != ENOTDIR) {
+            return std::nullopt;
+        }
+        const std::string &part = found->part;
+        const bool isPattern = part.find_first_of("*?[", part.rfind('/')) != std::string::npos;
+        return Failure(isPattern ? ExitStatus::Usage : ExitStatus::NoSuchFolder,
+                       "there is no " + Quoted(part) +
+                           (isPattern ? ", and patterns are not looked up: name the folders one by one" : ""));
+    }
+    struct stat status {};
+    const int type = VORKGetFSType(fullPath.c_str(), 0);  // a dead server is not asked what is there
+    if (VORKFSIsRemoteFS(type) == 0 && stat(fullPath.c_str(), &status) == 0 && !S_ISDIR(status.st_mode)) {
+        return Failure(ExitStatus::Usage, Quoted(fullPath) + " is a file; folders are indexed");
+    }
+    return std::nullopt;
+}
+
+void WarnOfObstacle(const std::string &path, const std::string &fullPath, Output &output) {
+    if (const auto trouble = WhyNoFolder(fullPath)) {
+        output.Warn(Quoted(path) + " cannot be indexed at present: " + trouble->what());
+    } else if (!VORK::FILEINDEX::CanPathBeIndexed(path)) {
+        output.Warn(Quoted(path) + " cannot be indexed at present; \"fileindexctl explain " + ShellWord(path) +
+                    "\" says why");
+    } else if (const auto obstacle = ObstacleTo(fullPath, RequireShare(ShareOf(path))); !obstacle.empty()) {
+        output.Warn(Quoted(path) + " is not indexed: " + obstacle);
+    }
+}
+
+std::string RestartWith(bool savesFolders, bool leavesNone) {
+    const bool isOn = VORKSMBIsEnableSpotlight() != 0;
+    const bool isSwitched = isOn ? leavesNone : savesFolders;
+    if (!isSwitched || !IsFileSharingThere()) {
+        return "";
+    }
+    if (!isOn) {
+        return "the file-sharing service will be restarted, because search is switched on";
+    }
+    return "the file-sharing service will be restarted, because no folder is left and search is switched off";
+}
+
+void AnnounceRestart(const std::string &restart, Output &output) {
+    if (!restart.empty()) {
+        output.Note(restart);
+    }
+}
+
 StepReport PerformUpsert(const Json::Value &records, Patience &patience) {
     const bool searchWasOn = VORKSMBIsEnableSpotlight() != 0;
-    StepReport report = StepReport::Perform(UpsertPlan(), VORK::FILEINDEX::Folders(), patience,
+    std::set<std::string> shares;
+    for (const auto &record : records) {
+        shares.insert(ShareOf(record["path"].asString()));
+    }
+    StepReport report = StepReport::Perform(UpsertPlan(shares), VORK::FILEINDEX::Folders(), patience,
                                             [&] { return IndexMgr::Upsert(records); });
     if (searchWasOn) {
         report.Correct("search setting", StepResult::Already);
@@ -95,19 +164,26 @@ ExitStatus AddFolder(const Arguments &arguments, Output &output) {
     const Patience patience(arguments);
     const Folders folders = ReadFolders();
     Json::Value record(Json::objectValue);
-    const std::string path = RequirePlain(arguments.One("PATH"), folders).path;
+    const Place place = RequirePlain(arguments.One("PATH"), folders);
+    const std::string &path = place.path;
     if (std::any_of(folders.begin(), folders.end(), [&](const Folder &folder) { return folder.path == path; })) {
         throw Failure(ExitStatus::Usage, "\"" + path + "\" is indexed already; \"fileindexctl set\" changes it");
     }
+    SetMedia(record, arguments.Has("--media") ? arguments.One("--media") : "all");
+    const auto trouble = WhyNoFolder(place.fullPath);
+    const auto missing = FirstUnreachable(place.fullPath);
+    const bool isToCome = arguments.Has("--force") && missing && missing->error != ENAMETOOLONG;
+    if (trouble && !isToCome) {
+        throw Failure(trouble->Status(),
+                      trouble->what() + std::string(trouble->Status() == ExitStatus::NoSuchFolder
+                                                        ? "; --force adds a folder that is yet to come"
+                                                        : ""));
+    }
     record["path"] = path;
     record["name"] = arguments.Has("--name") ? arguments.One("--name") : path.substr(path.rfind('/') + 1);
-    SetMedia(record, arguments.Has("--media") ? arguments.One("--media") : "all");
     WarnOfNesting(path, folders, output);
-    if (!VORK::FILEINDEX::CanPathBeIndexed(path)) {
-        output.Warn(Quoted(path) + " cannot be indexed at present; \"fileindexctl explain " + ShellWord(path) +
-                    "\" says why");
-    }
-    return Upsert(record, patience, output);
+    WarnOfObstacle(path, place.fullPath, output);
+    return Upsert(record, folders, patience, output);
 }
 
 ExitStatus SetFolder(const Arguments &arguments, Output &output) {
@@ -123,7 +199,7 @@ ExitStatus SetFolder(const Arguments &arguments, Output &output) {
     if (arguments.Has("--media")) {
         SetMedia(record, arguments.One("--media"));
     }
-    return Upsert(record, patience, output);
+    return Upsert(record, folders, patience, output);
 }
 
 }  // namespace fileindexctl

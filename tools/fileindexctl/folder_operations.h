@@ -3,15 +3,32 @@
 #ifndef FILEINDEXCTL_FOLDER_OPERATIONS_H
 #define FILEINDEXCTL_FOLDER_OPERATIONS_H
 
+#include "failure.h"
 #include "paths.h"
 #include "steps.h"
 
 #include <json/value.h>
 
+#include <optional>
 #include <string>
 #include <vector>
 
 namespace fileindexctl {
+
+/// Why a full path is no folder: what is missing (status 66), or a file stands there or no name is that long (64);
+/// nothing when it is one, or cannot be looked at.
+std::optional<Failure> WhyNoFolder(const std::string &fullPath);
+
+/// Warns when the folder (share path, full path) cannot be indexed as things are, or the indexer passes over it.
+void WarnOfObstacle(const std::string &path, const std::string &fullPath, Output &output);
+
+/// What a change does to the file-sharing service, which is restarted when search is switched on (by any folder
+/// that is saved while it is off) or off (by the removal of the last one): "the file-sharing service is restarted:
+/// ...". Empty when it does not.
+std::string RestartWith(bool savesFolders, bool leavesNone);
+
+/// Says so on stderr, before it is done.
+void AnnounceRestart(const std::string &restart, Output &output);
 
 /// Adds or changes the folders of an array of records, all or none. Throws Failure when nothing was done.
 StepReport PerformUpsert(const Json::Value &records, Patience &patience);

@@ -3,6 +3,7 @@
 #include "folder_operations.h"
 #include "handlers.h"
 #include "paths.h"
+#include "registrations.h"
 #include "steps.h"
 #include "text.h"
 
@@ -73,7 +74,12 @@ std::vector<PlannedStep> Plan(const std::string &saved, const Paths &removed, co
             {"search setting", "the search setting did not take effect", {}, {{kIndexMgr, 94}, {kIndexMgr, 96}}});
     } else {
         plan.push_back({"daemon told", "fileindexd cannot be reached", {{kIndexMgr, 104}}});
-        plan.push_back({"events queued", "the event could not be queued", {{kIndexMgr, 111}}});
+        plan.push_back({"events queued",
+                        "the event could not be queued",
+                        {{kIndexMgr, 111}},
+                        {},
+                        Evidence::Record,
+                        SharesOf(removed)});
     }
     const std::set<std::string> left = SharesOf(rest);
     for (const auto &share : SharesOf(removed)) {
@@ -154,7 +160,8 @@ std::string ConsequenceOf(const Removal &removal, const Folders &folders) {
                                             : " and deletes the index data of the shares ") +
                        Enumerate(emptied);
     }
-    return consequence;
+    const std::string restart = RestartWith(false, Without(folders, all).empty());
+    return consequence + (restart.empty() ? "" : "; ") + restart;
 }
 
 // Two requests: the library stops at the first folder whose share is away, and must not leave the others undone.
@@ -178,6 +185,8 @@ ExitStatus RemoveFolders(const Arguments &arguments, Output &output) {
     const Folders folders = ReadFolders();
     const Removal removal = Requested(arguments, folders, output);
     RequireConsent(arguments, ConsequenceOf(removal, folders));
+    WarnOfResumption(SharesOf(removal.present), SharesOf(Without(folders, removal.All())), output);
+    AnnounceRestart(RestartWith(false, Without(folders, removal.All()).empty()), output);
     Paths removed;
     const StepReport report = PerformRemoval("saved", removal, removed, patience);
     report.Show(output);

@@ -3,6 +3,7 @@
 #include "handlers.h"
 #include "paths.h"
 #include "queue_files.h"
+#include "registrations.h"
 #include "text.h"
 
 #include <fileindex/folders.h>
@@ -40,15 +41,6 @@ std::vector<Json::Value> Sorted(const Arguments &arguments) {
     return records;
 }
 
-bool IsQueueReadable(const std::string &share) {
-    try {
-        const QueueFiles files(QueuePathOf(share));
-        return true;
-    } catch (const Failure &) {
-        return false;
-    }
-}
-
 // Facts are computed for the page alone: each of them reads a queue.
 Json::Value WithFacts(Json::Value record) {
     Folder folder;
@@ -80,6 +72,22 @@ void ShowTable(const Json::Value &page, bool status, Output &output) {
     }
 }
 
+void TellPauses(const Json::Value &page, Output &output) {
+    std::set<std::string> shares;
+    for (const auto &record : page) {
+        shares.insert(ShareOf(record["path"].asString()));
+    }
+    try {
+        shares = PausedShares(shares);
+        output.Data()["paused_shares"] = ToArray({shares.begin(), shares.end()});
+        for (const auto &share : shares) {
+            output.Note(PausedText(share));
+        }
+    } catch (const Failure &failure) {
+        output.Warn(std::string("which shares are paused cannot be told: ") + failure.what());
+    }
+}
+
 // A share without folders may also be one that is not there.
 std::string WhyEmpty(const Arguments &arguments, std::size_t total) {
     if (total > 0) {
@@ -108,6 +116,7 @@ ExitStatus ListFolders(const Arguments &arguments, Output &output) {
     output.Data()["total"] = static_cast<Json::UInt64>(total);
     output.Data()["offset"] = static_cast<Json::UInt64>(offset);
     output.Data()["folder"] = page;
+    TellPauses(page, output);
     if (page.empty()) {
         output.Note(WhyEmpty(arguments, total));
         return ExitStatus::Done;
@@ -115,7 +124,7 @@ ExitStatus ListFolders(const Arguments &arguments, Output &output) {
     if (arguments.Has("--paths")) {
         for (const auto &record : page) {
             const std::string path = record["path"].asString();
-            output.Line(output.Width() > 0 ? Printable(path) : path);  // a terminal would obey what is in it
+            output.Width() > 0 ? output.Line(path) : output.Raw(path + "\n");
         }
         return ExitStatus::Done;
     }

@@ -69,6 +69,8 @@ ExitStatus ShowMetrics(const Arguments &arguments, Output &output);
 
 // completion.cpp
 ExitStatus WriteCompletion(const Arguments &arguments, Output &output);
+ExitStatus ShowHelp(const Arguments &arguments, Output &output);
+ExitStatus WritePlaces(const Arguments &arguments, Output &output);
 
 // manual.cpp
 ExitStatus WriteManual(const Arguments &arguments, Output &output);

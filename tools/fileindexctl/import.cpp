@@ -2,6 +2,7 @@
 #include "failure.h"
 #include "handlers.h"
 #include "import_plan.h"
+#include "registrations.h"
 #include "schedule.h"
 #include "whole_file.h"
 
@@ -9,6 +10,7 @@
 #include <fileindex/status_mgr.h>
 
 #include <functional>
+#include <set>
 
 namespace fileindexctl {
 
@@ -100,6 +102,12 @@ StepReport Apply(const ImportPlan &plan, Patience patience) {
     return sequence.Report();
 }
 
+std::string RestartOf(const ImportPlan &plan) {
+    const std::size_t removed = plan.removal.All().size();
+    const bool leavesNone = removed > 0 && removed == ReadFolders().size();
+    return RestartWith(!plan.folders.empty(), leavesNone && (plan.folders.empty() || RemovesFirst(plan)));
+}
+
 void AskForRemoval(const Arguments &arguments, const ImportPlan &plan) {
     if (plan.removal.All().empty()) {
         return;
@@ -142,12 +150,20 @@ ExitStatus ImportConfiguration(const Arguments &arguments, Output &output) {
         output.Note("nothing is to be changed");
         return ExitStatus::Done;
     }
+    output.Flush();
+    const std::string restart = RestartOf(plan);
     if (dryRun) {
+        AnnounceRestart(restart, output);
         output.Note("nothing was done");
         return ExitStatus::Done;
     }
-    output.Flush();
     AskForRemoval(arguments, plan);
+    std::set<std::string> touched;
+    for (const auto &change : plan.folders) {
+        touched.insert(ShareOf(change.to["path"].asString()));
+    }
+    WarnOfResumption(touched, SharesOf(ReadFolders()), output);
+    AnnounceRestart(restart, output);
     const StepReport report = Apply(plan, patience);
     report.Show(output);
     StateConfiguration(output);

@@ -1,11 +1,12 @@
 #include "import_plan.h"
 
 #include "failure.h"
+#include "folder_operations.h"
 #include "folder_text.h"
 #include "schedule.h"
 #include "text.h"
 
-#include <fileindex/indexability.h>
+#include <fileindex/paths.h>
 
 #include <algorithm>
 
@@ -141,8 +142,10 @@ void ImportPlan::Show(Output &output) const {
     Rows rows;
     for (const auto &change : folders) {
         const std::string path = change.to["path"].asString();
-        if (change.from.isNull() && !VORK::FILEINDEX::CanPathBeIndexed(path)) {
-            output.Warn(Quoted(path) + " cannot be indexed at present; \"fileindexctl explain\" says why");
+        if (change.from.isNull()) {
+            std::string fullPath;
+            VORK::FILEINDEX::GetFullPath(fullPath, path);
+            WarnOfObstacle(path, fullPath, output);
         }
         rows.push_back(Row(change));
         Json::Value pair(Json::objectValue);

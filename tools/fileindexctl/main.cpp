@@ -1,6 +1,7 @@
 #include "failure.h"
 #include "output.h"
 #include "parser.h"
+#include "text.h"
 
 #include <fileindex/error.h>
 
@@ -18,13 +19,14 @@ using namespace fileindexctl;
 // At this level the library also records events that it dropped, which its results do not tell.
 constexpr int kLogDroppedEvents = 7;
 
-// With one of them closed, a configuration file would be opened under its number and take what is printed.
+// With one of them closed, a configuration file would be opened under its number and take what is printed. What
+// stands in for stdout takes nothing, so that the writing fails.
 void OpenStandardStreams() {
-    int descriptor = -1;
-    do {
-        descriptor = open("/dev/null", O_RDWR);
-    } while (descriptor >= 0 && descriptor <= STDERR_FILENO);
-    close(descriptor);
+    for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
+        if (fcntl(stream, F_GETFD) < 0) {
+            open("/dev/null", stream == STDOUT_FILENO ? O_RDONLY : O_RDWR);
+        }
+    }
 }
 
 // A command line that does not parse is reported as JSON too, when it asks for that anywhere.
@@ -69,9 +71,11 @@ int main(int argc, char *argv[]) {
     OpenStandardStreams();
     VORK::FILEINDEX::LOG_LEVEL = kLogDroppedEvents;
     try {
-        return static_cast<int>(ParseAndRun(argc, argv));
+        const ExitStatus status = ParseAndRun(argc, argv);
+        ForgetErrors();  // passes on the records that are still held back
+        return static_cast<int>(status);
     } catch (const std::exception &error) {
-        std::fprintf(stderr, "fileindexctl: %s\n", error.what());
+        std::fprintf(stderr, "fileindexctl: %s\n", Printable(error.what()).c_str());
         return static_cast<int>(ExitStatus::Partly);
     }
 }

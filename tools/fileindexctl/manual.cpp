@@ -8,7 +8,7 @@ namespace fileindexctl {
 
 namespace {
 
-constexpr const char *kHead = R"(.Dd November 21, 2026
+constexpr const char *kHead = R"(.Dd November 22, 2026
 .Dt FILEINDEXCTL 1
 .Os libfileindex
 .Sh NAME
@@ -31,18 +31,30 @@ A folder is named by its share path, which begins with the name of the share:
 lies in the share
 .Dq photo .
 The questions
-.Cm check , contains
+.Cm check , contains , governs
 and
-.Cm governs
+.Cm explain
 also take full paths,
 .Pa /vol1/photo/2015 .
 .Pp
+.Cm check
+looks at the folder whose settings hold, at the rules that
+.Cm explain
+shows, at the way down from that folder, and at the kind of the file, which is told from the extension of its name; a file
+of none of the four kinds is known by its name only.
+.Cm governs
+compares the text of paths and nothing else, as the library does.
+.Pp
 A change is saved first, then everybody is told.
-Each step is listed with what became of it; when a step fails, those behind it are not reached, and the message says how
+Each step is listed with what became of it; when a step fails, the steps after it are not reached, and the message says how
 to go on.
 What deletes or overwrites asks first on a terminal, and needs
 .Fl -yes
 without one.
+.Pp
+With the first folder, search is switched on in the file-sharing service, with the last one off, and the service is
+restarted for it.
+A line on the standard error says so before it is done.
 .Pp
 Data goes to the standard output, everything else to the standard error.
 Each command takes these:
@@ -63,7 +75,7 @@ What
 writes is one JSON object:
 .Bl -tag -width "version"
 .It Cm version
-1.
+The number 1.
 .It Cm folder
 As in
 .Xr fileindex-folder.conf 5 .
@@ -99,6 +111,12 @@ tells everybody again what is saved.
 .Bl -tag -width NO_COLOR
 .It Ev NO_COLOR
 If set and not empty, nothing is coloured on a terminal.
+.It Ev TERM
+If unset or
+.Ql dumb ,
+nothing is coloured on a terminal, and
+.Fl -watch
+writes lines.
 .It Ev TZ
 The time zone in which times are read and shown.
 .El
@@ -142,7 +160,8 @@ Move the configuration to another machine; the first command on it only looks:
 .Pp
 Hand the metrics to a collector that reads files:
 .Pp
-.Dl fileindexctl metrics > fileindex.prom.new && mv fileindex.prom.new fileindex.prom
+.Dl fileindexctl metrics > fileindex.prom.new &&
+.Dl mv fileindex.prom.new fileindex.prom
 .Pp
 Complete command lines in this shell:
 .Pp
@@ -150,8 +169,10 @@ Complete command lines in this shell:
 .Sh SEE ALSO
 .Xr libfileindex 3 ,
 .Xr fileindex-folder.conf 5 ,
+.Xr fileindex-platform.conf 5 ,
 .Xr fileindex-queue 5 ,
-.Xr fileindex-status.conf 5
+.Xr fileindex-status.conf 5 ,
+.Xr fileindex-daemon 7
 )";
 
 // No word is taken for a request or a macro, nor a dash for a hyphen.
@@ -245,7 +266,7 @@ ExitStatus WriteManual(const Arguments & /*arguments*/, Output &output) {
     }
     page += ".El\n" + std::string(kTail);
     output.Data()["page"] = page;
-    output.Text(page);
+    output.Raw(page);
     return ExitStatus::Done;
 }
 

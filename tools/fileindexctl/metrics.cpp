@@ -6,6 +6,7 @@
 #include "queue.h"
 #include "text.h"
 
+#include <algorithm>
 #include <map>
 #include <utility>
 #include <vector>
@@ -32,7 +33,7 @@ struct Metrics {
     Metric needReindex = {"fileindex_share_need_reindex", "Whether the share waits to be reindexed whole."};
     Metric events = {"fileindex_queue_events", "Events that wait for fileindexd."};
     Metric malformed = {"fileindex_queue_malformed_lines", "Lines of the queue that are no events."};
-    Metric taken = {"fileindex_queue_taken", "Whether fileindexd is at work on an earlier queue."};
+    Metric taken = {"fileindex_queue_taken", "Whether an earlier queue, taken away, lies beside the queue."};
     Metric oldest = {"fileindex_queue_oldest_timestamp_seconds",
                      "When the oldest event was queued; time() minus this is its age."};
     Metric paused = {"fileindex_paused", "Whether indexing is paused."};
@@ -119,16 +120,17 @@ Metrics Measure(Gaps &gaps) {
     return metrics;
 }
 
-// One value that is not UTF-8 would make a server refuse the whole page.
+// A server would refuse the whole page for one value that is not UTF-8, and people look at it too.
 std::string LabelText(const std::string &value) {
     std::string text;
-    for (const char character : AsUtf8(value)) {
-        if (character == '\n') {
-            text += "\\n";
-        } else {
+    for (std::size_t begin = 0; begin <= value.size();) {
+        const std::size_t end = std::min(value.find('\n', begin), value.size());
+        for (const char character : Printable(value.substr(begin, end - begin))) {
             text += character == '\\' || character == '"' ? "\\" : "";
             text += character;
         }
+        text += end < value.size() ? "\\n" : "";
+        begin = end + 1;
     }
     return text;
 }

@@ -1,13 +1,16 @@
+#include "confirm.h"
 #include "daemon.h"
 #include "failure.h"
 #include "handlers.h"
 #include "paths.h"
 #include "queue.h"
 #include "queue_files.h"
+#include "registrations.h"
 #include "steps.h"
 #include "text.h"
 
 #include <fileindex/folders.h>
+#include <fileindex/index_mgr.h>
 #include <fileindex/updater.h>
 
 #include <vork/search.h>
@@ -30,7 +33,12 @@ std::vector<PlannedStep> Plan(const Folders &folders) {
         {"service", "fileindexd could not be started", {{kUtils, 650}}, {}, Evidence::None},
         {"search setting", "the search setting could not be switched on", {{kUtils, 654}}},
         {"monitors", "a file-change monitor could not be registered", {{kUtils, 661}, {kUtils, 671}}},
-        {"events queued", "the reindexing could not be queued", {{kUtils, 678}}},
+        {"events queued",
+         "the reindexing could not be queued",
+         {{kUtils, 678}},
+         {},
+         Evidence::Record,
+         SharesOf(folders)},
     };
 }
 
@@ -56,7 +64,7 @@ void StateEffect(const Folders &folders, Output &output) {
     }
     const DaemonState daemon = ProbeDaemon();
     const bool search = VORKSMBIsEnableSpotlight() != 0;
-    output.Data()["daemon"] = daemon.reachable;
+    output.Data()["daemon"] = daemon.ForPrograms();
     output.Data()["search"] = search;
     output.Data()["queued"] = ToArray(queued);
     for (const auto &line : Align({{"daemon", daemon.text},
@@ -67,17 +75,28 @@ void StateEffect(const Folders &folders, Output &output) {
     }
 }
 
-void StatePlan(const Folders &folders, Output &output) {
+void Resume(const std::set<std::string> &paused, StepReport &report) {
+    for (const auto &share : paused) {
+        const bool done = !report.Has(StepResult::Failed) && VORK::FILEINDEX::IndexMgr::ShareResume(share);
+        report.Add("worker of " + share, done ? StepResult::Done : StepResult::Failed,
+                   done ? "" : "the share could not be resumed");
+    }
+}
+
+void StatePlan(const Folders &folders, const std::set<std::string> &paused, Output &output) {
     if (folders.empty()) {
         output.Line("no folder is indexed: fileindexd is to stand still");
         return;
     }
     output.Line("fileindexd is to run, with search switched on, and these to be indexed anew:");
     for (const auto &folder : folders) {
-        output.Line("  " + Printable(folder.path));
+        output.Line("  " + folder.path);
     }
     const auto shares = SharesOf(folders);
-    output.Line("watched for changes: " + Printable(Enumerate({shares.begin(), shares.end()})));
+    output.Line("watched for changes: " + Enumerate({shares.begin(), shares.end()}));
+    for (const auto &share : paused) {
+        output.Line(PausedText(share));
+    }
 }
 
 }  // namespace
@@ -89,14 +108,25 @@ ExitStatus Migrate(const Arguments &arguments, Output &output) {
     for (const auto &folder : folders) {
         output.Data()["folders"].append(folder.path);
     }
+    const auto paused = PausedShares(SharesOf(folders));
+    output.Data()["paused_shares"] = ToArray({paused.begin(), paused.end()});
     if (arguments.Has("--dry-run")) {
-        StatePlan(folders, output);
+        StatePlan(folders, paused, output);
         output.Note("nothing was done");
         return ExitStatus::Done;
     }
+    if (!paused.empty()) {
+        const bool several = paused.size() > 1;
+        const std::string names = several ? "s " + Enumerate({paused.begin(), paused.end()}) + " are"
+                                          : " " + Quoted(*paused.begin()) + " is";
+        RequireConsent(arguments, "the share" + names + " paused (indexed, but not watched); this has " +
+                                      (several ? "them" : "it") + " watched again");
+    }
+    RequireMayChange();
     StepReport report = StepReport::Perform(Plan(folders), VORK::FILEINDEX::Folders(),
                                             [] { return VORK::FILEINDEX::Updater_zol60_beta2(); });
     MarkDroppedEvents(report);
+    Resume(paused, report);
     report.Show(output);
     StateEffect(folders, output);
     if (report.Status() != ExitStatus::Done) {

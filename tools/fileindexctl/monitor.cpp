@@ -28,6 +28,7 @@ struct Queue {
     Watches registered{};
     Watches expected{};
     bool isAway = false;  ///< folders are indexed, but nothing can be registered
+    bool isPaused = false;
 
     bool IsInStep() const { return registered == expected; }
 };
@@ -45,9 +46,11 @@ std::string ShareOfQueue(const std::string &path) {
 Queues ReadQueues(const std::string &only) {
     Queues queues;
     const Folders folders = ReadFolders();
-    for (const auto &share : SharesOf(folders)) {
+    const auto shares = SharesOf(folders);
+    const auto paused = PausedShares(shares);
+    for (const auto &share : shares) {
         const std::string path = QueuePathOf(share);
-        queues[path.empty() ? share : path] = {share, {}, {}, path.empty()};
+        queues[path.empty() ? share : path] = {share, {}, {}, path.empty(), paused.count(share) > 0};
     }
     for (const auto &folder : folders) {
         const std::string path = QueuePathOf(ShareOf(folder.path));
@@ -77,9 +80,10 @@ std::vector<Row> Compare(const Queue &queue) {
     std::vector<Row> rows;
     for (const auto &[path, how] : queue.expected) {
         const auto found = queue.registered.find(path);
-        rows.push_back({path, found == queue.registered.end() ? "missing"
-                              : found->second == how          ? "watched"
-                                                              : "different"});
+        rows.push_back({path, queue.isPaused                    ? "paused"
+                              : found == queue.registered.end() ? "missing"
+                              : found->second == how            ? "watched"
+                                                                : "different"});
     }
     for (const auto &[path, how] : queue.registered) {
         if (queue.expected.find(path) == queue.expected.end()) {
@@ -129,6 +133,9 @@ void State(const Queues &queues, std::vector<std::vector<std::string>> rows, Out
         if (queue.isAway) {
             output.Warn("the share \"" + queue.share + "\" is away, so its folders cannot be watched");
         }
+        if (queue.isPaused) {
+            output.Note(PausedText(queue.share));
+        }
         Add(queue, path, rows, output);
     }
     if (rows.size() == 1) {
@@ -146,11 +153,11 @@ ExitStatus ShowMonitor(const Arguments &arguments, Output &output) {
     const Queues queues = ReadQueues(arguments.One("SHARE"));
     RequireKnown(arguments, queues);
     State(queues, {{"FULL PATH", "SHARE", "STATE"}}, output);
-    const bool inStep =
-        std::all_of(queues.begin(), queues.end(), [](const auto &entry) { return entry.second.IsInStep(); });
-    output.Data()["in_step"] = inStep;
-    if (!inStep) {
-        output.Note("unless the share is paused, \"fileindexctl monitor refresh\" mends the differences");
+    const auto isInStep = [](const auto &entry) { return entry.second.IsInStep(); };
+    const auto isAsWanted = [](const auto &entry) { return entry.second.IsInStep() || entry.second.isPaused; };
+    output.Data()["in_step"] = std::all_of(queues.begin(), queues.end(), isInStep);
+    if (!std::all_of(queues.begin(), queues.end(), isAsWanted)) {
+        output.Note("\"fileindexctl monitor refresh\" mends the differences");
     }
     return ExitStatus::Done;
 }
@@ -170,6 +177,10 @@ ExitStatus RefreshMonitors(const Arguments &arguments, Output &output) {
         const std::string name = "monitor of " + queue.share;
         if (queue.isAway) {
             report.Add(name, StepResult::Skipped, "the share is away");
+            continue;
+        }
+        if (queue.isPaused && !arguments.Has("SHARE")) {
+            report.Add(name, StepResult::Skipped, "the share is paused");
             continue;
         }
         ForgetErrors();

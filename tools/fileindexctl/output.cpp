@@ -1,5 +1,6 @@
 #include "output.h"
 
+#include "screen.h"
 #include "text.h"
 
 #include <json/writer.h>
@@ -24,7 +25,7 @@ unsigned TerminalWidth() {
 
 bool MayColour() {
     const char *noColour = std::getenv("NO_COLOR");
-    return isatty(STDOUT_FILENO) != 0 && (noColour == nullptr || *noColour == '\0');
+    return Screen::IsUsable() && (noColour == nullptr || *noColour == '\0');
 }
 
 void Print(std::FILE *stream, std::string_view text) {
@@ -55,12 +56,13 @@ Json::Value ToArray(const std::vector<std::string> &items) {
 
 Output::Output(bool json) : json_(json), colour_(MayColour()), width_(TerminalWidth()), data_(Json::objectValue) {}
 
-void Output::Line(std::string_view text) {
-    Text(text);
-    Text("\n");
+void Output::Line(const std::string &text, Colour colour) {
+    static constexpr const char *kCodes[] = {"", "\033[32m", "\033[31m", "\033[2m"};
+    const bool painted = colour_ && colour != Colour::Plain;
+    Raw((painted ? kCodes[static_cast<int>(colour)] : "") + Printable(text) + (painted ? "\033[0m\n" : "\n"));
 }
 
-void Output::Text(std::string_view text) {
+void Output::Raw(std::string_view text) {
     if (!json_) {
         Print(stdout, text);
     }
@@ -106,23 +108,15 @@ void Output::Error(ExitStatus status, const std::string &text) {
     Complain("", text);
 }
 
-std::string Output::Paint(Colour colour, std::string_view text) const {
-    static constexpr const char *kCodes[] = {"", "\033[32m", "\033[31m", "\033[2m"};
-    if (!colour_ || colour == Colour::Plain) {
-        return std::string(text);
-    }
-    return kCodes[static_cast<int>(colour)] + std::string(text) + "\033[0m";
-}
-
 ExitStatus Output::Finish(ExitStatus status) {
     if (json_ && (!sampled_ || data_.isMember("error"))) {
         PrintDocument(status);
     }
-    if (std::fflush(stdout) != 0 || std::ferror(stdout) != 0) {
-        Complain("", "the output could not be written");
-        return status == ExitStatus::Done ? ExitStatus::CannotSave : status;
+    if (Flush() && std::fclose(stdout) == 0) {  // some file systems tell only then
+        return status;
     }
-    return status;
+    Complain("", "the output could not be written");
+    return status == ExitStatus::Done || status == ExitStatus::No ? ExitStatus::CannotSave : status;
 }
 
 }  // namespace fileindexctl

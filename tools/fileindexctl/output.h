@@ -4,6 +4,9 @@
 /// Data goes to stdout, everything else to stderr. The document is
 /// {"schema": 1, "ok": BOOL, "data": ..., "warnings": [TEXT, ...]}; after a failure "data" holds what was done and
 /// {"error": {"status": N, "message": TEXT}}. A question that is answered "no" is ok.
+///
+/// What people read is made printable here, whether on a terminal or not: names of files and texts of other
+/// programs may hold what a terminal obeys.
 #ifndef FILEINDEXCTL_OUTPUT_H
 #define FILEINDEXCTL_OUTPUT_H
 
@@ -28,8 +31,9 @@ public:
     /// The width of the terminal on stdout, 0 when it is none: then nothing is shortened or coloured.
     unsigned Width() const { return width_; }
 
-    /// One line of data for people; left out of JSON.
-    void Line(std::string_view text);
+    /// One line of data for people, coloured when stdout is a terminal that can do it and the user did not forbid
+    /// it; left out of JSON.
+    void Line(const std::string &text, Colour colour = Colour::Plain);
 
     /// Has the lines so far shown, before a question. False when they cannot be written.
     bool Flush();
@@ -38,8 +42,8 @@ public:
     /// data begin anew, and no document is written at the end. False as above.
     bool EndSample();
 
-    /// Lines of data for people, with their ends; left out of JSON.
-    void Text(std::string_view text);
+    /// Data for other programs in a form of its own, every byte as it is; left out of JSON.
+    void Raw(std::string_view text);
 
     /// What programs get as "data"; not shown to people.
     Json::Value &Data() { return data_; }
@@ -52,9 +56,6 @@ public:
 
     /// Why the command failed.
     void Error(ExitStatus status, const std::string &text);
-
-    /// The text in a colour, when stdout is a terminal and the user did not forbid it.
-    std::string Paint(Colour colour, std::string_view text) const;
 
     /// Writes the document and makes sure that everything has left; the status to end with.
     ExitStatus Finish(ExitStatus status);

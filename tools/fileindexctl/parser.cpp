@@ -1,10 +1,13 @@
 #include "parser.h"
 
 #include "failure.h"
+#include "handlers.h"
 
 #include <CLI/CLI.hpp>
 
+#include <algorithm>
 #include <map>
+#include <numeric>
 #include <utility>
 
 namespace fileindexctl {
@@ -12,6 +15,7 @@ namespace fileindexctl {
 namespace {
 
 constexpr const char *kAbout = "fileindexctl - which folders are indexed, and how far indexing is";
+constexpr const char *kSeeHelp = "; see \"fileindexctl --help\"";
 constexpr std::size_t kHelpWidth = 104;
 
 std::string Footer() {
@@ -34,12 +38,58 @@ std::string CheckNumber(const std::string &text) {
     return digits && text.size() <= 18 ? std::string() : "a number of 0 or more is expected, not \"" + text + "\"";
 }
 
+std::size_t Distance(std::string_view left, std::string_view right) {
+    std::vector<std::size_t> row(right.size() + 1);
+    std::iota(row.begin(), row.end(), 0);
+    for (std::size_t i = 0; i < left.size(); ++i) {
+        std::size_t diagonal = std::exchange(row[0], i + 1);
+        for (std::size_t j = 0; j < right.size(); ++j) {
+            const std::size_t changed = diagonal + (left[i] == right[j] ? 0 : 1);
+            diagonal = row[j + 1];
+            row[j + 1] = std::min({changed, row[j] + 1, diagonal + 1});
+        }
+    }
+    return row.back();
+}
+
+// The word that was meant, as a question; empty when none is near.
+std::string Meant(std::string_view word, const std::vector<std::string_view> &words) {
+    constexpr std::size_t kNear = 2;
+    const auto nearest = std::min_element(words.begin(), words.end(), [&](const auto &left, const auto &right) {
+        return Distance(word, left) < Distance(word, right);
+    });
+    const bool isNear = nearest != words.end() && Distance(word, *nearest) <= std::min(kNear, word.size() / 2);
+    return isNear ? "; did you mean " + Quoted(std::string(*nearest)) + "?" : std::string();
+}
+
+// Why the first words name no command; empty when they do.
+std::string UnknownCommand(const std::vector<std::string> &words) {
+    std::string group;
+    for (const auto &word : words) {
+        std::vector<std::string_view> known;
+        for (const auto &command : Commands()) {
+            if (command.group == group || group.empty()) {
+                known.push_back(command.group == group ? command.name : command.group);
+            }
+        }
+        if (std::find(known.begin(), known.end(), word) == known.end()) {
+            group.append(group.empty() ? "" : " ").append(word);
+            return "there is no command " + Quoted(group) + Meant(word, known);
+        }
+        if (!group.empty() || HelpOfGroup(word).empty()) {
+            break;
+        }
+        group = word;
+    }
+    return {};
+}
+
 class Parser {
 public:
     Parser() : app_(kAbout, "fileindexctl") {
         app_.footer(Footer());
         app_.require_subcommand(1);
-        app_.add_flag("--json", json_, "one JSON document on the standard output");
+        AddJson(app_);
         app_.set_version_flag("--version", FILEINDEXCTL_VERSION, "show the version");
         for (const auto &command : Commands()) {
             AddCommand(command);
@@ -58,7 +108,8 @@ public:
             invocation.help = std::string(FILEINDEXCTL_VERSION) + "\n";
             return invocation;
         } catch (const CLI::ParseError &error) {
-            throw Failure(ExitStatus::Usage, Explain(error) + "; see \"fileindexctl --help\"");
+            const std::string text = Explain(error, own);
+            throw Failure(ExitStatus::Usage, text + (text.ends_with("?") ? "" : kSeeHelp));
         }
         invocation.json = json_;
         for (const auto &[command, app] : commands_) {
@@ -71,7 +122,7 @@ public:
     }
 
 private:
-    // The part of the line that is for this program. Of what is behind an option that takes the rest, the first
+    // The part of the line that is for this program. Of what is after an option that takes the rest, the first
     // word stays there, so that the option has a value.
     std::vector<const char *> SplitOff(int argc, const char *const argv[]) {
         std::vector<const char *> own;
@@ -96,20 +147,42 @@ private:
         return false;
     }
 
+    // In the order of the line; the parser's own text has them the other way round.
+    static std::string Unexpected(const std::vector<std::string> &words) {
+        std::string text = words.size() == 1 ? "The following argument was not expected:"
+                                             : "The following arguments were not expected:";
+        for (const auto &word : words) {
+            text += " " + word;
+        }
+        return text;
+    }
+
     // A word that is no command is not what the parser complains about first.
-    std::string Explain(const CLI::ParseError &error) const {
-        const auto words = app_.remaining(true);
-        if (words.empty() || words.front().starts_with("-")) {
-            return error.what();
+    std::string Explain(const CLI::ParseError &error, const std::vector<const char *> &line) const {
+        std::vector<std::string> words(line.begin() + 1, line.end());
+        std::erase_if(words, [](const std::string &word) { return word.starts_with("-"); });
+        std::string unknown = UnknownCommand(words);
+        if (!unknown.empty()) {
+            return unknown;
         }
-        const auto parsed = app_.get_subcommands();
-        if (parsed.empty()) {
-            return "there is no command \"" + words.front() + "\"";
+        const auto left = app_.remaining(true);
+        const bool isOption = !left.empty() && left.front().starts_with("-");
+        const bool isUnexpected = error.get_exit_code() == static_cast<int>(CLI::ExitCodes::ExtrasError);
+        return (isUnexpected ? Unexpected(left) : error.what()) +
+               (isOption ? Meant(left.front(), OptionsThere()) : std::string());
+    }
+
+    // Those of the command that was named.
+    std::vector<std::string_view> OptionsThere() const {
+        std::vector<std::string_view> options = {"--json", "--help"};
+        for (const auto &[command, app] : commands_) {
+            for (const auto &parameter : command->parameters) {
+                if (app->parsed() && parameter.IsOption()) {
+                    options.push_back(parameter.name);
+                }
+            }
         }
-        const bool inGroup = groups_.count(parsed.front()->get_name()) > 0;
-        const bool unknown = inGroup && parsed.front()->get_subcommands().empty();
-        return unknown ? "there is no command \"" + parsed.front()->get_name() + " " + words.front() + "\""
-                       : error.what();
+        return options;
     }
 
     CLI::App &ParentOf(const Command &command) {
@@ -124,10 +197,13 @@ private:
         return *group;
     }
 
+    void AddJson(CLI::App &app) { app.add_flag("--json", json_, "one JSON document on the standard output"); }
+
     void AddCommand(const Command &command) {
         CLI::App &parent = ParentOf(command);
         CLI::App *app = parent.add_subcommand(std::string(command.name), std::string(command.help));
         app->fallthrough();
+        AddJson(*app);
         if (command.hidden) {
             app->group("");
         }
@@ -147,7 +223,8 @@ private:
             return;
         }
         CLI::Option *option = app.add_option(name, CLI::callback_t([](const auto &) { return true; }), help);
-        option->type_name(std::string(parameter.value))->required(parameter.IsRequired());
+        option->type_name(std::string(parameter.IsOption() ? parameter.value : ""))
+            ->required(parameter.IsRequired());
         option->expected(1, parameter.takes == Takes::Many ? CLI::detail::expected_max_vector_size : 1);
         option->allow_extra_args(parameter.takes == Takes::Many);
         if (parameter.takes == Takes::Number) {
@@ -184,6 +261,25 @@ private:
 
 Invocation Parse(int argc, const char *const argv[]) {
     return Parser().Run(argc, argv);
+}
+
+// As with --help after the words.
+ExitStatus ShowHelp(const Arguments &arguments, Output &output) {
+    std::vector<std::string> given = arguments.All("COMMAND");
+    given.insert(given.end(), arguments.All("WORD").begin(), arguments.All("WORD").end());
+    const std::string unknown = UnknownCommand(given);
+    if (!unknown.empty()) {
+        throw Failure(ExitStatus::Usage, unknown + (unknown.ends_with("?") ? "" : kSeeHelp));
+    }
+    std::vector<const char *> words = {"fileindexctl"};
+    for (const auto &word : given) {
+        words.push_back(word.c_str());
+    }
+    words.push_back("--help");
+    const std::string help = Parse(static_cast<int>(words.size()), words.data()).help;
+    output.Data()["help"] = help;
+    output.Raw(help);
+    return ExitStatus::Done;
 }
 
 }  // namespace fileindexctl

@@ -116,6 +116,7 @@ std::string RequireShare(const std::string &share) {
                 throw Failure(ExitStatus::Permission, std::string("no permission for ") + kPlatformFile +
                                                           "; run this as the administrator");
             }
+            ReadPlatformFile();  // throws when the whole file is at fault
             throw Failure(ExitStatus::NotConfigured,
                           "the share \"" + share + "\" cannot be looked up; " + kWhereSharesAre);
     }
@@ -184,6 +185,18 @@ Place RequirePlain(const std::string &given, const Folders &folders) {
 
 bool LiesIn(const std::string &path, const std::string &top) {
     return VORK::FILEINDEX::StringStartWith(path + "/", top + "/");
+}
+
+std::vector<std::string> DownFrom(const std::string &top, const std::string &path) {
+    std::vector<std::string> result{path};
+    for (std::string outer = path; outer.size() > top.size();) {
+        outer.erase(outer.rfind('/'));
+        if (!LiesIn(outer, top)) {
+            break;
+        }
+        result.insert(result.begin(), outer);
+    }
+    return result;
 }
 
 namespace {

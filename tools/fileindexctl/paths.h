@@ -61,6 +61,9 @@ bool IsSharePresent(const std::string &share);
 /// Does `path` lie at or under `top`? Both of one form.
 bool LiesIn(const std::string &path, const std::string &top);
 
+/// `path` and what it lies in, the outermost first, as far as `top`.
+std::vector<std::string> DownFrom(const std::string &top, const std::string &path);
+
 /// The same place in the form of a full path, if it has one: full paths see through shares inside shares.
 Place AsFullPath(const Place &place);
 

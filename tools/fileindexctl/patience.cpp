@@ -1,6 +1,7 @@
 #include "patience.h"
 
 #include "failure.h"
+#include "records.h"
 
 #include <algorithm>
 #include <csignal>
@@ -11,6 +12,7 @@ namespace fileindexctl {
 
 namespace {
 
+constexpr unsigned long kUsual = 5;  // others hold a lock for a change, which seldom takes longer
 constexpr unsigned long kLongest = 86400;
 
 bool IsEndHeldBack() {
@@ -23,7 +25,7 @@ bool IsEndHeldBack() {
 }  // namespace
 
 Patience::Patience(const Arguments &arguments) : time_(0) {
-    const unsigned long seconds = arguments.Number("--wait", 0);
+    const unsigned long seconds = arguments.Number("--wait", kUsual);
     if (seconds > kLongest) {
         throw Failure(ExitStatus::Usage, "--wait: 0 to " + std::to_string(kLongest) + " seconds");
     }
@@ -39,6 +41,7 @@ bool Patience::Again() {
     if (now >= *deadline_ || (heedsSignals_ && IsEndHeldBack())) {
         return false;
     }
+    Records().TryAgain();
     std::this_thread::sleep_for(std::min(kInterval, *deadline_ - now));
     return true;
 }

@@ -14,13 +14,14 @@ class Patience {
 public:
     explicit Patience(std::chrono::seconds time = {}) : time_(time) {}
 
-    /// As "--wait" says. Throws Failure.
+    /// As "--wait" says, 5 s if it is not given. Throws Failure.
     explicit Patience(const Arguments &arguments);
 
     /// Also ends when a signal that ends programs is held back.
     void HeedHeldSignals() { heedsSignals_ = true; }
 
-    /// Waits a moment before another try; false when the time has passed, which counts from the first call.
+    /// Waits a moment before another try, and drops the records that only tell of the last one; false when the
+    /// time has passed, which counts from the first call.
     bool Again();
 
     std::chrono::seconds Time() const { return time_; }

@@ -7,7 +7,8 @@
 
 namespace fileindexctl {
 
-/// What the "err=[0x1500 ...]" of a log record means; empty when the record has none, or one that needs no words.
+/// What the "err=[0x1500 ...]" of a log record means, or, for a record on the monitor, the error that the platform
+/// has just left; empty when there is none, or one that needs no words.
 std::string PlatformErrorOf(const std::string &record);
 
 }  // namespace fileindexctl

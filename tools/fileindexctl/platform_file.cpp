@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <cstring>
 #include <fstream>
+#include <set>
 
 namespace fileindexctl {
 
@@ -29,6 +30,24 @@ Json::Value ReadPlatformFile() {
         throw Failure(ExitStatus::Malformed, path + " is not a JSON object");
     }
     return document;
+}
+
+std::vector<std::string> UnknownMembers(const Json::Value &document) {
+    std::vector<std::string> unknown;
+    const auto add = [&](const Json::Value &object, const std::string &prefix,
+                         const std::set<std::string> &known) {
+        for (const auto &name : object.isObject() ? object.getMemberNames() : std::vector<std::string>()) {
+            if (known.count(name) == 0) {
+                unknown.push_back(prefix + name);
+            }
+        }
+    };
+    add(document, "", {"shares", "search"});
+    const Json::Value &shares = document["shares"];
+    for (const auto &share : shares.isObject() ? shares.getMemberNames() : std::vector<std::string>()) {
+        add(shares[share], "shares." + share + ".", {"path", "recycle", "snapshot"});
+    }
+    return unknown;
 }
 
 std::vector<std::string> ConfiguredShares() {

@@ -75,7 +75,8 @@ std::string Progress::Text() const {
         return "no progress for " + DurationText(SecondsWithoutProgress());
     }
     const auto rate = Rate();
-    return rate ? RateText(*rate) + ", about " + DurationText(*SecondsLeft()) + " left" : "measuring";
+    return rate ? RateText(*rate) + " no longer waiting, about " + DurationText(*SecondsLeft()) + " left"
+                : "measuring";
 }
 
 std::string DurationText(double seconds) {

@@ -1,5 +1,5 @@
 /// \file
-/// How fast queues are worked off, reckoned from looks at them. Asks nobody, not even the clock.
+/// How fast what waits in queues gets less, reckoned from looks at them. Asks nobody, not even the clock.
 #ifndef FILEINDEXCTL_PROGRESS_H
 #define FILEINDEXCTL_PROGRESS_H
 
@@ -29,7 +29,7 @@ public:
     /// Since something was last done or, before that, since the first look, while something waits.
     double SecondsWithoutProgress() const;
 
-    /// "120/min, about 5 min left", "no progress for 12 min", "measuring", "nothing waits".
+    /// "120/min no longer waiting, about 5 min left", "no progress for 12 min", "measuring", "nothing waits".
     std::string Text() const;
 
 private:

@@ -1,10 +1,16 @@
+#include "failure.h"
 #include "folder_text.h"
 #include "handlers.h"
+#include "kinds.h"
 #include "paths.h"
+#include "rules.h"
 #include "text.h"
 
 #include <fileindex/folders.h>
 #include <fileindex/index_mgr.h>
+#include <fileindex/paths.h>
+
+#include <cerrno>
 
 namespace fileindexctl {
 
@@ -31,23 +37,44 @@ void Say(const Place &place, const std::string &answer, Output &output) {
     output.Line(Printable((place.path.empty() ? "/" : place.path) + ": " + answer + " (" + place.TakenAs() + ")"));
 }
 
+// Why the path is not in the index; empty when it is.
+std::string Obstacle(const Place &place, const Json::Value &record, std::string &kind) {
+    if (record.empty()) {
+        return place.fullPath.empty() ? "its share is away" : "it lies in no indexed folder";
+    }
+    const std::string folder = record["path"].asString();
+    std::string fullPath;
+    VORK::FILEINDEX::GetFullPath(fullPath, folder);
+    if (const auto found = FirstUnreachable(place.fullPath); found && found->error == EACCES) {
+        throw Denied(found->part);
+    }
+    const Verdict verdict = Judge({folder, false, folder, fullPath});
+    if (!verdict.indexable) {
+        const RuleOutcome *failed = verdict.Failed();
+        return folder + " may not be indexed" + (failed != nullptr ? ": " + failed->fact : "");
+    }
+    const std::string obstacle = ObstacleTo(place.fullPath, fullPath);
+    return obstacle.empty() ? ObstacleOfKind(place.fullPath, record, kind) : obstacle;
+}
+
 }  // namespace
 
 ExitStatus CheckPath(const Arguments &arguments, Output &output) {
     const Folders folders = ReadFolders();
     const Place place = Asked(arguments, folders, output);
-    const bool indexed = place.isFull ? IndexMgr::IsFullPathIndexed(place.path, folders)
-                                      : IndexMgr::IsPathIndexed(place.path, folders);
-    const auto covering = Covering(place, folders);
-    output.Data()["indexed"] = indexed;
-    output.Data()["covered_by"] = ToArray(covering);
-    const auto alsoCovering = Covering(AsFullPath(place), folders);
-    if (!indexed && !alsoCovering.empty()) {
-        output.Warn("as a full path, \"" + place.fullPath + "\" lies in " + Enumerate(alsoCovering) +
-                    ": one share is inside another");
-    }
-    Say(place, indexed ? "indexed, covered by " + Enumerate(covering) : "not indexed", output);
-    return Answer(indexed);
+    const Json::Value record = VORK::FILEINDEX::GetMostSuitableCfg(folders, place.fullPath);
+    std::string kind;
+    const std::string obstacle = Obstacle(place, record, kind);
+    auto &data = output.Data();
+    data["indexed"] = obstacle.empty();
+    data["reason"] = obstacle.empty() ? Json::Value() : Json::Value(obstacle);
+    data["kind"] = kind.empty() ? Json::Value() : Json::Value(kind);
+    data["covered_by"] = ToArray(Covering(AsFullPath(place), folders));
+    const std::string how = kind.empty() ? "" : kind == kOtherKind ? " by its name" : " as " + kind;
+    Say(place,
+        obstacle.empty() ? "indexed" + how + " with " + record["path"].asString() : "not indexed: " + obstacle,
+        output);
+    return Answer(obstacle.empty());
 }
 
 ExitStatus ContainsFolder(const Arguments &arguments, Output &output) {
@@ -64,18 +91,30 @@ ExitStatus ContainsFolder(const Arguments &arguments, Output &output) {
 ExitStatus GoverningFolder(const Arguments &arguments, Output &output) {
     const Folders folders = ReadFolders();
     const Place place = Asked(arguments, folders, output);
-    if (place.fullPath.empty() && !place.isFull) {
+    const bool covered = place.isFull ? IndexMgr::IsFullPathIndexed(place.path, folders)
+                                      : IndexMgr::IsPathIndexed(place.path, folders);
+    if (place.fullPath.empty() && !place.isFull && !covered) {
         RequireShare(ShareOf(place.path));
     }
+    const auto covering = Covering(place, folders);
     const Json::Value record = VORK::FILEINDEX::GetMostSuitableCfg(folders, place.fullPath);
     const bool governed = !record.empty();
+    output.Data()["covered"] = covered;
+    output.Data()["covered_by"] = ToArray(covering);
     output.Data()["governed"] = governed;
     output.Data()["folder"] = governed ? record : Json::Value();
+    const auto alsoCovering = Covering(AsFullPath(place), folders);
+    if (!covered && !alsoCovering.empty()) {
+        output.Warn("as a full path, \"" + place.fullPath + "\" lies in " + Enumerate(alsoCovering) +
+                    ": one share is inside another");
+    }
+    const std::string cover = covered ? "covered by " + Enumerate(covering) : "covered by no indexed folder";
     Say(place,
-        governed ? "governed by " + record["path"].asString() + ": " + MediaText(record)
-                 : "governed by no indexed folder",
+        governed  ? cover + ", governed by " + record["path"].asString() + ": " + MediaText(record)
+        : covered ? cover + ", whose share is away"
+                  : cover,
         output);
-    return Answer(governed);
+    return Answer(governed || covered);
 }
 
 }  // namespace fileindexctl

@@ -19,10 +19,10 @@ inline constexpr unsigned kSettingsEvent = 0x20000;
 struct Backlog {
     std::map<unsigned, unsigned long> events;  ///< number of lines by event type
     unsigned long malformed = 0;
-    bool hasTemporary = false;          ///< the daemon is at work on an earlier queue
+    bool hasTemporary = false;          ///< an earlier queue lies beside it, taken away by the daemon
     std::optional<long long> oldest{};  ///< when the older of the files was made, in seconds since the epoch
 
-    unsigned long taken = 0;  ///< how many of them the daemon is at work on
+    unsigned long taken = 0;  ///< how many of them are in the earlier queue
 
     /// How many in each file, by its identity (queue_files.h).
     std::map<std::string, unsigned long> files{};

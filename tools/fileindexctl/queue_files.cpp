@@ -1,30 +1,24 @@
 #include "queue_files.h"
 
 #include "failure.h"
-#include "paths.h"
 #include "queue.h"
-
-#include <fileindex/fileidx.h>
+#include "queue_lines.h"
+#include "share_record.h"
 
 #include <json/reader.h>
 
-#include <ext/stdio_filebuf.h>
 #include <fcntl.h>
 #include <sys/stat.h>
 
 #include <algorithm>
-#include <array>
 #include <cerrno>
-#include <istream>
-#include <limits>
 #include <memory>
-#include <vector>
+#include <utility>
 
 namespace fileindexctl {
 
 namespace {
 
-constexpr std::size_t kLongestLine = std::size_t{1} << 20;
 constexpr int kDeepest = 256;
 
 using Visitor = std::function<void(const QueueEvent *event)>;
@@ -59,44 +53,52 @@ std::optional<QueueEvent> ParseLine(Json::CharReader &reader, const char *begin,
     return event;
 }
 
-// Line by line, since a queue may be large; a line beyond the limit is passed over without being kept. Lines that
-// begin behind `size` came later; the last one before it is read to its end.
-void VisitLines(int descriptor, long long size, bool taken, const Visitor &visitor) {
-    __gnu_cxx::stdio_filebuf<char> file(descriptor, std::ios::in);  // closes it
-    std::istream lines(&file);
-    std::vector<char> buffer(kLongestLine + 1);
+void VisitLines(Descriptor file, long long size, bool taken, const Visitor &visitor) {
+    QueueLines lines(std::move(file), size);
     const auto reader = LineReader();
-    for (long long position = 0; lines.good() && position < size; position += lines.gcount()) {
-        lines.getline(buffer.data(), static_cast<std::streamsize>(buffer.size()));
-        const std::streamsize read = lines.gcount();
-        if (lines.fail() && !lines.eof() && !lines.bad()) {
-            position += read;
-            lines.clear();
-            lines.ignore(std::numeric_limits<std::streamsize>::max(), '\n');
-            visitor(nullptr);
-            continue;
-        }
-        if (read == 0) {
-            return;
-        }
-        const auto event = ParseLine(*reader, buffer.data(), buffer.data() + read - (lines.eof() ? 0 : 1), taken);
+    for (QueueLines::Line line; lines.Next(line);) {
+        const auto event = line.passed
+                               ? std::nullopt
+                               : ParseLine(*reader, line.text.data(), line.text.data() + line.text.size(), taken);
         visitor(event ? &*event : nullptr);
     }
+}
+
+// Without a metadata directory, which the first event makes, nothing waits.
+Descriptor OpenDirectory(const std::string &queuePath) {
+    const std::string directory = queuePath.substr(0, queuePath.rfind('/'));
+    Descriptor descriptor(open(directory.c_str(), O_PATH | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+    if (!descriptor && (errno == EACCES || errno == EPERM)) {
+        throw Denied(queuePath);
+    }
+    struct stat status {};
+    if (!descriptor && lstat(directory.c_str(), &status) == 0 && S_ISLNK(status.st_mode)) {
+        throw Failure(ExitStatus::Malformed, directory + " is a symbolic link, through which nothing is read");
+    }
+    return descriptor;
 }
 
 }  // namespace
 
 std::string QueuePathOf(const std::string &share) {
-    std::array<char, 4096> path{};
-    if (!IsSharePresent(share) || FILEIDXQueuePathGet(share.c_str(), path.data(), path.size()) < 0) {
-        return {};
-    }
-    return path.data();
+    const SharePointer found = FindShare(share);
+    return found ? found->szPath + std::string("/@eaDir/VORK@file_index_queue") : std::string();
 }
 
-QueueFiles::File QueueFiles::Open(const std::string &path) {
+std::string TroubleWithQueue(const std::string &share) {
+    const std::string queue = QueuePathOf(share);
+    const std::string directory = queue.substr(0, queue.rfind('/'));
+    struct stat status {};
+    if (!queue.empty() && lstat(directory.c_str(), &status) == 0 && !S_ISDIR(status.st_mode)) {
+        return directory + " is a link, or no directory";
+    }
+    return !queue.empty() && MayNotWrite(queue) ? Denied(queue).what() : "";
+}
+
+QueueFiles::File QueueFiles::Open(const Descriptor &directory, const std::string &path) {
     File file;
-    file.descriptor = Descriptor(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
+    file.descriptor = Descriptor(openat(directory.Get(), path.c_str() + path.rfind('/') + 1,
+                                        O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
     if (!file.descriptor && (errno == EACCES || errno == EPERM)) {
         throw Failure(ExitStatus::Permission, "no permission for " + path + "; run this as the administrator");
     }
@@ -117,13 +119,25 @@ QueueFiles::File QueueFiles::Open(const std::string &path) {
 
 // The daemon takes a queue by renaming it. Opened in this order, a queue that is taken meanwhile cannot be missed,
 // only met twice.
-QueueFiles::QueueFiles(const std::string &queuePath) : queue_(Open(queuePath)), taken_(Open(queuePath + ".tmp")) {
+QueueFiles::QueueFiles(const std::string &queuePath) : QueueFiles(OpenDirectory(queuePath), queuePath) {}
+
+QueueFiles::QueueFiles(const Descriptor &directory, const std::string &queuePath)
+    : queue_(Open(directory, queuePath)), taken_(Open(directory, queuePath + ".tmp")) {
     struct stat queue {};
     struct stat taken {};
     if (queue_.descriptor && taken_.descriptor && fstat(queue_.descriptor.Get(), &queue) == 0 &&
         fstat(taken_.descriptor.Get(), &taken) == 0 && queue.st_dev == taken.st_dev &&
         queue.st_ino == taken.st_ino) {
         queue_ = {};
+    }
+}
+
+bool IsQueueReadable(const std::string &share) {
+    try {
+        const QueueFiles files(QueuePathOf(share));
+        return true;
+    } catch (const Failure &) {
+        return false;
     }
 }
 
@@ -137,8 +151,13 @@ std::optional<long long> QueueFiles::Oldest() const {
 void QueueFiles::Visit(const Visitor &visitor) {
     for (const bool taken : {true, false}) {
         File &file = taken ? taken_ : queue_;
+        atTaken_ = taken;
+        line_ = 0;
         if (file.descriptor) {
-            VisitLines(file.descriptor.Release(), file.size, taken, visitor);
+            VisitLines(std::move(file.descriptor), file.size, taken, [&](const QueueEvent *event) {
+                ++line_;
+                visitor(event);
+            });
         }
     }
 }

@@ -15,20 +15,28 @@
 
 namespace fileindexctl {
 
-/// The path of the share's queue; empty when there is no such share.
+/// The path of the share's queue; empty when there is no such share. Unlike the library's function of that kind it
+/// makes no directory, and writes no record where it may not: who only asks changes nothing.
 std::string QueuePathOf(const std::string &share);
+
+/// The library takes a queue that it may not read for none; this tells. One that is not there can be read.
+bool IsQueueReadable(const std::string &share);
+
+/// Why no event can be queued for the share, as far as it can be seen; empty otherwise.
+std::string TroubleWithQueue(const std::string &share);
 
 struct QueueEvent {
     unsigned type;
     std::string path;
     std::string oldPath;  ///< of a rename
     Json::Value data;
-    bool taken;  ///< in the ".tmp" companion: the daemon is at work on it
+    bool taken;  ///< in the ".tmp" companion
 };
 
 class QueueFiles {
 public:
-    /// Opens both. Throws Failure when one of them is there and may not be read.
+    /// Opens both, not through a metadata directory that is a link. Throws Failure when one of them is there and
+    /// may not be read.
     explicit QueueFiles(const std::string &queuePath);
 
     bool IsTaken() const { return taken_.birth.has_value(); }
@@ -44,6 +52,10 @@ public:
     /// a malformed one. Once.
     void Visit(const std::function<void(const QueueEvent *)> &visitor);
 
+    /// Where the visitor is: in the queue or in what was taken of it, and in which line.
+    bool IsAtTaken() const { return atTaken_; }
+    unsigned long Line() const { return line_; }
+
 private:
     struct File {
         Descriptor descriptor{};
@@ -51,10 +63,13 @@ private:
         std::optional<long long> birth{};
         std::string identity{};
     };
-    static File Open(const std::string &path);
+    static File Open(const Descriptor &directory, const std::string &path);
+    QueueFiles(const Descriptor &directory, const std::string &queuePath);
 
     File queue_;
     File taken_;
+    bool atTaken_ = false;
+    unsigned long line_ = 0;
 };
 
 }  // namespace fileindexctl

@@ -75,9 +75,9 @@ public:
 private:
     void ShowEvent(const std::string &share, const QueueEvent &event) {
         if (!output_.IsJson()) {
-            output_.Line(Printable(share + "  " + Padded(EventName(event.type)) + "  " +
-                                   (event.oldPath.empty() ? "" : event.oldPath + " -> ") + event.path +
-                                   (event.taken ? "  (taken)" : "")));
+            output_.Line(share + "  " + Padded(EventName(event.type)) + "  " +
+                         (event.oldPath.empty() ? "" : event.oldPath + " -> ") + event.path +
+                         (event.taken ? "  (taken)" : ""));
             return;
         }
         Json::Value entry(Json::objectValue);

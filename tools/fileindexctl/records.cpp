@@ -16,16 +16,28 @@ namespace fileindexctl {
 namespace {
 
 // Must not throw, as its callers know it, and must leave errno alone: the message may name it ("%m") once more.
-void Keep(const char *format, va_list arguments) noexcept {
+// True when the record is not to reach the system log yet.
+bool Keep(int priority, const char *format, va_list arguments) noexcept {
     const int error = errno;
-    std::array<char, 4096> text{};
+    std::array<char, 8192> text{};
     std::vsnprintf(text.data(), text.size(), format, arguments);
+    bool isHeld = false;
     try {
         Records().Add(text.data());
+        isHeld = Records().HoldBack(priority);
     } catch (const std::exception &) {
         Records().Clear();  // the record still reaches the system log
     }
     errno = error;
+    return isHeld;
+}
+
+// Past the `syslog` of this program.
+__attribute__((format(printf, 2, 3))) void PassOn(int priority, const char *format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    vsyslog(priority, format, arguments);
+    va_end(arguments);
 }
 
 }  // namespace
@@ -39,7 +51,21 @@ void RecordLog::Add(std::string record) {
     records_.push_back({record.substr(0, blank), record.substr(blank + 1)});
 }
 
+bool RecordLog::HoldBack(int priority) {
+    const Record &last = records_.back();
+    const bool isLock = last.place.starts_with("config.cpp:") && last.message == "Failed to lock folder";
+    if (!isLock && !last.Fits({"utils.cpp", 516})) {
+        return false;
+    }
+    held_.emplace_back(priority, last);
+    return true;
+}
+
 void RecordLog::Clear() {
+    for (const auto &[priority, record] : held_) {
+        PassOn(priority, "%s %s", record.place.c_str(), record.message.c_str());
+    }
+    held_.clear();
     records_.clear();
 }
 
@@ -77,9 +103,11 @@ __attribute__((visibility("default"), format(printf, 2, 3))) void syslog(int pri
     va_start(arguments, format);
     va_list copy;
     va_copy(copy, arguments);
-    fileindexctl::Keep(format, copy);
+    const bool isHeld = fileindexctl::Keep(priority, format, copy);
     va_end(copy);
-    vsyslog(priority, format, arguments);
+    if (!isHeld) {
+        vsyslog(priority, format, arguments);
+    }
     va_end(arguments);
 }
 
@@ -90,9 +118,11 @@ __attribute__((visibility("default"), format(printf, 3, 4))) void __syslog_chk(i
     va_start(arguments, format);
     va_list copy;
     va_copy(copy, arguments);
-    fileindexctl::Keep(format, copy);
+    const bool isHeld = fileindexctl::Keep(priority, format, copy);
     va_end(copy);
-    vsyslog(priority, format, arguments);
+    if (!isHeld) {
+        vsyslog(priority, format, arguments);
+    }
     va_end(arguments);
 }
 

@@ -1,13 +1,19 @@
 #include "registrations.h"
 
 #include "failure.h"
+#include "queue_files.h"
 
 #include <json/reader.h>
 #include <json/value.h>
 #include <json/writer.h>
 
+#include <algorithm>
 #include <cerrno>
+#include <chrono>
+#include <cstring>
 #include <fstream>
+#include <iterator>
+#include <thread>
 
 namespace fileindexctl {
 
@@ -28,22 +34,50 @@ Watches::value_type WatchOf(Json::Value entry) {
     return {path, Text(entry)};
 }
 
+bool IsRegistration(const Json::Value &entry) {
+    return entry.isObject() && entry["queue"].isString() && entry["name"].isString();
+}
+
 Json::Value ReadDocument() {
     errno = 0;
     std::ifstream file(kRegistrationsFile);
     if (!file && errno == ENOENT) {
-        return Json::Value(Json::objectValue);
+        return {};
+    }
+    if (!file && errno == EACCES) {
+        throw Denied(kRegistrationsFile);
     }
     if (!file) {
-        throw Failure(ExitStatus::Permission,
-                      std::string("no permission for ") + kRegistrationsFile + "; run this as the administrator");
+        throw Failure(ExitStatus::CannotSave, std::string(kRegistrationsFile) + ": " + std::strerror(errno));
     }
+    // As strictly as the platform, which changes nothing in a file that it refuses.
+    Json::CharReaderBuilder builder;
+    Json::CharReaderBuilder::strictMode(&builder.settings_);
     Json::Value document;
     std::string errors;
-    if (!Json::parseFromStream(Json::CharReaderBuilder(), file, &document, &errors)) {
+    if (!Json::parseFromStream(builder, file, &document, &errors)) {
         throw Failure(ExitStatus::Malformed, std::string(kRegistrationsFile) + " cannot be read as JSON");
     }
+    const Json::Value &list = document["registrations"];
+    if (!list.isArray() || !std::all_of(list.begin(), list.end(), IsRegistration)) {
+        throw Json::LogicError("no registrations");
+    }
     return document;
+}
+
+bool IsOwn(const Json::Value &entry) {
+    return entry["name"].asString() == kRegistration;
+}
+
+Failure Malformed() {
+    return {ExitStatus::Malformed, std::string(kRegistrationsFile) + " does not hold registrations"};
+}
+
+// The first registration makes the file, and withdrawing the last leaves an empty list. Where only other programs
+// have registered, the system may still be being set up.
+bool TellsPauses(const Json::Value &document) {
+    const Json::Value &list = document["registrations"];
+    return list.isArray() && (list.empty() || std::any_of(list.begin(), list.end(), IsOwn));
 }
 
 }  // namespace
@@ -52,7 +86,7 @@ std::map<std::string, Watches> ReadRegistrations() try {
     std::map<std::string, Watches> registrations;
     const Json::Value document = ReadDocument();
     for (const auto &entry : document["registrations"]) {
-        if (entry["name"].asString() != kRegistration) {
+        if (!IsOwn(entry)) {
             continue;
         }
         Watches &watches = registrations[entry["queue"].asString()];
@@ -62,7 +96,59 @@ std::map<std::string, Watches> ReadRegistrations() try {
     }
     return registrations;
 } catch (const Json::Exception &) {
-    throw Failure(ExitStatus::Malformed, std::string(kRegistrationsFile) + " does not hold registrations");
+    throw Malformed();
+}
+
+bool IsQueuePaused(const std::string &queue) try {
+    const Json::Value document = ReadDocument();
+    const Json::Value &list = document["registrations"];
+    return TellsPauses(document) && std::none_of(list.begin(), list.end(), [&](const Json::Value &entry) {
+               return IsOwn(entry) && entry["queue"].asString() == queue;
+           });
+} catch (const Json::Exception &) {
+    throw Malformed();
+}
+
+namespace {
+
+std::set<std::string> Unregistered(const std::set<std::string> &shares) {
+    std::set<std::string> paused;
+    for (const auto &share : shares) {
+        const std::string queue = QueuePathOf(share);
+        if (!queue.empty() && IsQueuePaused(queue)) {
+            paused.insert(share);
+        }
+    }
+    return paused;
+}
+
+}  // namespace
+
+std::set<std::string> PausedShares(const std::set<std::string> &shares) {
+    constexpr auto kBetweenSaveAndRegistration = std::chrono::milliseconds(100);
+    auto paused = Unregistered(shares);
+    if (paused.empty()) {
+        return paused;
+    }
+    // A change saves its folders and has them watched a moment later: one that is at work is no pause.
+    std::this_thread::sleep_for(kBetweenSaveAndRegistration);
+    return Unregistered(paused);
+}
+
+std::string PausedText(const std::string &share) {
+    return "the share " + Quoted(share) + " is paused (fileindexctl share resume " + ShellWord(share) + ")";
+}
+
+void WarnOfResumption(const std::set<std::string> &touched, const std::set<std::string> &indexed,
+                      Output &output) try {
+    std::set<std::string> shares;
+    std::set_intersection(touched.begin(), touched.end(), indexed.begin(), indexed.end(),
+                          std::inserter(shares, shares.end()));
+    for (const auto &share : PausedShares(shares)) {
+        output.Warn("the share " + Quoted(share) + " is paused; this change has it watched again");
+    }
+} catch (const Failure &) {
+    // The change itself will meet what is wrong with the file.
 }
 
 Watches::value_type ExpectedWatch(const std::string &fullPath) {

@@ -2,6 +2,7 @@
 #include "handlers.h"
 #include "paths.h"
 #include "queue.h"
+#include "rules.h"
 #include "status_file.h"
 #include "steps.h"
 #include "text.h"
@@ -15,6 +16,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cerrno>
 #include <iterator>
 #include <set>
 
@@ -40,6 +42,10 @@ std::vector<Place> Requested(const Arguments &arguments, const Folders &folders,
             output.Warn("\"" + place.path + "\" is given twice");
             continue;
         }
+        if (const auto found = FirstUnreachable(place.fullPath);
+            found && (found->error == ENOENT || found->error == ENOTDIR)) {
+            output.Warn(Quoted(found->part) + " does not exist");
+        }
         if (Covering(AsFullPath(place), folders).empty()) {
             const auto inside = Contained(AsFullPath(place), folders);
             output.Warn(Quoted(place.path) + " lies in no indexed folder" +
@@ -52,7 +58,9 @@ std::vector<Place> Requested(const Arguments &arguments, const Folders &folders,
 
 std::vector<PlannedStep> Plan(const std::vector<Place> &places) {
     std::set<std::string> full;
+    std::set<std::string> shares;
     for (const auto &place : places) {
+        shares.insert(ShareOf(place.path));
         if (StatusMgr::ShareIsNoSpace(ShareOf(place.path))) {
             full.insert(ShareOf(place.path));
         }
@@ -69,26 +77,27 @@ std::vector<PlannedStep> Plan(const std::vector<Place> &places) {
                     "an event could not be queued",
                     {{kIndexMgr, 407}, {kIndexMgr, 413}},
                     {},
-                    Evidence::None});
+                    Evidence::None,
+                    shares});
     return plan;
 }
 
 // Success of the library also covers an event that was dropped, so the queues are read again. What is neither
-// there nor dropped has been taken by the daemon in the meantime.
+// there nor dropped was there and is not any more; who took it, and what became of it, nobody tells.
 bool StateQueued(const std::vector<Place> &places, const StepReport &report, Output &output) {
     bool any = false;
     const bool lost = report.Has(StepResult::Failed);
     for (const auto &place : places) {
         const bool queued = IsReindexQueued(ShareOf(place.path), place.fullPath);
-        const bool taken = !queued && !lost;
-        any = any || queued || taken;
+        const bool gone = !queued && !lost;
+        any = any || queued || gone;
         Json::Value entry(Json::objectValue);
         entry["path"] = place.path;
-        entry["state"] = queued ? "queued" : taken ? "taken" : "not_queued";
+        entry["state"] = queued ? "queued" : gone ? "not_waiting" : "not_queued";
         output.Data()["reindex"].append(entry);
-        output.Line(Printable(place.path) + (queued  ? " waits in the queue to be reindexed"
-                                             : taken ? " has been taken up by fileindexd"
-                                                     : " is not queued"));
+        output.Line(Printable(place.path) + (queued ? " waits in the queue to be reindexed"
+                                             : gone ? " was queued, and no longer waits in the queue"
+                                                    : " is not queued"));
     }
     return any;
 }
@@ -171,6 +180,7 @@ ExitStatus ReindexPaths(const Arguments &arguments, Output &output) {
     Patience patience(arguments);
     const Folders folders = ReadFolders();
     const std::vector<Place> places = Requested(arguments, folders, output);
+    RequireMayChange();
     StepReport report = PerformReindex(places);
     for (auto left = Dropped(places); !left.empty() && patience.Again(); left = Dropped(left)) {
         report = PerformReindex(left);

@@ -116,13 +116,9 @@ Finding KnownFileSystem(Probe &probe) {
     if (probe.type != kUnknownType) {
         return Pass(FileSystemOf(probe));
     }
-    for (const auto &start : Starts(probe.fullPath)) {
-        struct stat status {};
-        if (stat(start.c_str(), &status) != 0) {
-            const bool missing = errno == ENOENT;
-            return {false, Quoted(start) + ": " + std::strerror(errno),
-                    missing ? "make the folder, or correct the path" : "make the path accessible"};
-        }
+    if (const auto found = FirstUnreachable(probe.fullPath)) {
+        return {false, Quoted(found->part) + ": " + std::strerror(found->error),
+                found->error == ENOENT ? "make the folder, or correct the path" : "make the path accessible"};
     }
     return {false, FileSystemOf(probe) + ", is none that the platform knows",
             "keep the folder on a local disk file system"};
@@ -337,6 +333,62 @@ const RuleOutcome *Verdict::Failed() const {
 Verdict Judge(const Place &place) {
     Verdict verdict = JudgeOnce(place);
     return verdict.explained ? verdict : JudgeOnce(place);
+}
+
+std::optional<Unreachable> FirstUnreachable(const std::string &fullPath) {
+    if (VORKGetFSType(fullPath.c_str(), 0) != kUnknownType) {
+        return std::nullopt;
+    }
+    for (const auto &start : Starts(fullPath)) {
+        struct stat status {};
+        if (stat(start.c_str(), &status) != 0) {
+            return Unreachable{start, errno};
+        }
+    }
+    return std::nullopt;
+}
+
+std::string FirstPassedOver(const std::string &folder, const std::string &path) {
+    for (const auto &part : DownFrom(folder, path)) {
+        if (VORK::FILEINDEX::IsSkipIndex(part)) {
+            return part;
+        }
+    }
+    return {};
+}
+
+std::string ObstacleTo(const std::string &path, const std::string &folder) {
+    const std::string part = FirstPassedOver(folder, path);
+    if (!part.empty()) {
+        const std::string name = part.substr(part.rfind('/') + 1);
+        if (VORK::FILEINDEX::IsSystemPreservedFileName(name)) {
+            return Quoted(name) + " is a name of the system's own";
+        }
+        // What else is passed over fails the first rules of folders too.
+        std::vector<RuleOutcome> outcomes;
+        Run({part, true, {}, part}, outcomes);
+        const auto failed = std::find_if(outcomes.begin(), outcomes.end(), [](const RuleOutcome &rule) {
+            return rule.result == RuleResult::Failed;
+        });
+        if (failed == outcomes.end()) {
+            return "the indexer passes over " + Quoted(part);
+        }
+        const bool isPlace = failed->key == "recycle_bin" || failed->key == "snapshot";
+        return (isPlace ? "" : "it lies on ") + failed->fact;
+    }
+    if (const auto found = FirstUnreachable(path)) {
+        return found->error == ENOENT || found->error == ENOTDIR
+                   ? Quoted(found->part) + " does not exist"
+                   : Quoted(found->part) + ": " + std::strerror(found->error);
+    }
+    Probe probe{{}, path};
+    const Finding finding = RealPath(probe);
+    if (!finding.passed) {
+        return finding.fact;
+    }
+    struct stat status {};
+    const bool holds = stat(path.c_str(), &status) == 0 && (S_ISREG(status.st_mode) || S_ISDIR(status.st_mode));
+    return holds ? "" : "it is neither a file nor a directory";
 }
 
 }  // namespace fileindexctl

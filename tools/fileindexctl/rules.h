@@ -6,6 +6,7 @@
 
 #include "paths.h"
 
+#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -34,6 +35,24 @@ struct Verdict {
 /// Asks the library about the place as it was taken, and looks at the rules. When the two differ, something may
 /// have changed in between, so both are asked once more before the verdict counts as not explained.
 Verdict Judge(const Place &place);
+
+/// The first part of a full path that cannot be looked at, and why (errno).
+struct Unreachable {
+    std::string part;
+    int error;
+};
+
+/// Nothing when the path's file system is known: what lies on a network file system whose server is dead is never
+/// touched.
+std::optional<Unreachable> FirstUnreachable(const std::string &fullPath);
+
+/// The indexer walks down from a folder and goes into nothing that it passes over: the first such part of the full
+/// path, empty when there is none.
+std::string FirstPassedOver(const std::string &folder, const std::string &path);
+
+/// What keeps a full path in an indexable folder, or that folder itself, out of the index, in a few words; empty
+/// when nothing does.
+std::string ObstacleTo(const std::string &path, const std::string &folder);
 
 }  // namespace fileindexctl
 

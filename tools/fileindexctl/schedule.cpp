@@ -14,6 +14,7 @@
 #include <array>
 #include <cstdio>
 #include <ctime>
+#include <iterator>
 
 namespace fileindexctl {
 
@@ -45,29 +46,49 @@ bool IsNumber(const std::string &text) {
     return !text.empty() && text.find_first_not_of("0123456789") == std::string::npos;
 }
 
-int ParseHours(std::string text) {
-    const std::string given = text;
-    if (text.ends_with('h')) {
-        text.pop_back();
+// "8h", "8", "1h30m", "2d": in seconds, at most more than any pause can take.
+long long ParseDuration(const std::string &text) {
+    static constexpr struct {
+        char letter;
+        long long seconds;
+    } kUnits[] = {{'d', 24 * kSecondsPerHour}, {'h', kSecondsPerHour}, {'m', 60}};
+    long long total = 0;
+    const auto *unit = std::begin(kUnits);
+    std::string rest = IsNumber(text) ? text + "h" : text;
+    while (!rest.empty()) {
+        const auto digits = rest.find_first_not_of("0123456789");
+        unit = digits == std::string::npos || digits == 0
+                   ? std::end(kUnits)
+                   : std::find_if(unit, std::end(kUnits),
+                                  [&](const auto &row) { return row.letter == rest[digits]; });
+        if (unit == std::end(kUnits)) {
+            total = -1;
+            break;
+        }
+        const long long number = digits > 9 ? kLatestEnd : std::stoll(rest);
+        total += std::min(number, kLatestEnd) * unit->seconds;
+        rest.erase(0, digits + 1);
+        ++unit;
     }
-    if (!IsNumber(text)) {
-        throw Failure(ExitStatus::Usage,
-                      "\"" + given + "\" is no number of hours: 8h, 8, or 0 for a pause without an end");
+    if (text.empty() || total < 0 || (total == 0 && !IsNumber(text))) {
+        throw Failure(
+            ExitStatus::Usage,
+            "\"" + text + "\" is no length of time: 8h, 90m, 1h30m, 2d, or 0 for a pause without an end");
     }
-    const long long hours = text.size() > 9 ? kLatestEnd : std::stoll(text);
-    if (std::time(nullptr) + hours * kSecondsPerHour > kLatestEnd) {
+    if (std::time(nullptr) + total > kLatestEnd) {
         throw Failure(ExitStatus::Usage, "a pause cannot end after " + LocalTime(kLatestEnd) +
                                              "; \"fileindexctl pause 0\" is one without an end");
     }
-    return static_cast<int>(hours);
+    return total;
 }
 
 // The next time that local clocks show HH:MM.
 long long ParseUntil(const std::string &text) {
-    const bool shaped =
-        text.size() == 5 && text[2] == ':' && IsNumber(text.substr(0, 2)) && IsNumber(text.substr(3));
-    const int hour = shaped ? std::stoi(text.substr(0, 2)) : 24;
-    const int minute = shaped ? std::stoi(text.substr(3)) : 60;
+    const auto colon = text.find(':');
+    const bool shaped = (colon == 1 || colon == 2) && text.size() == colon + 3 &&
+                        IsNumber(text.substr(0, colon)) && IsNumber(text.substr(colon + 1));
+    const int hour = shaped ? std::stoi(text.substr(0, colon)) : 24;
+    const int minute = shaped ? std::stoi(text.substr(colon + 1)) : 60;
     if (hour > 23 || minute > 59) {
         throw Failure(ExitStatus::Usage, "\"" + text + "\" is no time of day: HH:MM, from 00:00 to 23:59");
     }
@@ -88,7 +109,7 @@ long long ParseUntil(const std::string &text) {
     throw Failure(ExitStatus::Usage, "the clock does not show " + text + " within a day");
 }
 
-// StatusMgr::Pause counts in whole hours from now; for a time of day its steps are taken one by one.
+// StatusMgr::Pause counts in whole hours from now; for any other end its steps are taken one by one.
 StepReport PauseUntil(long long resumeTime, const std::string &saved, Patience &patience) {
     ForgetErrors();
     Status status;
@@ -158,8 +179,8 @@ bool IsPaused(long long resumeTime) {
 
 ExitStatus PauseIndexing(const Arguments &arguments, Output &output) {
     Patience patience(arguments);
-    if (arguments.Has("HOURS") + arguments.Has("--until") + arguments.Has("--run") > 1) {
-        throw Failure(ExitStatus::Usage, "give a number of hours, --until or --run, not several of them");
+    if (arguments.Has("TIME") + arguments.Has("--until") + arguments.Has("--run") > 1) {
+        throw Failure(ExitStatus::Usage, "give a length of time, --until or --run, not several of them");
     }
     if (arguments.Has("--run")) {
         if (arguments.All("--run").front().starts_with("-")) {
@@ -171,7 +192,11 @@ ExitStatus PauseIndexing(const Arguments &arguments, Output &output) {
         const long long resumeTime = ParseUntil(arguments.One("--until"));
         return Report(PauseUntil(resumeTime, "saved", patience), output);
     }
-    const int hours = arguments.Has("HOURS") ? ParseHours(arguments.One("HOURS")) : 0;
+    const long long seconds = arguments.Has("TIME") ? ParseDuration(arguments.One("TIME")) : 0;
+    if (seconds % kSecondsPerHour != 0) {
+        return Report(PauseUntil(std::time(nullptr) + seconds, "saved", patience), output);
+    }
+    const int hours = static_cast<int>(seconds / kSecondsPerHour);
     return Report(StepReport::Perform(Plan(198), Status(), patience, [&] { return StatusMgr::Pause(hours); }),
                   output);
 }

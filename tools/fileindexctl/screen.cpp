@@ -1,5 +1,7 @@
 #include "screen.h"
 
+#include "text.h"
+
 #include <sys/ioctl.h>
 #include <unistd.h>
 
@@ -60,7 +62,7 @@ void Screen::Draw(const std::vector<std::string> &lines) {
     const std::size_t room = Size().ws_row - 1U;  // the cursor stands below
     drawn_ = std::min(lines.size(), room);
     for (std::size_t i = 0; i < drawn_; ++i) {
-        Print(lines[i]);
+        Print(Printable(lines[i]));
         Print(kClearRestOfLine);
         Print("\n");
     }

@@ -12,7 +12,7 @@ namespace fileindexctl {
 /// For the length of its scope the cursor is hidden and long lines are cut by the terminal.
 class Screen {
 public:
-    /// Does stdout lead to a terminal that can do this?
+    /// Does stdout lead to a terminal that can do this, and colours?
     static bool IsUsable();
 
     Screen() { Enter(); }
@@ -22,7 +22,7 @@ public:
 
     static unsigned Width();
 
-    /// Shows the lines in place of the former ones, as many as fit.
+    /// Shows the lines, made printable, in place of the former ones; as many as fit.
     void Draw(const std::vector<std::string> &lines);
 
     /// Hands the terminal back for a while.

@@ -2,6 +2,7 @@
 #include "confirm.h"
 #include "daemon.h"
 #include "failure.h"
+#include "folder_operations.h"
 #include "handlers.h"
 #include "paths.h"
 #include "queue_files.h"
@@ -9,7 +10,6 @@
 #include "steps.h"
 #include "text.h"
 
-#include <fileindex/fileidx.h>
 #include <fileindex/folders.h>
 #include <fileindex/index_mgr.h>
 #include <fileindex/paths.h>
@@ -20,7 +20,6 @@
 #include <sys/stat.h>
 
 #include <algorithm>
-#include <array>
 
 namespace fileindexctl {
 
@@ -64,8 +63,8 @@ void StateShare(const std::string &share, Output &output) {
     }
     const bool isWatched = IsWatched(share);
     output.Data()["watched"] = isWatched;
-    output.Line(Printable("share " + share + ": " + (paths.empty() ? "no folder is indexed" : Enumerate(paths)) +
-                          (isWatched ? ", watched for changes" : ", not watched for changes")));
+    output.Line("share " + share + ": " + (paths.empty() ? "no folder is indexed" : Enumerate(paths)) +
+                (isWatched ? ", watched for changes" : ", not watched for changes"));
 }
 
 ExitStatus Finish(ExitStatus status, const std::string &trouble, Output &output) {
@@ -95,19 +94,21 @@ void AskForOverwriting(const Arguments &arguments, const std::vector<std::string
 
 // The registration is kept under the queue's path, which a share that is gone cannot be asked for any more. A
 // renamed directory has stayed where it was, so the former path stands beside the new one.
-bool WithdrawFormer(const std::string &oldShare, const std::string &newShare) {
+std::string FormerQueue(const std::string &oldShare, const std::string &newShare) {
     if (IsSharePresent(oldShare)) {
-        return IndexMgr::DeleteVorkNotifydCfg(oldShare);
+        return QueuePathOf(oldShare);
     }
-    const std::string queue = QueuePathOf(newShare);
     const std::string directory = RequireShare(newShare);
-    if (!VORK::FILEINDEX::StringStartWith(queue, directory)) {
-        return false;
+    return directory.substr(0, directory.rfind('/') + 1) + oldShare +
+           QueuePathOf(newShare).substr(directory.size());
+}
+
+bool WasPaused(const std::string &formerQueue, const std::string &newShare) {
+    try {
+        return IsQueuePaused(formerQueue) && IsQueuePaused(QueuePathOf(newShare));
+    } catch (const Failure &) {
+        return false;  // the step that registers says what is wrong with the file
     }
-    const std::string former =
-        directory.substr(0, directory.rfind('/') + 1) + oldShare + queue.substr(directory.size());
-    return VORKNOTIFYD::MonitorQueue::Delete(former, kRegistration,
-                                             static_cast<VORKNOTIFYD::_tag_monitor_queue_type_>(1));
 }
 
 // The library leaves the monitor as it was.
@@ -121,10 +122,16 @@ void RefreshMonitor(const std::string &oldShare, const std::string &newShare, Pa
         report.Add("monitor of " + newShare, StepResult::Failed, "folder.conf is locked by another program");
         return;
     }
+    const std::string former = FormerQueue(oldShare, newShare);
+    if (WasPaused(former, newShare)) {
+        report.Add("monitor of " + newShare, StepResult::Skipped, "the share is paused");
+        return;
+    }
     const bool registered = IndexMgr::UpsertVorkNotifydCfg(newShare);
     report.Add("monitor of " + newShare, registered ? StepResult::Done : StepResult::Failed,
                registered ? "" : "it could not be registered");
-    const bool withdrawn = WithdrawFormer(oldShare, newShare);
+    const bool withdrawn =
+        VORKNOTIFYD::MonitorQueue::Delete(former, kRegistration, VORKNOTIFYD::MONITOR_QUEUE_TYPE_FILE);
     report.Add("monitor of " + oldShare, withdrawn ? StepResult::Done : StepResult::Failed,
                withdrawn ? "" : "it could not be withdrawn");
 }
@@ -132,6 +139,14 @@ void RefreshMonitor(const std::string &oldShare, const std::string &newShare, Pa
 // Nothing was reached: for lack of permission?
 ExitStatus StatusOf(const StepReport &report, bool isDenied) {
     return report.Status() == ExitStatus::Unreachable && isDenied ? ExitStatus::Permission : report.Status();
+}
+
+void RequireNoLink(const std::string &directory) {
+    struct stat status {};
+    if (lstat(directory.c_str(), &status) == 0 && S_ISLNK(status.st_mode)) {
+        throw Failure(ExitStatus::CannotSave,
+                      directory + " is a symbolic link, and nothing is deleted through it; remove the link");
+    }
 }
 
 bool Exists(const std::string &path) {
@@ -168,7 +183,10 @@ ExitStatus RemoveShare(const Arguments &arguments, Output &output) {
     const std::string share = arguments.One("SHARE");
     const Folders folders = ReadFolders();
     const auto paths = RequireIndexed(share, folders);
-    RequireConsent(arguments, "this removes " + Enumerate(paths) + " from the index");
+    const std::string restart = RestartWith(false, paths.size() == folders.size());
+    RequireConsent(arguments, "this removes " + Enumerate(paths) + " from the index" +
+                                  (restart.empty() ? "" : "; ") + restart);
+    AnnounceRestart(restart, output);
     std::vector<PlannedStep> plan = {SaveStep()};
     if (paths.size() == folders.size()) {
         plan.push_back({"service", "fileindexd could not be stopped", {}, {{kIndexMgr, 535}}});
@@ -229,6 +247,9 @@ ExitStatus ResumeShare(const Arguments &arguments, Output &output) {
 ExitStatus CleanShare(const Arguments &arguments, Output &output) {
     const std::string share = arguments.One("SHARE");
     RequireShare(share);
+    const std::string queue = QueuePathOf(share);
+    const std::string directory = queue.substr(0, queue.rfind('/'));
+    RequireNoLink(directory);
     if (IndexMgr::IsShareIndexed(share)) {
         output.Warn("folders of the share \"" + share +
                     "\" are indexed; pause the share before, reindex them after");
@@ -236,11 +257,8 @@ ExitStatus CleanShare(const Arguments &arguments, Output &output) {
     RequireConsent(arguments,
                    "this deletes the event queue and the index database of the share \"" + share + "\"");
 
-    std::array<char, 4096> database{};
-    FILEIDXDBPathGet(share.c_str(), database.data(), database.size());
-    const std::string queue = QueuePathOf(share);
     const std::pair<const char *, std::string> files[] = {
-        {"queue", queue}, {"queue at work", queue + ".tmp"}, {"database", database.data()}};
+        {"queue", queue}, {"queue .tmp", queue + ".tmp"}, {"database", directory + "/VORK@.fileindexdb"}};
     StepReport report;
     for (const auto &[name, path] : files) {
         report.Add(name, Exists(path) ? StepResult::Done : StepResult::Already);
@@ -255,7 +273,7 @@ ExitStatus CleanShare(const Arguments &arguments, Output &output) {
     }
     report.Show(output);
     if (!report.Has(StepResult::Failed)) {
-        output.Line(Printable("share " + share + ": no index data"));
+        output.Line("share " + share + ": no index data");
         return ExitStatus::Done;
     }
     const ExitStatus none = MayNotWrite(queue) ? ExitStatus::Permission : ExitStatus::CannotSave;

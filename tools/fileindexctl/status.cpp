@@ -28,6 +28,12 @@ double Now() {
     return std::chrono::duration<double>(std::chrono::steady_clock::now().time_since_epoch()).count();
 }
 
+// A queue that was taken keeps the whole from being finished, with no line in it, too; not a folder.
+std::string ProgressText(const StatusReport &report, const Progress &progress) {
+    const bool isTaken = progress.Left() == 0 && !report.shares.empty() && report.Taken() != "nothing";
+    return isTaken ? "a taken queue waits" : progress.Text();
+}
+
 void AddProgress(const Progress &progress, StatusReport &report) {
     auto &data = report.data["progress"];
     data["left"] = static_cast<Json::UInt64>(progress.Left());
@@ -36,8 +42,8 @@ void AddProgress(const Progress &progress, StatusReport &report) {
     data["seconds_left"] = progress.SecondsLeft() ? Json::Value(*progress.SecondsLeft()) : Json::Value();
     data["seconds_without_progress"] = progress.SecondsWithoutProgress();
     report.data["time"] = static_cast<Json::Int64>(std::time(nullptr));
-    report.facts.push_back({"at work on", report.AtWork()});
-    report.facts.push_back({"progress", progress.Text()});
+    report.facts.push_back({"taken away", report.Taken()});
+    report.facts.push_back({"progress", ProgressText(report, progress)});
 }
 
 StatusReport Sample(const Reporter &reporter, Progress &progress) {
@@ -66,16 +72,20 @@ std::string Brief(const StatusReport &report, const Progress &progress) {
     for (const auto &[name, backlog] : report.backlogs) {
         shares.push_back(name + " " + std::to_string(backlog.Total()));
     }
-    return Printable(Clock() + ": " + report.state + ", " + std::to_string(report.Queued()) + " queued" +
-                     (shares.empty() ? "" : " (" + Enumerate(shares) + ")") + ", at work on " + report.AtWork() +
-                     ", " + progress.Text());
+    std::vector<std::string> paused;
+    for (const auto &share : report.data["paused_shares"]) {
+        paused.push_back(share.asString());
+    }
+    return Clock() + ": " + report.state + ", " + std::to_string(report.Queued()) + " queued" +
+           (shares.empty() ? "" : " (" + Enumerate(shares) + ")") + ", taken away: " + report.Taken() + ", " +
+           (paused.empty() ? "" : "paused: " + Enumerate(paused) + ", ") + ProgressText(report, progress);
 }
 
 void Draw(const StatusReport &report, unsigned long interval, Screen &screen) {
     auto lines = report.Lines(Screen::Width());
     lines.emplace_back();
     for (const auto &warning : report.gaps.Warnings()) {
-        lines.push_back("warning: " + Printable(warning));
+        lines.push_back("warning: " + warning);
     }
     lines.push_back("every " + std::to_string(interval) + " s; Ctrl-C ends it");
     screen.Draw(lines);
@@ -127,7 +137,7 @@ void Watch(const Reporter &reporter, unsigned long interval, Output &output) {
     const bool echoed = screen.has_value();
     screen.reset();
     if (echoed) {
-        output.Line("");  // behind the "^C" of the terminal
+        output.Line("");  // after the "^C" of the terminal
     }
     if (signal != SIGINT) {
         signals.Deliver(signal);

@@ -4,13 +4,17 @@
 #include "failure.h"
 #include "folder_text.h"
 #include "paths.h"
+#include "queue_files.h"
 #include "records.h"
+#include "registrations.h"
 #include "schedule.h"
 #include "status_file.h"
 #include "text.h"
 
 #include <fileindex/indexability.h>
 #include <fileindex/status_mgr.h>
+
+#include <algorithm>
 
 namespace fileindexctl {
 
@@ -24,6 +28,12 @@ std::string Listed(const std::vector<std::string> &items) {
 
 std::string EventsText(const Backlog &backlog) {
     return BacklogText(backlog) + (backlog.hasTemporary ? " (.tmp present)" : "");
+}
+
+void SetState(const std::string &state, StatusReport &report) {
+    report.state = state;
+    report.data["status"] = state;
+    report.facts.front() = {"state", state};
 }
 
 void AddService(StatusReport &report) {
@@ -43,16 +53,28 @@ void AddService(StatusReport &report) {
     const auto noSpace = file.Marked("no_space");
     const auto needReindex = file.Marked("need_reindex");
     const DaemonState daemon = ProbeDaemon();
-    report.data["status"] = report.state;
     report.data["resume_time"] = static_cast<Json::Int64>(resumeTime);
-    report.data["daemon"] = daemon.reachable;
+    report.data["daemon"] = daemon.ForPrograms();
     report.data["no_space"] = ToArray(noSpace);
     report.data["need_reindex"] = ToArray(needReindex);
-    report.facts = {{"state", report.state},
+    report.facts = {{"state", ""},
                     {"pause", PauseText(resumeTime)},
                     {"daemon", daemon.text},
                     {"out of space", Listed(noSpace)},
                     {"to be reindexed", Listed(needReindex)}};
+    SetState(report.state, report);
+}
+
+void AddPauses(const std::set<std::string> &shares, StatusReport &report) {
+    try {
+        const auto paused = PausedShares(shares);
+        report.data["paused_shares"] = ToArray({paused.begin(), paused.end()});
+        for (const auto &share : paused) {
+            report.facts.push_back({"paused share", PausedText(share)});
+        }
+    } catch (const Failure &failure) {
+        report.gaps.Add(std::string("which shares are paused cannot be told: ") + failure.what());
+    }
 }
 
 // Folders for which nothing waits are left out of what people see.
@@ -117,11 +139,11 @@ unsigned long StatusReport::Queued() const {
     return queued;
 }
 
-std::string StatusReport::AtWork() const {
+std::string StatusReport::Taken() const {
     std::vector<std::string> items;
     for (const auto &[name, backlog] : backlogs) {
         if (backlog.hasTemporary) {
-            items.push_back(name + " (" + std::to_string(backlog.taken) + " taken)");
+            items.push_back(name + " (" + std::to_string(backlog.taken) + ")");
         }
     }
     return items.empty() ? "nothing" : Enumerate(items);
@@ -141,12 +163,23 @@ StatusReport ReportService(const std::string &onlyShare) {
     for (const auto &folder : ReadFolders()) {
         shares[ShareOf(folder.path)].push_back(folder);
     }
+    const auto isReadable = [](const auto &entry) { return IsQueueReadable(entry.first); };
+    if (report.state == "finished" && !std::all_of(shares.begin(), shares.end(), isReadable)) {
+        SetState("unknown", report);
+    }
     if (!onlyShare.empty()) {
         if (shares.count(onlyShare) == 0) {
             RequireShare(onlyShare);
         }
         shares = {{onlyShare, shares[onlyShare]}};
     }
+    std::set<std::string> indexed;
+    for (const auto &[share, folders] : shares) {
+        if (!folders.empty()) {
+            indexed.insert(share);
+        }
+    }
+    AddPauses(indexed, report);
     report.shares = {{"SHARE", "FOLDERS", "QUEUED", "OLDEST", "EVENTS"}};
     report.folders = {{"FOLDER", "QUEUED", "EVENTS"}};
     report.data["share"] = Json::Value(Json::arrayValue);
@@ -173,6 +206,7 @@ StatusReport ReportFolder(const std::string &given) {
                     {"state", report.state},
                     {"queued", backlog ? EventsText(*backlog) : "the share is away"},
                     {"oldest", backlog ? AgeText(backlog->oldest) : "-"}};
+    AddPauses({ShareOf(folder.path)}, report);
     if (backlog) {
         report.backlogs[folder.path] = *backlog;
     }

@@ -28,8 +28,8 @@ struct StatusReport {
 
     unsigned long Queued() const;
 
-    /// "photo: 12 events taken from its queue", "nothing".
-    std::string AtWork() const;
+    /// What lies beside the queues (".tmp"): "photo (12)", "nothing".
+    std::string Taken() const;
 
     /// `width` as for Align.
     std::vector<std::string> Lines(unsigned width) const;

@@ -2,11 +2,16 @@
 
 #include "failure.h"
 #include "platform_error.h"
+#include "queue_files.h"
+#include "registrations.h"
 #include "text.h"
 
 #include <fileindex/error.h>
 
+#include <sys/stat.h>
+
 #include <algorithm>
+#include <string_view>
 
 namespace fileindexctl {
 
@@ -21,12 +26,62 @@ const std::string *FirstOf(const std::vector<Mark> &marks) {
     return nullptr;
 }
 
-std::string Explain(const PlannedStep &step, const std::string *message) {
-    if (message == nullptr) {
-        return step.trouble;
+// What the platform kept of the file-change monitor's registrations is the usual reason.
+std::string TroubleWithRegistrations() {
+    try {
+        ReadRegistrations();
+    } catch (const Failure &failure) {
+        return failure.Status() == ExitStatus::Malformed
+                   ? failure.what() + std::string("; \"fileindexctl doctor --fix\" mends it")
+                   : failure.what();
     }
-    const std::string cause = PlatformErrorOf(*message);
-    return step.trouble + (cause.empty() ? "" : ": " + cause) + " (" + *message + ")";
+    return {};
+}
+
+std::string TroubleWithQueues(const std::set<std::string> &shares) {
+    for (const auto &share : shares) {
+        std::string trouble = TroubleWithQueue(share);
+        if (!trouble.empty()) {
+            return trouble;
+        }
+    }
+    return {};
+}
+
+// The command that shows what a service that failed has said itself.
+std::string WhereToLook(const std::string &record, const std::string &cause) {
+    struct stat status {};
+    const bool ran = record.find("VLIBService") != std::string::npos &&
+                     record.find("err=[0x1500") == std::string::npos;  // there is no such service
+    if (!ran || cause.find('"') != std::string::npos) {                // a command is named already
+        return {};
+    }
+    const bool fileSharing = record.find("VLIBServiceRestart") != std::string::npos;  // nothing else is restarted
+    if (stat("/run/systemd/system", &status) == 0) {
+        return std::string("; see: journalctl -n 20 -u ") + (fileSharing ? "'smb*'" : "fileindexd");
+    }
+    return std::string("; see: service ") + (fileSharing ? "smbd" : "fileindexd") + " status";
+}
+
+// A record ends with the share or path that it is about.
+std::string SubjectOf(const std::string &record) {
+    for (const std::string_view mark : {", share=", ", path="}) {
+        const auto found = record.find(mark);
+        if (found != std::string::npos) {
+            return " (" + record.substr(found + mark.size()) + ")";
+        }
+    }
+    return {};
+}
+
+std::string Explain(const PlannedStep &step, const std::string *record) {
+    std::string cause = TroubleWithQueues(step.shares);
+    if (record == nullptr) {
+        return step.trouble + (cause.empty() ? "" : ": " + cause);
+    }
+    cause = step.name.starts_with("monitor") ? TroubleWithRegistrations() : cause;
+    cause = cause.empty() ? PlatformErrorOf(*record) : cause;
+    return step.trouble + SubjectOf(*record) + (cause.empty() ? "" : ": " + cause) + WhereToLook(*record, cause);
 }
 
 struct Wording {
@@ -69,10 +124,10 @@ StepReport StepReport::Trace(const std::vector<PlannedStep> &plan, bool succeede
         if (stopped) {
             report.Add(step.name, StepResult::NotReached);
         } else if (!succeeded && (fatal != nullptr || (!marked && step.evidence != Evidence::Record))) {
-            report.Add(step.name, StepResult::Failed, Explain(step, fatal));
+            report.Add(step.name, StepResult::Failed, Explain(step, fatal), fatal == nullptr ? "" : *fatal);
             stopped = true;
         } else if (tolerated != nullptr) {
-            report.Add(step.name, StepResult::WentOn, Explain(step, tolerated));
+            report.Add(step.name, StepResult::WentOn, Explain(step, tolerated), *tolerated);
         } else {
             report.Add(step.name, StepResult::Done);
         }
@@ -95,6 +150,7 @@ StepReport StepReport::Perform(const std::vector<PlannedStep> &plan, const VORK:
 
 StepReport StepReport::Perform(const std::vector<PlannedStep> &plan, const VORK::FILEINDEX::Config &config,
                                Patience &patience, const std::function<bool()> &call) {
+    RequireMayChange();
     for (;;) {
         try {
             return Perform(plan, config, call);
@@ -115,8 +171,9 @@ void MarkDroppedEvents(StepReport &report) {
     }
 }
 
-void StepReport::Add(const std::string &name, StepResult result, const std::string &detail) {
-    steps_.push_back({name, result, detail});
+void StepReport::Add(const std::string &name, StepResult result, const std::string &detail,
+                     const std::string &record) {
+    steps_.push_back({name, result, detail, record});
 }
 
 void StepReport::Correct(const std::string &name, StepResult result, const std::string &detail) {
@@ -163,6 +220,9 @@ std::vector<std::string> StepReport::Tell(Output &output) const {
         entry["step"] = step.name;
         entry["result"] = wording.forPrograms;
         entry["detail"] = step.detail;
+        if (!step.record.empty()) {
+            entry["record"] = step.record;
+        }
         list.append(entry);
     }
     return Align(rows, 0);
@@ -177,7 +237,7 @@ void StepReport::Note(Output &output) const {
 void StepReport::Show(Output &output) const {
     const auto lines = Tell(output);
     for (std::size_t i = 0; i < lines.size(); ++i) {
-        output.Line(output.Paint(WordingOf(steps_[i].result).colour, lines[i]));
+        output.Line(lines[i], WordingOf(steps_[i].result).colour);
     }
     for (const auto &step : steps_) {
         if (step.result == StepResult::WentOn) {

@@ -16,6 +16,7 @@
 #include <fileindex/config.h>
 
 #include <functional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -45,6 +46,7 @@ struct PlannedStep {
     std::vector<Mark> fatal;        ///< records after which the library stops
     std::vector<Mark> tolerated{};  ///< records after which it goes on
     Evidence evidence = Evidence::Record;
+    std::set<std::string> shares{};  ///< those whose queues it writes to
 };
 
 /// The step that locks, reads, changes and saves the file of a configuration.
@@ -61,11 +63,14 @@ public:
                               const std::function<bool()> &call);
 
     /// The same for a plan that begins with a SaveStep. The call is made again, for as long as `patience` lasts,
-    /// while it ends because another program holds that step's lock: nothing has been done then.
+    /// while it ends because another program holds that step's lock: nothing has been done then. Needs the right
+    /// to change the configuration.
     static StepReport Perform(const std::vector<PlannedStep> &plan, const VORK::FILEINDEX::Config &config,
                               Patience &patience, const std::function<bool()> &call);
 
-    void Add(const std::string &name, StepResult result, const std::string &detail = std::string());
+    /// `record` is the library's record of a failure, for programs.
+    void Add(const std::string &name, StepResult result, const std::string &detail = std::string(),
+             const std::string &record = std::string());
 
     /// Changes the result of a step that Trace saw done; another stays.
     void Correct(const std::string &name, StepResult result, const std::string &detail = std::string());
@@ -91,6 +96,7 @@ private:
         std::string name;
         StepResult result;
         std::string detail;
+        std::string record;
     };
 
     std::vector<std::string> Tell(Output &output) const;

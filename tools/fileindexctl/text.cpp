@@ -1,5 +1,6 @@
 #include "text.h"
 
+#include <unictype.h>
 #include <unistr.h>
 #include <uniwidth.h>
 
@@ -10,13 +11,15 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
+#include <numeric>
 
 namespace fileindexctl {
 
 namespace {
 
 constexpr unsigned kGap = 2;
-constexpr unsigned kShortestPath = 12;
+constexpr unsigned kNarrowest = 4;
+constexpr unsigned kDots = 3;
 
 const std::uint8_t *Bytes(const std::string &text) {
     return reinterpret_cast<const std::uint8_t *>(text.data());
@@ -24,6 +27,13 @@ const std::uint8_t *Bytes(const std::string &text) {
 
 bool IsUtf8(const std::string &text) {
     return u8_check(Bytes(text), text.size()) == nullptr;
+}
+
+// No control character, nor one that is not seen, breaks the line or turns the direction of what follows.
+bool IsHarmless(ucs4_t character) {
+    constexpr std::uint32_t kUnseen = UC_CATEGORY_MASK_Cf | UC_CATEGORY_MASK_Zl | UC_CATEGORY_MASK_Zp;
+    return character >= 0x20 && (character < 0x7F || character >= 0xA0) &&
+           !uc_is_general_category_withtable(character, kUnseen);
 }
 
 std::string Escape(unsigned char byte) {
@@ -49,46 +59,71 @@ std::vector<unsigned> ColumnWidths(const std::vector<std::vector<std::string>> &
     return widths;
 }
 
-unsigned FirstColumnWidth(const std::vector<unsigned> &widths, unsigned width) {
-    unsigned others = 0;
-    for (std::size_t column = 1; column < widths.size(); ++column) {
-        others += kGap + widths[column];
+// Takes from the widest columns until a row fits.
+void Fit(unsigned width, std::vector<unsigned> &widths) {
+    unsigned row = kGap * static_cast<unsigned>(widths.size() - 1);
+    row = std::accumulate(widths.begin(), widths.end(), row);
+    for (; row > width; --row) {
+        const auto widest = std::max_element(widths.begin(), widths.end());
+        if (*widest <= kNarrowest) {
+            return;
+        }
+        --*widest;
     }
-    const unsigned left = width > others ? width - others : 0;
-    return std::min(widths.front(), std::max(left, kShortestPath));
+}
+
+struct Character {
+    std::size_t length;
+    unsigned width;
+};
+
+Character CharacterAt(const std::string &text, std::size_t place) {
+    ucs4_t character = 0;
+    const int length = u8_mbtouc(&character, Bytes(text) + place, text.size() - place);
+    return {static_cast<std::size_t>(length), static_cast<unsigned>(std::max(uc_width(character, "UTF-8"), 0))};
+}
+
+// The end of a path and the beginning of other texts, with "..." in the place of the rest. Takes UTF-8.
+std::string Shorten(const std::string &text, unsigned width) {
+    unsigned whole = DisplayWidth(text);
+    if (whole <= width) {
+        return text;
+    }
+    const std::string dots(std::min(width, kDots), '.');
+    const unsigned room = width - static_cast<unsigned>(dots.size());
+    std::size_t cut = 0;
+    if (text.starts_with('/')) {
+        while (whole > room) {
+            const Character first = CharacterAt(text, cut);
+            whole -= first.width;
+            cut += first.length;
+        }
+        return dots + text.substr(cut);
+    }
+    unsigned used = 0;
+    for (Character next = CharacterAt(text, 0); used + next.width <= room; next = CharacterAt(text, cut)) {
+        used += next.width;
+        cut += next.length;
+    }
+    return text.substr(0, cut) + dots;
 }
 
 }  // namespace
 
 std::string Printable(const std::string &text) {
     std::string result;
-    for (std::size_t i = 0; i < text.size(); ++i) {
-        const auto byte = static_cast<unsigned char>(text[i]);
-        const auto next = static_cast<unsigned char>(i + 1 < text.size() ? text[i + 1] : 0);
-        if (byte < 0x20 || byte == 0x7F) {
-            result += Escape(byte);
-        } else if (byte == 0xC2 && next >= 0x80 &&
-                   next < 0xA0) {  // terminals obey the upper control characters too
-            result += Escape(byte) + Escape(next);
-            ++i;
-        } else {
-            result += text[i];
-        }
-    }
-    return result;
-}
-
-std::string AsUtf8(const std::string &text) {
-    std::string result;
     for (std::size_t i = 0; i < text.size();) {
         ucs4_t character = 0;
         const int length = u8_mbtoucr(&character, Bytes(text) + i, text.size() - i);
-        if (length > 0) {
-            result.append(text, i, static_cast<std::size_t>(length));
-        } else {
+        const std::size_t end = i + static_cast<std::size_t>(std::max(length, 1));
+        const bool passes = length > 0 && IsHarmless(character);
+        if (passes) {
+            result.append(text, i, end - i);
+        }
+        for (; !passes && i < end; ++i) {
             result += Escape(static_cast<unsigned char>(text[i]));
         }
-        i += static_cast<std::size_t>(std::max(length, 1));
+        i = end;
     }
     return result;
 }
@@ -96,19 +131,6 @@ std::string AsUtf8(const std::string &text) {
 unsigned DisplayWidth(const std::string &text) {
     const int width = IsUtf8(text) ? u8_width(Bytes(text), text.size(), "UTF-8") : -1;
     return width >= 0 ? static_cast<unsigned>(width) : static_cast<unsigned>(text.size());
-}
-
-std::string ShortenFront(const std::string &text, unsigned width) {
-    if (DisplayWidth(text) <= width) {
-        return text;
-    }
-    const bool utf8 = IsUtf8(text);
-    std::string rest = text;
-    while (!rest.empty() && DisplayWidth(rest) + 3 > width) {
-        const int length = utf8 ? u8_mblen(Bytes(rest), rest.size()) : 1;
-        rest.erase(0, static_cast<std::size_t>(std::max(length, 1)));
-    }
-    return "..." + rest;
 }
 
 std::string Quoted(const std::string &text) {
@@ -146,9 +168,9 @@ std::vector<std::string> Align(std::vector<std::vector<std::string>> rows, unsig
     }
     std::vector<unsigned> widths = ColumnWidths(rows);
     if (width > 0 && !widths.empty()) {
-        widths.front() = FirstColumnWidth(widths, width);
+        Fit(width, widths);
         for (auto &row : rows) {
-            row.front() = ShortenFront(row.front(), widths.front());
+            std::transform(row.begin(), row.end(), widths.begin(), row.begin(), Shorten);
         }
     }
     std::vector<std::string> lines;
@@ -161,7 +183,7 @@ std::vector<std::string> Align(std::vector<std::vector<std::string>> rows, unsig
             }
         }
         line.erase(line.find_last_not_of(' ') + 1);
-        lines.push_back(std::move(line));
+        lines.push_back(width > 0 ? Shorten(line, width) : std::move(line));
     }
     return lines;
 }

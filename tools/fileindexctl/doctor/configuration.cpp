@@ -1,6 +1,7 @@
-// Do the configuration files parse, and can they be changed?
+// Do the configuration files parse, and can they be changed, by root alone?
 #include "../failure.h"
 #include "../platform_file.h"
+#include "../registrations.h"
 #include "../status_file.h"
 #include "../text.h"
 #include "finding.h"
@@ -10,13 +11,15 @@
 
 #include <sys/stat.h>
 
-#include <cerrno>
-#include <cstring>
+#include <filesystem>
 #include <fstream>
+#include <system_error>
 
 namespace fileindexctl::doctor {
 
 namespace {
+
+constexpr const char *kOwnDirectory = "/usr/vork";
 
 std::string DirectoryOf(const std::string &path) {
     return path.substr(0, path.rfind('/'));
@@ -27,13 +30,53 @@ Findings CheckDirectory(const std::string &directory) {
     if (stat(directory.c_str(), &status) == 0 && S_ISDIR(status.st_mode)) {
         return {};
     }
-    const auto make = [directory] {
+    const auto make = [directory](Patience &) {
         if (mkdir(directory.c_str(), 0755) != 0) {
-            throw Failure(ExitStatus::CannotSave, directory + " cannot be made: " + std::strerror(errno));
+            throw ErrnoFailure(directory, "made");
         }
+        return std::string();
     };
-    return {{"there is no directory " + directory, "nothing can be saved: the library does not make it",
-             "mkdir -p " + directory, Repair{directory, {"+ a directory, mode 0755"}, false, make}}};
+    return {{"there is no directory " + directory,
+             "nothing can be saved: the library does not make it",
+             "mkdir -p " + directory,
+             {{directory, "makes it, mode 0755", {"+ a directory, mode 0755"}, make}}}};
+}
+
+// The file, and what leads to it: who may write to one of these directories can put another file into its place.
+// Those of the system itself are not for this program to change.
+Findings CheckWay(const std::string &path) {
+    Findings findings;
+    std::error_code error;
+    for (auto place = std::filesystem::canonical(path, error); !error; place = place.parent_path()) {
+        Findings found =
+            CheckOwnership(place, kNotForOthersToWrite,
+                           "others than root can exchange the configuration, and so what root does with it");
+        for (auto &finding : found) {
+            if (!LiesIn(place, kOwnDirectory)) {
+                finding.repairs.clear();
+            }
+        }
+        Append(findings, found);
+        if (place == place.parent_path()) {
+            break;
+        }
+    }
+    return findings;
+}
+
+// The ways of all files, which share most of theirs.
+Findings CheckWays(const std::string &directory) {
+    std::map<std::vector<std::string>, Finding> findings;
+    for (const std::string &path : {directory, std::string(kPlatformFile), std::string(kRegistrationsFile)}) {
+        for (const auto &finding : CheckWay(path)) {
+            findings.emplace(finding.items, finding);
+        }
+    }
+    Findings list;
+    for (const auto &[items, finding] : findings) {
+        list.push_back(finding);
+    }
+    return list;
 }
 
 std::string KindOf(const std::string &path) {
@@ -45,7 +88,7 @@ std::string KindOf(const std::string &path) {
 }
 
 // What holds for every configuration file of the library.
-Findings CheckFile(VORK::FILEINDEX::Config &config, const Repair &repair) {
+Findings CheckFile(VORK::FILEINDEX::Config &config, const Repairs &repairs) {
     const std::string path = config.GetPath();
     const std::string kind = KindOf(path);
     if (!kind.empty()) {
@@ -53,21 +96,28 @@ Findings CheckFile(VORK::FILEINDEX::Config &config, const Repair &repair) {
                  "the library takes it for missing, and everything in it for not configured",
                  "put the file itself into that place"}};
     }
-    Findings findings = CheckOwnership(path, "the file is to be read by everybody and changed by root alone");
+    Findings findings =
+        CheckOwnership(path, kReadByAll, "the file is to be read by everybody and changed by root alone");
     ForgetErrors();
-    if (!config.Load()) {
-        Finding finding{FailureOf(config).what(), "every operation on it fails", "mend it with an editor"};
-        if (FailureOf(config).Status() != ExitStatus::Permission && repair.edit) {
-            finding.repair = repair;
-        }
-        findings.push_back(finding);
+    if (config.Load()) {
+        return findings;
     }
+    const Failure failure = FailureOf(config);
+    findings.push_back(
+        failure.Status() == ExitStatus::Permission
+            ? NotAllowed(failure.what())
+            : Finding{failure.what(), "every operation on it fails", "mend it with an editor", repairs});
     return findings;
 }
 
 Repair EmptyStatus(const std::string &path) {
     std::ifstream file(path);
-    Repair repair{path, {}, true, {}, [](Json::Value &document) { document = Json::objectValue; }, true};
+    Repair repair{path,
+                  "puts an empty document into its place",
+                  {},
+                  {},
+                  [](Json::Value &document) { document = Json::objectValue; },
+                  true};
     for (std::string line; std::getline(file, line);) {
         repair.difference.push_back("- " + line);
     }
@@ -111,8 +161,10 @@ constexpr MemberRule kMembers[] = {
 
 Findings CheckMembers(const std::string &path, const Json::Value &document) {
     if (!document.isObject()) {
-        return {{path + " is not a JSON object", "nothing in it can be told or changed", "mend it with an editor",
-                 EmptyStatus(path)}};
+        return {{path + " is not a JSON object",
+                 "nothing in it can be told or changed",
+                 "mend it with an editor",
+                 {EmptyStatus(path)}}};
     }
     Findings findings;
     for (const auto &rule : kMembers) {
@@ -122,10 +174,14 @@ Findings CheckMembers(const std::string &path, const Json::Value &document) {
                     changed.removeMember(rule.name);
                 }
             };
-            findings.push_back(
-                {path + ": " + Quoted(rule.name) + " is not " + rule.expected, rule.why, "remove the member",
-                 Repair{
-                     path, {"- " + Quoted(rule.name) + ": " + OneLine(document[rule.name])}, true, {}, remove}});
+            findings.push_back({path + ": " + Quoted(rule.name) + " is not " + rule.expected,
+                                rule.why,
+                                "remove the member",
+                                {{path,
+                                  "removes the member",
+                                  {"- " + Quoted(rule.name) + ": " + OneLine(document[rule.name])},
+                                  {},
+                                  remove}}});
         }
     }
     return findings;
@@ -133,17 +189,29 @@ Findings CheckMembers(const std::string &path, const Json::Value &document) {
 
 Findings CheckPlatform() {
     try {
-        ReadPlatformFile();
-        return {};
+        const Json::Value document = ReadPlatformFile();
+        Findings findings;
+        for (const auto &member : UnknownMembers(document)) {
+            findings.push_back({std::string("unknown member in ") + kPlatformFile,
+                                "it is ignored; if it is misspelt, a share or a setting is missing",
+                                "correct its name if it is misspelt",
+                                {},
+                                Level::Note,
+                                {member}});
+        }
+        if (!document["shares"].isNull() && !document["shares"].isObject()) {
+            findings.push_back({std::string(kPlatformFile) + ": \"shares\" is not an object",
+                                "the platform knows no shares, and nothing can be indexed",
+                                "mend it with an editor"});
+        }
+        return findings;
     } catch (const Failure &failure) {
-        const bool isDenied = failure.Status() == ExitStatus::Permission;
+        if (failure.Status() == ExitStatus::Permission) {
+            return {NotAllowed(failure.what())};
+        }
         return {{failure.what(), "without it the platform knows no shares, and nothing can be indexed",
-                 isDenied ? "run this as the administrator" : "mend it with an editor, or write a new one"}};
+                 "mend it with an editor, or write a new one"}};
     }
-}
-
-void Append(Findings &findings, const Findings &more) {
-    findings.insert(findings.end(), more.begin(), more.end());
 }
 
 }  // namespace
@@ -152,8 +220,9 @@ Findings CheckConfiguration(const Facts & /*facts*/) {
     VORK::FILEINDEX::Folders folders;
     StatusFile status;
     Findings findings = CheckDirectory(DirectoryOf(folders.GetPath()));
+    Append(findings, CheckWays(DirectoryOf(folders.GetPath())));
     Append(findings, CheckFile(folders, {}));
-    Append(findings, CheckFile(status, EmptyStatus(status.GetPath())));
+    Append(findings, CheckFile(status, {EmptyStatus(status.GetPath())}));
     Append(findings, CheckMembers(status.GetPath(), status.Document()));
     Append(findings, CheckPlatform());
     return findings;

@@ -4,52 +4,89 @@
 #include "../failure.h"
 
 #include <fcntl.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
 #include <array>
-#include <cerrno>
 #include <cstdio>
-#include <cstring>
 
 namespace fileindexctl::doctor {
 
 namespace {
 
-constexpr mode_t kMode = 0644;
+mode_t Mended(mode_t mode, Modes modes) {
+    return ((mode | modes.required) & ~modes.forbidden) & 07777U;
+}
 
-std::string OwnershipText(uid_t owner, gid_t group, mode_t mode) {
-    std::array<char, 64> text{};
-    std::snprintf(text.data(), text.size(), "owner %u:%u, mode %04o", owner, group, mode & 07777U);
+std::string OctalText(mode_t mode) {
+    std::array<char, 16> text{};
+    std::snprintf(text.data(), text.size(), "%04o", mode & 07777U);
     return text.data();
 }
 
+std::string OwnershipText(const struct stat &status) {
+    return "owner " + std::to_string(status.st_uid) + ":" + std::to_string(status.st_gid) + ", mode " +
+           OctalText(status.st_mode);
+}
+
+bool MayBeMended(const struct stat &status) {
+    return S_ISDIR(status.st_mode) || (S_ISREG(status.st_mode) && status.st_nlink == 1);
+}
+
+struct stat AfterMending(struct stat status, Modes modes) {
+    if (status.st_uid != 0) {
+        status.st_uid = 0;
+        status.st_gid = 0;
+    }
+    status.st_mode = Mended(status.st_mode, modes);
+    return status;
+}
+
 // On the file that was opened, whatever stands under its name by now.
-void Correct(const std::string &path) {
+void Correct(const std::string &path, Modes modes) {
     const Descriptor file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
     struct stat status {};
-    if (!file || fstat(file.Get(), &status) != 0 || !S_ISREG(status.st_mode) || fchown(file.Get(), 0, 0) != 0 ||
-        fchmod(file.Get(), kMode) != 0) {
-        const bool denied = errno == EACCES || errno == EPERM || errno == EROFS;
-        throw Failure(denied ? ExitStatus::Permission : ExitStatus::CannotSave,
-                      path + " cannot be changed: " + std::strerror(errno));
+    const bool opened = file && fstat(file.Get(), &status) == 0;
+    if (opened && !MayBeMended(status)) {
+        throw Failure(ExitStatus::CannotSave, path + " has been replaced meanwhile, or has further names");
+    }
+    const struct stat after = AfterMending(status, modes);
+    if (!opened || (status.st_uid != 0 && fchown(file.Get(), after.st_uid, after.st_gid) != 0) ||
+        fchmod(file.Get(), after.st_mode) != 0) {
+        throw ErrnoFailure(path, "changed");
     }
 }
 
 }  // namespace
 
-Findings CheckOwnership(const std::string &path, const std::string &why) {
+Findings CheckOwnership(const std::string &path, Modes modes, const std::string &why) {
     struct stat status {};
-    if (lstat(path.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) {
+    if (lstat(path.c_str(), &status) != 0 || (!S_ISREG(status.st_mode) && !S_ISDIR(status.st_mode))) {
         return {};
     }
-    const bool fits = status.st_uid == 0 && (status.st_mode & 07777U) == kMode;
-    if (fits) {
+    const mode_t mended = Mended(status.st_mode, modes);
+    if (status.st_uid == 0 && (status.st_mode & 07777U) == mended) {
         return {};
     }
-    const std::string now = OwnershipText(status.st_uid, status.st_gid, status.st_mode);
-    return {{path + " has " + now, why, "chown root:root " + path + "; chmod 0644 " + path,
-             Repair{path, {"- " + now, "+ " + OwnershipText(0, 0, kMode)}, false, [path] { Correct(path); }}}};
+    const std::string now = OwnershipText(status);
+    if (!MayBeMended(status)) {
+        return {{now + ", and further names (hard links)",
+                 why,
+                 "put a copy of % into its place, which is root's",
+                 {},
+                 Level::Wrong,
+                 {path}}};
+    }
+    const auto act = [path, modes](Patience &) {
+        Correct(path, modes);
+        return std::string();
+    };
+    const std::string does = "gives it to root, with mode " + OctalText(mended);
+    return {{now,
+             why,
+             "chown root %; chmod " + OctalText(mended) + " %",
+             {{path, does, {"- " + now, "+ " + OwnershipText(AfterMending(status, modes))}, act}},
+             Level::Wrong,
+             {path}}};
 }
 
 }  // namespace fileindexctl::doctor

@@ -1,16 +1,28 @@
 /// \file
-/// Owner and mode of the library's files.
+/// Owner and mode of files and directories.
 #ifndef FILEINDEXCTL_DOCTOR_OWNERSHIP_H
 #define FILEINDEXCTL_DOCTOR_OWNERSHIP_H
 
 #include "finding.h"
 
+#include <sys/stat.h>
+
 #include <string>
 
 namespace fileindexctl::doctor {
 
-/// Findings about a regular file that is to belong to root, with mode 0644. Nothing for one that is not there.
-Findings CheckOwnership(const std::string &path, const std::string &why);
+/// What a mode has to have, and what it may not have.
+struct Modes {
+    mode_t required;
+    mode_t forbidden;
+};
+inline constexpr Modes kReadByAll{0644, 07133};
+inline constexpr Modes kClosed{0600, 07177};
+inline constexpr Modes kNotForOthersToWrite{0, 0022};
+
+/// Findings about a regular file or a directory that is to belong to root. Nothing for one that is not there, nor
+/// for a link. A file with further names is left to people: its owner may have meant another one of them.
+Findings CheckOwnership(const std::string &path, Modes modes, const std::string &why);
 
 }  // namespace fileindexctl::doctor
 

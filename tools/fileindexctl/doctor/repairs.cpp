@@ -7,11 +7,14 @@
 
 #include <algorithm>
 #include <array>
+#include <cstdio>
 #include <ctime>
 #include <filesystem>
 #include <system_error>
 
 namespace fileindexctl::doctor {
+
+namespace fs = std::filesystem;
 
 namespace {
 
@@ -24,22 +27,15 @@ std::string Stamp() {
     return text.data();
 }
 
-// The name of the copy; empty when there is nothing to copy. Never takes the place of another file.
-std::string KeepCopy(const std::string &path) {
-    namespace fs = std::filesystem;
-    std::error_code error;
-    if (!fs::exists(path, error)) {
-        return {};
-    }
+// Never that of another file.
+std::string FreeName(const std::string &path) {
     const std::string first = path + "." + Stamp();
-    std::string copy = first;
-    for (int number = 2; fs::exists(fs::symlink_status(copy, error)); ++number) {
-        copy = first + "-" + std::to_string(number);
+    std::string name = first;
+    std::error_code error;
+    for (int number = 2; fs::exists(fs::symlink_status(name, error)); ++number) {
+        name = first + "-" + std::to_string(number);
     }
-    if (!fs::copy_file(path, copy, fs::copy_options::none, error)) {
-        throw Failure(ExitStatus::CannotSave, "no copy of " + path + " could be kept: " + error.message());
-    }
-    return copy;
+    return name;
 }
 
 void Report(const std::string &target, const std::string &copy, Output &output) {
@@ -81,12 +77,6 @@ void Edit(const Repairs &repairs, Patience &patience, Output &output) {
     Report(file.GetPath(), copy, output);
 }
 
-void Act(const Repair &repair, Output &output) {
-    const std::string copy = repair.keepsCopy ? KeepCopy(repair.target) : std::string();
-    repair.act();
-    Report(repair.target, copy, output);
-}
-
 template <typename Step>
 void Try(Step step, Output &output) {
     try {
@@ -98,11 +88,31 @@ void Try(Step step, Output &output) {
 
 }  // namespace
 
+std::string SetAside(const std::string &path) {
+    std::string name = FreeName(path);
+    if (rename(path.c_str(), name.c_str()) != 0) {
+        throw ErrnoFailure(path, "set aside");
+    }
+    return name;
+}
+
+std::string KeepCopy(const std::string &path) {
+    std::error_code error;
+    if (!fs::exists(path, error)) {
+        return {};
+    }
+    std::string copy = FreeName(path);
+    if (!fs::copy_file(path, copy, fs::copy_options::none, error)) {
+        throw Failure(ExitStatus::CannotSave, "no copy of " + path + " could be kept: " + error.message());
+    }
+    return copy;
+}
+
 void ShowDifference(const Repairs &repairs, Output &output) {
     for (const auto &repair : repairs) {
         output.Line(Printable("to change: " + repair.target));
         for (const auto &line : repair.difference) {
-            output.Line("  " + output.Paint(line.front() == '-' ? Colour::Bad : Colour::Good, Printable(line)));
+            output.Line("  " + line, line.front() == '-' ? Colour::Bad : Colour::Good);
         }
     }
 }
@@ -111,7 +121,7 @@ void CarryOut(const Repairs &repairs, Patience &patience, Output &output) {
     // Directories, owners and modes come first: saving needs them.
     for (const auto &repair : repairs) {
         if (repair.act) {
-            Try([&] { Act(repair, output); }, output);
+            Try([&] { Report(repair.target, repair.act(patience), output); }, output);
         }
     }
     Try([&] { Edit(repairs, patience, output); }, output);

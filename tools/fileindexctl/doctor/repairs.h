@@ -7,11 +7,15 @@
 #include "../patience.h"
 #include "finding.h"
 
-#include <vector>
+#include <string>
 
 namespace fileindexctl::doctor {
 
-using Repairs = std::vector<Repair>;
+/// Gives the file another name, with the time in it, and answers that. Throws Failure.
+std::string SetAside(const std::string &path);
+
+/// The same, for a copy; empty when there is nothing to copy.
+std::string KeepCopy(const std::string &path);
 
 /// Says what would change.
 void ShowDifference(const Repairs &repairs, Output &output);

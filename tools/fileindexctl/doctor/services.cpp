@@ -4,13 +4,14 @@
 #include "../failure.h"
 #include "../patience.h"
 #include "../platform_file.h"
+#include "../system_services.h"
 #include "finding.h"
+#include "repairs.h"
 
 #include <vork/process.h>
 #include <vork/search.h>
 #include <vork/service.h>
 
-#include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -24,24 +25,6 @@ namespace {
 constexpr const char *kDaemon = "fileindexd";
 constexpr const char *kFileSharing = "samba";  // the platform's name for it
 constexpr std::chrono::seconds kLongestStart(3);
-
-bool RunsSystemd() {
-    struct stat status {};
-    return stat("/run/systemd/system", &status) == 0 && S_ISDIR(status.st_mode);
-}
-
-bool Systemctl(const char *question, const std::string &name) {
-    const std::string unit = name + ".service";
-    const std::array<const char *, 5> arguments = {"systemctl", "--quiet", question, unit.c_str(), nullptr};
-    return VLIBCExecv("/usr/bin/systemctl", arguments.data(), 1, 0) == 0;
-}
-
-bool IsServiceKnown(const std::string &name) {
-    if (RunsSystemd()) {
-        return Systemctl("cat", name);
-    }
-    return access(("/etc/init.d/" + name).c_str(), X_OK) == 0;
-}
 
 // Without systemd it cannot be told.
 bool IsLeftOutAtBoot(const std::string &name) {
@@ -58,7 +41,7 @@ bool IsDaemonThere() {
 }
 
 // The service may report success before the daemon listens, or while it fails.
-void Start() {
+std::string Start(Patience & /*patience*/) {
     if (VLIBServiceStart(kDaemon, 1) < 0) {
         throw Failure(ExitStatus::Unreachable, std::string(kDaemon) + " could not be started");
     }
@@ -71,12 +54,14 @@ void Start() {
                               "why");
         }
     }
+    return {};
 }
 
 Finding Standstill(const std::string &what) {
     Finding finding{what, "folders are indexed, but nobody does it, and commands are lost", StartCommand(kDaemon)};
     if (IsServiceKnown(kDaemon)) {
-        finding.repair = Repair{kDaemon, {"- not running", "+ running, also after the next boot"}, false, Start};
+        finding.repairs = {
+            {kDaemon, "starts it", {"- not running", "+ running, also after the next boot"}, Start}};
     }
     return finding;
 }
@@ -91,7 +76,8 @@ bool IsPlatformReadable() {
     }
 }
 
-void SwitchSearchOn() {
+std::string SwitchSearchOn(Patience & /*patience*/) {
+    std::string copy = KeepCopy(kPlatformFile);
     if (VORKSMBSetSpotlight(1) < 0) {
         throw Failure(ExitStatus::CannotSave, "the search setting could not be changed");
     }
@@ -99,16 +85,32 @@ void SwitchSearchOn() {
         throw Failure(ExitStatus::Unreachable,
                       "search is on, but the file-sharing service could not be restarted");
     }
+    return copy;
+}
+
+// Nothing is lost yet.
+Findings CheckIdleDaemon() {
+    const DaemonCondition condition = ProbeDaemon().condition;
+    if (condition != DaemonCondition::Absent && condition != DaemonCondition::Stale) {
+        return {};
+    }
+    return {{"fileindexd does not run",
+             "no folder is indexed, so nothing is missed",
+             IsServiceKnown(kDaemon) ? "the first folder that is added starts it"
+                                     : "install the daemon's package before the first folder is added",
+             {},
+             Level::Note}};
 }
 
 }  // namespace
 
 Findings CheckDaemon(const Facts &facts) {
     if (facts.folders.empty()) {
-        return {};
+        return CheckIdleDaemon();
     }
     const std::string socket = kDaemonSocket;
-    switch (ProbeDaemon().condition) {
+    const DaemonState state = ProbeDaemon();
+    switch (state.condition) {
         case DaemonCondition::Listening:
             return {};
         case DaemonCondition::Absent:
@@ -120,13 +122,15 @@ Findings CheckDaemon(const Facts &facts) {
                      "it hangs: commands wait, and fail in the end",
                      "restart fileindexd; the system log may tell what it waits for"}};
         case DaemonCondition::Denied:
-            return {{socket + " may not be written to by this user", "commands do not reach fileindexd",
-                     "run this as the administrator"}};
+            return state.listens.value_or(false) ? Findings() : Findings{NotAllowed("whether fileindexd listens")};
         case DaemonCondition::Unknown:
             break;
     }
-    return {{"whether fileindexd listens cannot be told: " + ProbeDaemon().text, "commands may not reach it",
-             "see the system log"}};
+    return {{"whether fileindexd listens cannot be told: " + state.text,
+             "commands may not reach it",
+             "see the system log",
+             {},
+             Level::Unexamined}};
 }
 
 Findings CheckServices(const Facts &facts) {
@@ -142,22 +146,33 @@ Findings CheckServices(const Facts &facts) {
         findings.push_back({"fileindexd is not started at boot", "indexing stops with the next boot",
                             "systemctl enable fileindexd"});
     }
-    constexpr std::array<const char *, 2> names = {"smbd", "smb"};
-    if (std::none_of(names.begin(), names.end(), IsServiceKnown)) {
+    if (!IsFileSharingThere()) {
         findings.push_back({"this machine has no file-sharing service (smbd or smb)",
-                            "a change of the search setting does not take effect",
-                            "install the package of Samba"});
+                            "the search setting is without effect, which indexing does not need",
+                            "install the package of Samba if clients are to search",
+                            {},
+                            Level::Note});
     }
     return findings;
 }
 
 Findings CheckSearch(const Facts &facts) {
-    if (facts.folders.empty() || VORKSMBIsEnableSpotlight() != 0 || !IsPlatformReadable()) {
+    if (facts.folders.empty() || VORKSMBIsEnableSpotlight() != 0 || !IsFileSharingThere()) {
         return {};
+    }
+    if (!IsPlatformReadable()) {
+        return {{"the search setting is not known",
+                 std::string(kPlatformFile) + " cannot be read",
+                 "mend what is found in the configuration",
+                 {},
+                 Level::Unexamined}};
     }
     Finding finding{"the search setting is off", "folders are indexed, but clients cannot search them",
                     "switch it on in " + std::string(kPlatformFile) + ", and restart the file-sharing service"};
-    finding.repair = Repair{kPlatformFile, {"- \"search\": false", "+ \"search\": true"}, true, SwitchSearchOn};
+    finding.repairs = {{kPlatformFile,
+                        "switches it on, and restarts the file-sharing service",
+                        {"- \"search\": false", "+ \"search\": true"},
+                        SwitchSearchOn}};
     return {finding};
 }
 

@@ -1,7 +1,5 @@
-// Shares, their queues and their flags.
-#include "../failure.h"
-#include "../file_locks.h"
-#include "../queue_files.h"
+// Shares, their folders and their flags.
+#include "../platform_file.h"
 #include "../share_record.h"
 #include "../status_file.h"
 #include "../text.h"
@@ -11,10 +9,10 @@
 
 #include <vork/error.h>
 
-#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <set>
@@ -31,72 +29,108 @@ std::set<std::string> AllShares(const Facts &facts) {
     return names;
 }
 
-std::string Consequence(const std::string &share, const Facts &facts) {
-    const auto found = facts.folderCount.find(share);
-    return found == facts.folderCount.end()
-               ? "nothing in it can be indexed"
-               : "its indexed folders (" + std::to_string(found->second) + ") are not kept up";
+constexpr const char *kNothingIndexed = "nothing in it can be indexed";
+
+// Nothing is to be forgotten while shares may be missing only because their entries cannot be used.
+Finding Gone(const std::string &share, const Facts &facts) {
+    return {"there is no such share any more",
+            kNothingIndexed,
+            facts.areSharesKnown
+                ? "bring the share back; or \"fileindexctl share rename\" if it has another name, \"fileindexctl "
+                  "share remove %\" if it is gone for good"
+                : "mend the list of shares in " + std::string(kPlatformFile) + " first: it is not whole",
+            {},
+            Level::Wrong,
+            {share}};
 }
 
-Finding Unusable(const std::string &share, int error, const std::string &why) {
-    const std::string word = ShellWord(share);
+Finding Unusable(const std::string &share, int error, const Facts &facts) {
+    const auto &shares = facts.configuredShares;
+    const bool isListed = std::find(shares.begin(), shares.end(), share) != shares.end();
     switch (error) {
         case VORK_ERR_SHARE_DIRECTORY_NAME:
-            return {"the directory of the share " + Quoted(share) + " has another name than the share", why,
-                    "rename one of them, or bind mount the directory under the share's name"};
+            return {"the share's directory has another name than the share",
+                    kNothingIndexed,
+                    "rename one of them, or bind mount the directory under the share's name",
+                    {},
+                    Level::Wrong,
+                    {share}};
         case VORK_ERR_NO_SUCH_SHARE:
-            return {
-                "there is no share " + Quoted(share) + " any more", why,
-                "bring the share back; or \"fileindexctl share rename\" if it has another name, \"fileindexctl "
-                "share remove " +
-                    word + "\" if it is gone for good"};
+            return Gone(share, facts);
+        case VORK_ERR_ACCESS:
+            return NotAllowed("a share", {share});
         default:
-            return {"the share " + Quoted(share) + " cannot be looked up", why,
-                    "correct its entry in the platform's configuration"};
+            return {"the share cannot be looked up",
+                    kNothingIndexed,
+                    (isListed ? "correct its entry in " : "mend ") + std::string(kPlatformFile),
+                    {},
+                    Level::Wrong,
+                    {share}};
     }
 }
 
-std::string ReindexCommand(const std::string &share) {
-    return "\"fileindexctl reindex " + ShellWord("/" + share) + "\"";
-}
-
-bool IsWritable(const std::string &path) {
-    return faccessat(AT_FDCWD, path.c_str(), W_OK, AT_EACCESS) == 0;
-}
-
-Findings CheckQueue(const std::string &share) {
-    const std::string queue = QueuePathOf(share);
-    const std::string directory = queue.substr(0, queue.rfind('/'));
-    const std::string why = "changes are not indexed until a reindex: their events cannot be queued";
+Findings CheckDirectory(const std::string &share, const VORKSHARE &record, const Facts &facts) {
     struct stat status {};
-    if (lstat(directory.c_str(), &status) != 0) {
-        return {{directory + ": " + std::strerror(errno), why, "make the share writable"}};
+    if (stat(record.szPath, &status) != 0) {
+        if (errno == EACCES && geteuid() != 0) {
+            return {NotAllowed("the directory of a share", {share})};
+        }
+        return {{std::string("the share's directory cannot be seen (") + std::strerror(errno) + ")",
+                 kNothingIndexed,
+                 "make the directory, or mount its volume",
+                 {},
+                 Level::Wrong,
+                 {record.szPath}}};
     }
-    if (!S_ISDIR(status.st_mode)) {
-        return {{directory + " is not a directory of its own",
-                 "the queue is kept wherever a link leads, and cannot be cleaned", "remove it; it is made anew"}};
-    }
-    if (!IsWritable(directory)) {
-        return {{directory + " is not writable: " + std::strerror(errno), why,
-                 "make it writable, or run this as the administrator"}};
-    }
-    if (lstat(queue.c_str(), &status) != 0) {
+    const bool isMarked =
+        facts.status.isObject() && facts.status["no_space"].isObject() && facts.status["no_space"].isMember(share);
+    if (facts.folderCount.count(share) == 0 || isMarked || VORK::FILEINDEX::IsShareSpaceEnough(share)) {
         return {};
     }
-    if (!S_ISREG(status.st_mode) || !IsWritable(queue)) {
-        return {{queue + " is not a file that can be written", why, "remove it, then " + ReindexCommand(share)}};
-    }
-    const auto holders = LastingLockHolders(queue);
-    if (holders.empty()) {
-        return {};
-    }
-    return {{queue + " is held by " + HolderText(holders), "events that come meanwhile are dropped",
-             "wait for that program or end it, then " + ReindexCommand(share)}};
+    return {{"a full share",
+             "its folders cannot be indexed for want of space",
+             "make room (10 MiB)",
+             {},
+             Level::Wrong,
+             {share}}};
 }
 
-// Only when everything that names shares could be read: a share that cannot be seen just now keeps its flags.
+Findings CheckFolder(const std::string &path, const std::string &fullPath) {
+    const SharePointer record = FindShare(ShareOf(path));
+    int error = record ? 0 : VLIBCErrGet() == VORK_ERR_ACCESS ? EACCES : ENOENT;
+    struct stat status {};
+    if (record && stat(record->szPath, &status) != 0) {
+        error = errno;
+    }
+    if (error != 0 && (error != EACCES || geteuid() == 0)) {
+        return {{"not kept up, since its share cannot be used",
+                 "changes in it are not indexed",
+                 "mend what is found of the share",
+                 {},
+                 Level::Wrong,
+                 {path}}};
+    }
+    if (error == 0 && VORK::FILEINDEX::CanPathBeIndexed(path)) {
+        return {};
+    }
+    if (error != 0 || (geteuid() != 0 && stat(fullPath.c_str(), &status) != 0 && errno == EACCES)) {
+        return {NotAllowed("a folder", {path})};
+    }
+    return {{"may not be indexed at present",
+             "it reads as paused, and is not kept up",
+             "\"fileindexctl explain %\" tells which rule it breaks",
+             {},
+             Level::Wrong,
+             {path}}};
+}
+
+// Only when everything that names shares could be read: a share that cannot be seen just now keeps its flags. The
+// library marks the empty name for an event that lay in no share.
 bool IsGone(const std::string &share, const Facts &facts) {
-    return !facts.configuredShares.empty() && facts.areFoldersKnown && facts.folderCount.count(share) == 0 &&
+    if (share.empty()) {
+        return true;
+    }
+    return facts.areSharesKnown && facts.areFoldersKnown && facts.folderCount.count(share) == 0 &&
            FindShare(share) == nullptr && VLIBCErrGet() == VORK_ERR_NO_SUCH_SHARE;
 }
 
@@ -106,29 +140,40 @@ Finding StaleFlag(const std::string &share, const std::string &flag) {
             document[flag].removeMember(share);
         }
     };
-    const std::string path = StatusFile().GetPath();
-    return {"the unknown share " + Quoted(share) + " is marked in " + Quoted(flag),
-            "a share that is given this name later would start with the mark", "remove the mark",
-            Repair{path, {"- " + Quoted(flag) + ": " + Quoted(share)}, true, {}, remove}};
+    return {
+        "an unknown share is marked in " + Quoted(flag),
+        "a share that is given this name later would start with the mark",
+        "remove the mark",
+        {{StatusFile().GetPath(), "removes the mark", {"- " + Quoted(flag) + ": " + Quoted(share)}, {}, remove}},
+        Level::Wrong,
+        {share}};
 }
 
 Finding SpaceFlag(const std::string &share) {
-    const std::string why = "its folders are not indexed until it is revived";
-    const std::string revive = "\"fileindexctl revive " + ShellWord(share) + "\"";
+    Finding finding{"marked as out of space",
+                    "its folders are not indexed until it is revived",
+                    "\"fileindexctl revive %\"",
+                    {},
+                    Level::Wrong,
+                    {share}};
     if (!IsSharePresent(share)) {
-        return {"the share " + Quoted(share) + " is marked as out of space", why,
-                "bring the share back, then " + revive};
+        finding.what += ", and away";
+        finding.remedy = "bring the share back, then " + finding.remedy;
+    } else if (VORK::FILEINDEX::IsShareSpaceEnough(share)) {
+        finding.what += ", though there is room";
+    } else {
+        finding.remedy = "make room (10 MiB), then " + finding.remedy;
     }
-    if (VORK::FILEINDEX::IsShareSpaceEnough(share)) {
-        return {"the share " + Quoted(share) + " is marked as out of space, though there is room", why, revive};
-    }
-    return {"the share " + Quoted(share) + " is out of space", why, "make room (10 MiB), then " + revive};
+    return finding;
 }
 
 Finding ReindexFlag(const std::string &share) {
-    return {"the share " + Quoted(share) + " waits to be reindexed",
+    return {"a share waits to be reindexed",
             "changes have been lost, and the index is behind",
-            ReindexCommand(share) + "; this is found until fileindexd has cleared the mark"};
+            "\"fileindexctl reindex /%\"; this is found until fileindexd has cleared the mark",
+            {},
+            Level::Wrong,
+            {share}};
 }
 
 std::vector<std::string> Marked(const Facts &facts, const char *flag) {
@@ -143,42 +188,26 @@ Findings CheckShares(const Facts &facts) {
     for (const auto &share : AllShares(facts)) {
         const SharePointer record = FindShare(share);
         const int error = record ? 0 : VLIBCErrGet();
-        struct stat status {};
-        if (!record) {
-            findings.push_back(Unusable(share, error, Consequence(share, facts)));
-        } else if (stat(record->szPath, &status) != 0) {
-            findings.push_back({std::string("the directory of the share ") + Quoted(share) + ", " +
-                                    record->szPath + ": " + std::strerror(errno),
-                                Consequence(share, facts), "make the directory, or mount its volume"});
-        }
+        Append(findings, record ? CheckDirectory(share, *record, facts) : Findings{Unusable(share, error, facts)});
     }
     for (const auto &folder : facts.folders) {
-        if (IsSharePresent(ShareOf(folder.path)) && !VORK::FILEINDEX::CanPathBeIndexed(folder.path)) {
-            findings.push_back(
-                {"the folder " + folder.path + " may not be indexed at present",
-                 "it reads as paused, and is not kept up",
-                 "\"fileindexctl explain " + ShellWord(folder.path) + "\" tells which rule it breaks"});
-        }
-    }
-    return findings;
-}
-
-Findings CheckQueues(const Facts &facts) {
-    Findings findings;
-    for (const auto &[share, count] : facts.folderCount) {
-        const SharePointer record = FindShare(share);
-        struct stat status {};
-        if (record && stat(record->szPath, &status) == 0) {
-            for (const auto &finding : CheckQueue(share)) {
-                findings.push_back(finding);
-            }
-        }
+        Append(findings, CheckFolder(folder.path, folder.GetFullPath()));
     }
     return findings;
 }
 
 Findings CheckFlags(const Facts &facts) {
     Findings findings;
+    StatusFile file;
+    file.Document() = facts.status;
+    long long resumeTime = -1;
+    if (file.GetPauseInfo(resumeTime) && resumeTime == 0) {
+        findings.push_back({"indexing is paused without an end",
+                            "nothing is indexed until somebody ends the pause",
+                            "\"fileindexctl resume\" if it is to go on",
+                            {},
+                            Level::Note});
+    }
     for (const char *flag : {"no_space", "need_reindex"}) {
         for (const auto &share : Marked(facts, flag)) {
             if (IsGone(share, facts)) {
