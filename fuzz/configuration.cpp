@@ -1,6 +1,7 @@
 // Any bytes as a configuration file, and any JSON as a request.
 
 #include "checks.h"
+#include "config/tail.h"
 #include "json/text.h"
 #include "names.h"
 
@@ -18,9 +19,10 @@ namespace {
 using namespace VORK::FILEINDEX;  // NOLINT(google-build-using-namespace): the subject of every check
 using namespace internal;         // NOLINT(google-build-using-namespace): its names
 
-bool ParsesAsObject(const std::string &text) {
+/// Of what a file holds, the document may be only a part.
+bool HoldsAnObject(const std::string &bytes) {
     Json::Value document;
-    return JsonReader().Parse(text, document) && document.isObject();
+    return JsonReader().Parse(ContentOf(bytes).document, document) && document.isObject();
 }
 
 std::string TextOf(Folders &store) {
@@ -49,7 +51,7 @@ bool Accepts(Operation change) {
     const std::string before = ReadWhole(kStatusConf);
     const bool accepted = change();
     const std::string after = ReadWhole(kStatusConf);
-    Require(accepted ? ParsesAsObject(after) : after == before, "the file has become something else", before);
+    Require(accepted ? HoldsAnObject(after) : after == before, "the file has become something else", before);
     return accepted;
 }
 
@@ -99,7 +101,7 @@ void CheckDelete(const Json::Value &request) {
 void FeedFolderConf(const std::string &text) {
     WriteWhole(kFolderConf, text);
     Folders store;
-    const bool isObject = ParsesAsObject(text);
+    const bool isObject = HoldsAnObject(text);
     Require(store.Load() == isObject, "exactly JSON objects are loaded", text);
     if (!isObject) {
         Require(ReadWhole(kFolderConf) == text, "the file was changed", text);

@@ -56,9 +56,9 @@ void CheckBoth(const std::string &path, const std::string &above) {
 }
 
 void CheckIndexability(const std::string &path) {
-    // The platform takes C strings: what stands behind a NUL is not looked at there.
-    const std::string seen = path.substr(0, path.find('\0'));
-    const bool excluded = seen.starts_with("/vol1/a/#recycle") || seen.starts_with("/vol1/a/#snapshot");
+    // The platform takes C strings, so a path with a NUL names nothing.
+    const bool excluded = path.find('\0') != std::string::npos || path.starts_with("/vol1/a/#recycle") ||
+                          path.starts_with("/vol1/a/#snapshot");
     const std::size_t slash = path.rfind('/');
     const bool skipped =
         slash == std::string::npos || excluded || IsSystemPreservedFileName(path.substr(slash + 1));

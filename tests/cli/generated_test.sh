@@ -18,6 +18,9 @@ expect() {
 cat >/usr/vork/etc/fileindex/folder.conf <<'END'
 {"/music": {}, "/photo/$(touch /tmp/hacked)": {}, "/photo/a b": {}, "/photo/*": {}}
 END
+echo '{"shares": {"photo": {"path": "/vol1/photo"}, "video": {"path": "/vol1/video"}, "odd": {"path": "/vol1/even"}}}' \
+    >/usr/vork/etc/platform.conf
+mkdir -p /vol1/video /vol1/photo/@eaDir '/vol1/photo/2015/a b' /vol1/photo/2015/c && touch /vol1/photo/2015/file
 mkdir /tmp/files && cd /tmp/files && touch "one file" two
 
 # What is typed after "fileindexctl", "|", what is offered.
@@ -35,9 +38,16 @@ rows=(
     'show /mu|/music'
     'show /music --j|--json'
     'remove --yes /music /photo/a|/photo/a b'
-    'check o|one file'
+    'check tw|'
+    'check /tmp/files/o|/tmp/files/one file'
+    'show tw|'
+    'remove /tmp/files/o|'
     'export -o t|two'
     'import |one file,two'
+    'add |/photo/,/video/'
+    'add /photo/|/photo/2015/'
+    'add /photo/2015/a|/photo/2015/a b/'
+    'reindex /video /photo/2015/|/photo/2015/a b/,/photo/2015/c/'
     'add /photo --media a|all,audio'
     'nonsense |'
 )

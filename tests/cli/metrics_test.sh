@@ -23,9 +23,9 @@ check() {
 }
 
 ctl=$BIN_DIR/fileindexctl
-hostile=$'a"b\\c\nd \xe9{},'
+hostile=$'a"b\\c\nd \xe9{},\e\xe2\x80\xae'
 mkdir -p "/vol1/$hostile" /vol1/photo
-inJson='a\"b\\c\nd '$'\xe9''{},'
+inJson='a\"b\\c\nd '$'\xe9''{},\u001b\u202e'
 printf '{"shares": {"photo": {"path": "/vol1/photo"}, "%s": {"path": "/vol1/%s"}}}' "$inJson" "$inJson" \
     >/usr/vork/etc/platform.conf
 for fault in 'fileindex_paused 0' '# TYPE fileindex_a gauge' 'x{share="a"b"} 1' ''; do
@@ -40,7 +40,7 @@ echo x >>"/vol1/$hostile/@eaDir/VORK@file_index_queue"
 check </tmp/metrics
 
 expect() { grep -qxF "$1" /tmp/metrics || { echo "missing: $1"; cat /tmp/metrics; exit 1; }; }
-share='share="a\"b\\c\nd \\xe9{},"'
+share='share="a\"b\\c\nd \\xe9{},\\x1b\\xe2\\x80\\xae"'
 expect "fileindex_folders{$share} 1"
 expect "fileindex_queue_malformed_lines{$share} 1"
 expect "fileindex_paused 1"

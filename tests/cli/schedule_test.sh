@@ -24,6 +24,12 @@ for hours in 1 8h 100; do
     expect "pause $hours" "$before" "$found" "$(in_hours "${hours%h}")"
 done
 
+for length in '30m:30 minutes' '90m:90 minutes' '1h30m:90 minutes' '2d:48 hours' '1d1m:1441 minutes' '120m:2 hours'; do
+    before=$(date -d "${length#*:}" '+%Y-%m-%d %H:%M %Z')
+    found=$(paused_until "${length%:*}")
+    expect "pause ${length%:*}" "$before" "$found" "$(date -d "${length#*:}" '+%Y-%m-%d %H:%M %Z')"
+done
+
 # The next time the clock shows it: today if that is still to come, otherwise tomorrow.
 next() {
     local today
@@ -35,7 +41,7 @@ next() {
     fi
 }
 
-for time in 00:00 06:30 23:59 "$(date +%H:%M)" "$(date -d '2 minutes' +%H:%M)"; do
+for time in 00:00 6:30 06:30 23:59 "$(date +%H:%M)" "$(date -d '2 minutes' +%H:%M)"; do
     before=$(next "$time")
     found=$(paused_until --until "$time")
     expect "pause --until $time" "$before" "$found" "$(next "$time")"

@@ -1,9 +1,9 @@
 #!/bin/bash
 # Runs the commands of each transcript and compares everything that they write and return.
 #
-#   $ COMMAND     is run by the shell; below it stands what it writes to stdout, then, each line behind "! ", what it
+#   $ COMMAND     is run by the shell; below it stands what it writes to stdout, then, each line after "! ", what it
 #                 writes to stderr, then its exit status unless that is 0: "[66]"
-#   # TEXT        a remark, behind an empty line
+#   # TEXT        a remark, after an empty line
 #   ? COMMAND     the transcript is left out where this fails
 #
 # Points in time are shown as TIME or, in names of files, STAMP, seconds since the epoch as EPOCH, numbers of processes

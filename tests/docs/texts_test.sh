@@ -6,7 +6,8 @@ set -euo pipefail
 # The blocks of literal text among a page's examples; "N" chooses the Nth.
 page_example() {
     sed -n '/^\.Sh EXAMPLES/,/^\.Sh SEE/p' "$SOURCE_DIR/man/$1" |
-        awk -v wanted="$2" '/^\.Bd/ { ++block; inside = 1; next } /^\.Ed/ { inside = 0 } inside && block == wanted'
+        awk -v wanted="$2" '/^\.Bd/ { ++block; inside = 1; next } /^\.Ed/ { inside = 0 } inside && block == wanted' |
+        sed 's/\\-/-/g'
 }
 
 readme_example() {
@@ -37,6 +38,18 @@ expect status.conf photo "$(grep -i space <<<"$status")"
 # The page breaks the first line in two.
 page_example fileindex-queue.5 1 | sed 'N; s/\n  //; P; D' >$queue
 expect queue '"events":{"131072":1,"65536":1},"malformed":0' "$("$BIN_DIR/fileindexctl" queue count --json photo)"
+
+# A queue is taken once: not while it is held or has a second name, and not over one that was taken before.
+page_example fileindex-daemon.7 1 >/tmp/take.c
+"$CC" -Wall -Wextra -Werror -o /tmp/take /tmp/take.c
+expect "a held queue" nothing "$(flock $queue /tmp/take "${queue%/*}")"
+ln $queue /vol1/photo/second
+expect "a queue of two names" nothing "$(/tmp/take "${queue%/*}")"
+rm /vol1/photo/second
+expect "the queue" "$(<$queue)" "$(/tmp/take "${queue%/*}")"
+expect "the taken queue" '"event":65536' "$(<$queue.tmp)"
+echo >$queue
+expect "a queue after a taken one" nothing "$(/tmp/take "${queue%/*}")"
 
 compile_and_run() {
     local what=$1 compiler=$2 standard=$3 source=$4

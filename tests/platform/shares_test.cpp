@@ -9,6 +9,8 @@
 #include <vork/share.h>
 
 #include <sys/inotify.h>
+#include <sys/stat.h>
+#include <sys/xattr.h>
 
 #include <cstring>
 
@@ -62,6 +64,29 @@ TEST(SharesTest, RefusesNullArguments) {
     EXPECT_LT(VLIBServiceStop(nullptr, 1), 0);
     EXPECT_EQ(VORKQuotaIsEnough(0, nullptr, 0), 0);
     EXPECT_EQ(VLIBCErrGet(), VORK_ERR_BAD_PARAMETER);
+}
+
+// A default access list of the share would let its users write into directories made in the metadata directory:
+// with one, the mode that the system gives them is not cut by the umask.
+TEST(SharesTest, HandDownNoAccessListToTheServices) {
+    struct Entry {
+        uint16_t tag, permissions;
+        uint32_t id;
+    };
+    const struct {
+        uint32_t version = 2;
+        Entry entries[5] = {{0x01, 7, ~0U}, {0x02, 7, 65534}, {0x04, 5, ~0U}, {0x10, 7, ~0U}, {0x20, 5, ~0U}};
+    } list;
+    ASSERT_EQ(mkdir("/vol1/listed", 0755), 0);
+    if (setxattr("/vol1/listed", "system.posix_acl_default", &list, sizeof list, 0) != 0) {
+        GTEST_SKIP() << "no access lists here";
+    }
+    ASSERT_EQ(VORKEAMKDir(0, "/vol1/listed/@eaDir"), 0);
+    umask(022);
+    ASSERT_EQ(mkdir("/vol1/listed/@eaDir/database", 0777), 0);
+    struct stat status {};
+    ASSERT_EQ(stat("/vol1/listed/@eaDir/database", &status), 0);
+    EXPECT_EQ(status.st_mode & 0777U, 0755U);
 }
 
 // Same size, same inode, times that the clock cannot tell apart: the hardest change to notice.

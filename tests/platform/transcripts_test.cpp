@@ -11,6 +11,7 @@
 
 #include <vork/filesystem.h>
 #include <vork/metadata.h>
+#include <vork/process.h>
 #include <vork/quota.h>
 #include <vork/search.h>
 #include <vork/service.h>
@@ -18,6 +19,7 @@
 #include <vorknotifyd/monitor_queue.h>
 
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <map>
 #include <optional>
@@ -43,7 +45,11 @@ std::string Code() {
                                                      {VORK_ERR_NO_SUCH_SHARE, "no such share"},
                                                      {VORK_ERR_SHARE_DIRECTORY_NAME, "other name"},
                                                      {VORK_ERR_NO_SUCH_SERVICE, "no such service"},
-                                                     {VORK_ERR_SERVICE, "service"}};
+                                                     {VORK_ERR_SERVICE, "service"},
+                                                     {VORK_ERR_REGISTRATIONS, "registrations"},
+                                                     {VORK_ERR_UNIT_FAILED, "unit failed"},
+                                                     {VORK_ERR_UNIT_MASKED, "unit masked"},
+                                                     {VORK_ERR_UNIT_TIMEOUT, "unit timeout"}};
     return VLIBCErrGet() == 0 ? "" : " (" + names.at(VLIBCErrGet()) + ")";
 }
 
@@ -98,6 +104,23 @@ std::string HasRoom(const std::string &text) {
     return Answer(VORKQuotaIsEnough(0, text.c_str() + space + 1, std::stoull(text)));
 }
 
+/// The mode is not the umask's to decide.
+std::string MakeMetadata(const std::string &path) {
+    ::umask(077);
+    const int result = VORKEAMKDir(0, path.c_str());
+    ::umask(0);
+    return Done(result);
+}
+
+std::string MakeMetadataAsUser(const std::string &path) {
+    constexpr uid_t kUser = 65534;
+    if (seteuid(kUser) != 0) {
+        return "not asked";
+    }
+    std::string answer = MakeMetadata(path);
+    return seteuid(0) == 0 ? answer : "still a user";
+}
+
 /// "NAME DESCRIPTION"
 std::string Register(const std::string &text) {
     const size_t space = text.find(' ');
@@ -124,7 +147,9 @@ const std::map<std::string, std::string (*)(Text)> kQuestions = {
     {"snapshot", IsInSnapshot},
     {"room", HasRoom},
     {"hidden", [](Text name) { return Answer(VORKEAIsHiddenDir(name.c_str())); }},
-    {"make-metadata", [](Text path) { return Done(VORKEAMKDir(0, path.c_str())); }},
+    {"make-metadata", MakeMetadata},
+    {"make-metadata-as-user", MakeMetadataAsUser},
+    {"remove", [](Text path) { return Done(VLIBCExec("/bin/rm", "-rf", path.c_str(), nullptr, nullptr)); }},
     {"search", [](Text) { return Answer(VORKSMBIsEnableSpotlight()); }},
     {"set-search", [](Text on) { return Done(VORKSMBSetSpotlight(on == "on" ? 1 : 0)); }},
     {"start", [](Text name) { return Done(VLIBServiceStart(name.c_str(), 1)); }},

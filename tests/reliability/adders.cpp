@@ -10,7 +10,6 @@ namespace {
 constexpr int kWorkers = 8;
 constexpr int kMaxFolders = 1000;
 constexpr int kMaxMarkers = 2000;
-constexpr size_t kPage = 4096;
 
 struct Board {
     std::array<std::atomic<bool>, kMaxFolders> folders;
@@ -26,17 +25,6 @@ std::string MarkerOf(int number) {
     return "marker " + std::to_string(number);
 }
 
-/// A write above a page is known not to survive a kill, so SIGTERM, which kills just as well, waits for its end.
-ssize_t WriteUnkilled(int fd, const void *data, size_t size) {
-    sigset_t kill;
-    sigemptyset(&kill);
-    sigaddset(&kill, SIGTERM);
-    ::sigprocmask(size > kPage ? SIG_BLOCK : SIG_UNBLOCK, &kill, nullptr);
-    const ssize_t written = RealWrite(fd, data, size);
-    ::sigprocmask(SIG_UNBLOCK, &kill, nullptr);
-    return written;
-}
-
 /// Repeats a call that is refused for the lock alone; any other failure is one.
 template <typename Call>
 void Insist(Board &board, Call call) {
@@ -47,7 +35,6 @@ void Insist(Board &board, Call call) {
 }
 
 void Work(Board &board, int worker, int firstFolder, int markers) {
-    WriteHook() = WriteUnkilled;
     // By turns, so that a worker is killed in either.
     for (int i = worker; i < std::max(kMaxFolders, markers); i += kWorkers) {
         if (i >= firstFolder && i < kMaxFolders && !board.folders[i]) {
@@ -81,9 +68,9 @@ int KillWorkers(int wanted, const std::function<pid_t(int worker)> &start) {
     for (bool finished = false; kills < wanted && !finished;) {
         ::usleep(random() % 100000);  // the instant to kill at, not a wait
         const int worker = static_cast<int>(random() % kWorkers);
-        ::kill(team[worker], SIGTERM);
+        ::kill(team[worker], SIGKILL);
         const int status = Wait(team[worker]);
-        Check(status == 0 || status == 128 + SIGTERM, "a worker failed");
+        Check(status == 0 || status == 128 + SIGKILL, "a worker failed");
         finished = status == 0;
         kills += finished ? 0 : 1;
         team[worker] = start(worker);

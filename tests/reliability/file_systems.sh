@@ -12,14 +12,17 @@ on_tmpfs() {
     mount -n -t tmpfs -o "size=$1" tmpfs "$configDir"
 }
 
+# On the machine's own disk, so that a flush is one.
+image=${BUILD_DIR:-/tmp}/reliability-ext4.img
 on_ext4() {
-    truncate -s "$1" /tmp/disk.img
-    mkfs.ext4 -q -F /tmp/disk.img
-    mount -n -o loop /tmp/disk.img "$configDir"
+    truncate -s "$1" "$image"
+    mkfs.ext4 -q -F "$image"
+    mount -n -o loop "$image" "$configDir"
 }
+trap 'rm -f "$image"' EXIT
 
 for fileSystem in tmpfs ext4; do
-    for scenario in full-disk kills; do
+    for scenario in full-disk kills cost; do
         size=4M
         [[ $scenario == full-disk ]] || size=64M
         "on_$fileSystem" "$size"

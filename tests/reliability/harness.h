@@ -39,14 +39,17 @@ inline constexpr char kSocket[] = "/var/run/fileindexd.sock";
 
 // What can be run, "fileindex_torture NAME [ARGUMENT]"; the argument is a file system's or an operation's name.
 using Scenario = void(const std::string &argument);
-Scenario FullDisk, Kills, Readers, Adders, Threads, QueueWriters, Moods, WriterModel, Planted, ForeignLocks;
-Scenario Operation, ListOperations;
+Scenario FullDisk, Cost, Kills, Readers, Adders, Threads, QueueWriters, Moods, WriterModel, Planted, ForeignLocks;
+Scenario Operation, ListOperations, AtExit, CancelledThreads;
 
 /// The number of rounds: `whole` when FILEINDEX_TORTURE=long asks for it.
 int Rounds(int quick, int whole);
 
 /// Ends the process, with the reason, unless `fine`.
 void Check(bool fine, const std::string &reason);
+
+/// Ends the process as a skipped test, with the reason, where the program is built with a sanitizer.
+void SkipUnderSanitizers(const std::string &reason);
 
 /// One row of the table that a run ends with: "SUBJECT | what was measured".
 [[gnu::format(printf, 1, 2)]] void Figure(const char *format, ...);
@@ -77,7 +80,12 @@ struct SameDescriptors {
     const std::set<std::string> before = fileindex_test::OpenDescriptors();
 
     ~SameDescriptors() {
-        Check(fileindex_test::OpenDescriptors() == before, "other descriptors are open than before");
+        const std::set<std::string> after = fileindex_test::OpenDescriptors();
+        std::string left;
+        for (const std::string &descriptor : after) {
+            left += before.contains(descriptor) ? "" : "; " + descriptor;
+        }
+        Check(after == before, "other descriptors are open than before" + left);
     }
 };
 
@@ -92,6 +100,9 @@ Object &Shared() {
 /// Called in the place of `write` in this process, the library's own calls included; none at first.
 std::function<ssize_t(int fd, const void *data, size_t size)> &WriteHook();
 ssize_t RealWrite(int fd, const void *data, size_t size);
+
+/// The seconds that the steady clock shows in this process; its own when there is no such function, as at first.
+std::function<double()> &ClockHook();
 
 /// Shares photo and music, the services and the notification tool; no configuration, no queue.
 void MakeMachine(bool search = true);

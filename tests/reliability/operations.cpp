@@ -58,15 +58,29 @@ void Prepare(const Row &row) {
     WriteFile(kQueue, "{\"event\": 1, \"path\": \"/vol1/photo/x\"}\n");
 }
 
-struct Files {
-    std::optional<std::string> folders = ReadFile(kFolderConf);
-    std::optional<std::string> status = ReadFile(kStatusConf);
+/// A configuration file as everybody loads it: a tail may follow the bytes that stand first.
+class Loaded : public Config {
+public:
+    explicit Loaded(const char *path) : path_(path), isWhole_(LoadJson()) {}
+    bool Load() override { return true; }
+    bool Save() override { return false; }
+    std::string GetLockPath() const override { return ""; }
+    std::string GetPath() const override { return path_; }
 
-    bool AreWhole() const { return (!folders || Parse(*folders)) && (!status || Parse(*status)); }
+    bool IsWhole() const { return isWhole_; }
+    bool operator==(const Loaded &other) const { return document_ == other.document_; }
+
+private:
+    const char *path_;
+    bool isWhole_;
 };
 
-const char *StateOf(const std::optional<std::string> &before, const std::optional<std::string> &after,
-                    const std::optional<std::string> &repeated) {
+struct Files {
+    Loaded folders{kFolderConf};
+    Loaded status{kStatusConf};
+};
+
+const char *StateOf(const Loaded &before, const Loaded &after, const Loaded &repeated) {
     return after == before ? "old" : after == repeated ? "new" : "lost";
 }
 
@@ -102,7 +116,7 @@ void Operation(const std::string &name) {
     const bool sameDescriptors = fileindex_test::OpenDescriptors() == open;
     const bool locksFree = IsFree(kFolderLock) && IsFree(kStatusLock);
     const Files after;
-    const bool whole = after.AreWhole() && HasWholeLines();
+    const bool whole = after.folders.IsWhole() && after.status.IsWhole() && HasWholeLines();
     const bool repeated = row.run();
     const Files again;
     std::printf("%s %d folders=%s status=%s files=%s locks=%s descriptors=%s repeated=%s",

@@ -18,6 +18,7 @@ constexpr uid_t kStranger = 65534;
 constexpr char kVictim[] = "/vol2/victim";
 constexpr char kVictimDir[] = "/vol2/victims";
 constexpr char kNowhere[] = "/vol2/nowhere";
+constexpr char kMetadata[] = "/vol1/photo/@eaDir";
 
 struct Object {
     const char *name;
@@ -51,6 +52,11 @@ bool ChangeStatus() {
     return StatusMgr::SetUpdated("marker");
 }
 
+bool MakeDatabase() {
+    std::array<char, 4096> path{};
+    return FILEIDXDBPathGet("photo", path.data(), path.size()) > 0;
+}
+
 bool QueueEvent() {
     return AddCustomEvent(0x20000, "/vol1/photo/a", Json::Value());
 }
@@ -69,10 +75,12 @@ const Place kPlaces[] = {
     {kFolderConf, "read", ReadFolders, "tttttt", 0},  // whatever is no regular file is no configuration yet
     {kStatusConf, "change", ChangeStatus, "ffffff", FILEINDEX_ERR_SAVE_JSON},
     {kStatusConf, "read", [] { return Status().Load(); }, "tttttt", 0},
-    {kFolderLock, "change", ChangeFolders, "ffftft", FILEINDEX_ERR_LOCK},  // a FIFO can be locked as well
-    {kStatusLock, "change", ChangeStatus, "ffftft", FILEINDEX_ERR_LOCK},
+    {kFolderLock, "change", ChangeFolders, "ffffff", FILEINDEX_ERR_LOCK},
+    {kStatusLock, "change", ChangeStatus, "ffffff", FILEINDEX_ERR_LOCK},
     {kQueue, "append", QueueEvent, "ffffff", 0},
     {std::string(kQueue) + ".tmp", "append to its queue", QueueEvent, "tttttt", 0},
+    {kMetadata, "append", QueueEvent, "fffftf", 0},
+    {kMetadata, "make the database", MakeDatabase, "tttttt", 0},  // told even where it cannot be made
     {kSocket, "send", [] { return SendCammandToDaemon("resume", Json::Value()); }, "ffffff", 0},
 };
 

@@ -1,6 +1,9 @@
 // Saving a configuration file while the disk is full, while the writer is killed, while others read.
 #include "harness.h"
 
+#include <fcntl.h>
+#include <unistd.h>
+
 #include <filesystem>
 #include <fstream>
 
@@ -9,6 +12,9 @@ namespace reliability {
 namespace {
 
 namespace fs = std::filesystem;
+
+constexpr int kUnreadable = -1;
+constexpr int kMixed = -2;
 
 /// folder.conf with a document whose parts must fit each other: its number and as much filling as it says.
 class Document : public Config {
@@ -28,24 +34,22 @@ public:
         return saved;
     }
 
+    /// 0 without a file.
+    [[nodiscard]] int Number() const {
+        const int number = document_["number"].asInt();
+        return number == 0 || document_["filling"] == Filling(number, document_["size"].asUInt64()) ? number
+                                                                                                    : kMixed;
+    }
+
     static std::string Filling(int number, size_t size) {
         return std::string(size, static_cast<char>('a' + number % 26));
     }
 };
 
-constexpr int kUnreadable = -1;
-constexpr int kMixed = -2;
-
-/// The number of the document that the file holds whole; 0 without a file.
+/// The number of the document that is loaded whole; 0 without a file.
 int NumberInFile() {
-    const auto text = ReadFile(kFolderConf);
-    const auto document = Parse(text.value_or("{}"));
-    if (!document || !document->isObject()) {
-        return kUnreadable;
-    }
-    const int number = (*document)["number"].asInt();
-    return (*document)["filling"] == Document::Filling(number, (*document)["size"].asUInt64()) || !text ? number
-                                                                                                        : kMixed;
+    Document document;
+    return document.Load() ? document.Number() : kUnreadable;
 }
 
 /// Fills the file system but for a few blocks.
@@ -147,7 +151,7 @@ void ReadWhileFlipping(int count, int reads) {
 
 void FullDisk(const std::string &fileSystem) {
     const std::string filler = std::string(kConfigDir) + "/filler";
-    constexpr std::uintmax_t kMetadata = 4096;  // a file system may keep the map of what was reserved
+    constexpr std::uintmax_t kMetadata = 4096;  // a file system may keep the map of the blocks that were taken
     const int rounds = Rounds(10, 100);
     std::mt19937 random(1);
     int failures = 0;
@@ -176,11 +180,36 @@ void FullDisk(const std::string &fileSystem) {
            rounds);
 }
 
+/// What durability costs: a save beside one write and one flush of a file of the same size.
+void Cost(const std::string &fileSystem) {
+    const int rounds = Rounds(20, 200);
+    for (const size_t size : {12000U, 120000U}) {
+        Document document;
+        Check(document.SaveNumber(0, size), "save");
+        double begin = Now();
+        for (int i = 1; i <= rounds; ++i) {
+            Check(document.SaveNumber(i, size), "save");
+        }
+        const double saves = Now() - begin;
+        const std::string text = ReadFile(kFolderConf).value_or("");
+        const int fd = ::open(kFolderConf, O_RDWR | O_CLOEXEC);
+        begin = Now();
+        for (int i = 0; i < rounds; ++i) {
+            Check(::pwrite(fd, text.data(), text.size(), 0) > 0 && ::fdatasync(fd) == 0, "write and flush");
+        }
+        const double flushes = Now() - begin;
+        ::close(fd);
+        Figure("a durable save of %zu KB, %s | %.2f ms; one write and one flush of as much %.2f ms", size / 1000,
+               fileSystem.c_str(), saves / rounds * 1000, flushes / rounds * 1000);
+    }
+}
+
 void Kills(const std::string &fileSystem) {
-    Check(KillWriters(Rounds(500, 10000), 3900, "up to 4 KiB, " + fileSystem) == 0,
-          "a kill broke a file within a page");
-    // Above a page the one write can be cut: counted, not demanded.
-    KillWriters(Rounds(100, 2000), 153600, "up to 150 KiB, " + fileSystem);
+    // As much as 30, 100 and 1,000 folders take.
+    for (const unsigned size : {3900U, 12000U, 120000U}) {
+        const std::string subject = "up to " + std::to_string(size / 1000) + " KB, " + fileSystem;
+        Check(KillWriters(Rounds(200, 10000), size, subject) == 0, "a kill broke a file");
+    }
 }
 
 void Readers(const std::string &) {

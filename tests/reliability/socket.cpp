@@ -57,6 +57,16 @@ std::string FallAsleep(int fd) {
     return first + Receive(fd);
 }
 
+/// Would need longer for a long frame than a send may take.
+std::string ReadSlowly(int fd) {
+    std::string all;
+    pollfd hungUp = {fd, POLLRDHUP, 0};
+    while (::poll(&hungUp, 1, 20) == 0) {
+        all += Receive(fd, 1);
+    }
+    return all + Receive(fd);
+}
+
 /// What the daemon received, beside the frame.
 using Comparison = bool (*)(const std::string &received, const std::string &frame);
 
@@ -87,6 +97,7 @@ constexpr struct Mood {
     {"hangs up mid-frame", [](int fd) { return Receive(fd, 2000); }, kLong, false, kBeginning},
     {"never reads, short frame", NeverRead, kShort, true, kWhole},
     {"never reads, 4 MiB frame", NeverRead, kLong, false, kBeginning},
+    {"reads slowly, 4 MiB frame", ReadSlowly, kLong, false, kBeginning},
     {"sleeps mid-frame", FallAsleep, kLong, true, kSomeTwice},
 };
 
@@ -134,13 +145,14 @@ void TryFullBacklog() {
 
 // --- model -----------------------------------------------------------------------------------------------------
 
-/// A peer that answers `write` as a seed decides, and keeps what it took.
+/// A peer that answers `write` as a seed decides, after a time, and keeps what it took.
 class Peer {
 public:
-    explicit Peer(unsigned seed) : random_(seed), mood_(random_() % 100) {}
+    explicit Peer(unsigned seed) : random_(seed), mood_(random_() % 100), isSlow_(random_() % 4 == 0) {}
 
     ssize_t Write(const char *data, size_t size) {
         ++calls;
+        clock += isSlow_ ? random_() % 4 * 0.25 : 0;
         const ssize_t result = Roll(size);
         if (result > 0) {
             bytes.append(data, static_cast<size_t>(result));
@@ -149,6 +161,7 @@ public:
     }
 
     std::string bytes;
+    double clock = 0;
     long calls = 0;
     bool sent = false;
 
@@ -169,13 +182,18 @@ private:
 
     std::mt19937 random_;
     const unsigned mood_;  ///< 0 is a dead peer
+    const bool isSlow_;
 };
 
-/// Sends the bytes of `tape` from `head` on; -1 is a step back, and the tape's beginning ends the attempt.
+/// Sends the bytes of `tape` from `head` on; -1 is a step back, and the tape's beginning ends the attempt. So do
+/// nine seconds since the call.
 bool ModelWriteAll(const std::string &tape, size_t head, size_t size, Peer &peer) {
     size_t remaining = size;
     int interruptions = 0;
     while (remaining > 0) {
+        if (peer.clock >= 9) {
+            return false;
+        }
         const ssize_t result = peer.Write(tape.data() + head, std::min<size_t>(remaining, 1024));
         if (result == 0 && (errno != EINTR || ++interruptions > 3)) {
             return false;
@@ -203,8 +221,10 @@ Peer Library(unsigned seed, size_t bodySize) {
     WriteHook() = [&](int, const void *data, size_t size) {
         return peer.Write(static_cast<const char *>(data), size);
     };
+    ClockHook() = [&] { return peer.clock; };
     peer.sent = Send(bodySize);
     WriteHook() = nullptr;
+    ClockHook() = nullptr;
     return peer;
 }
 
@@ -226,6 +246,7 @@ void WriterModel(const std::string &) {
     const int sequences = Rounds(10000, 100000);
     std::mt19937 random(1);
     int sent = 0;
+    int late = 0;
     long calls = 0;
     for (int i = 0; i < sequences; ++i) {
         const unsigned seed = random();
@@ -235,12 +256,14 @@ void WriterModel(const std::string &) {
         Check(met.bytes == expected.bytes && met.calls == expected.calls && met.sent == expected.sent,
               "the loop and its model differ, seed " + std::to_string(seed));
         sent += expected.sent ? 1 : 0;
+        late += expected.clock >= 9 ? 1 : 0;
         calls += expected.calls;
     }
     Kill(daemon);
-    Check(sent > sequences / 10 && sent < sequences, "the sequences are all of one kind");
-    Figure("socket writer against its model | %d sequences, %ld writes: same bytes, same result (%d sent)",
-           sequences, calls, sent);
+    Check(sent > sequences / 10 && sent < sequences && late > 0, "the sequences are all of one kind");
+    Figure(
+        "socket writer against its model | %d sequences, %ld writes: same bytes, same result (%d sent, %d late)",
+        sequences, calls, sent, late);
 }
 
 }  // namespace reliability

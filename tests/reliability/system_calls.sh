@@ -18,7 +18,8 @@ declare -A errors=(
     [read]="EIO EINTR"
     [pread64]="EIO EINTR"
     [write]="EIO ENOSPC EINTR"
-    [fallocate]="ENOSPC EOPNOTSUPP"
+    [fdatasync]="EIO EINTR ENOSYS"
+    [fsync]="EIO EINTR EINVAL"
     [socket]="EMFILE"
     [connect]="ECONNREFUSED EAGAIN"
     [mmap]="ENOMEM"
@@ -37,14 +38,16 @@ unloaded='^false 6 .*; config.cpp Failed to load json from'
 marked='^false 0 folders=[a-z]+ status=new .*; index_mgr.cpp AddCustomEvent failed'
 expectations=(
     'openat.*fileidx_cfg_'                                "$locked|$unrevived"
-    'flock.*fileidx_cfg_.*(LOCK_UN|EINTR)'                '^true 0 '
+    '(flock|newfstatat).*fileidx_cfg_.*(LOCK_UN|EINTR|"")' '^true 0 ' # there is a second attempt
     'flock.*fileidx_cfg_'                                 "$locked|$unrevived"
     'flock.*(folder|status)\.conf'                        '^true 0 ' # a courtesy to readers
-    '(pread64|fallocate).*conf.*(EINTR|EOPNOTSUPP)'       '^true 0 '
+    '(pread64|sync).*(EINTR|EINVAL|ENOSYS)'               '^true 0 '
     'openat.*(folder|status)\.conf".*O_RDWR'              "$unsaved|$unrevived"
-    '(fallocate|write|ftruncate).*(folder|status)\.conf'  "$unsaved|$unrevived"
-    'openat.*O_TMPFILE'                                   "$unsaved"
-    '(write|fchmod).*/fileindex/#'                        "$unsaved"
+    '(write|lseek).*(folder|status)\.conf'                "$unsaved|$unrevived"
+    'fdatasync.*(folder|status)\.conf'                    "$unsaved|$unrevived|^true 0 " # the last may fail
+    'ftruncate.*(folder|status)\.conf|fchmod.*/fileindex/#' '^true 0 '
+    'openat.*etc/fileindex.*(O_TMPFILE|O_DIRECTORY)'    "$unsaved"
+    '(write|lseek|fsync).*/etc/fileindex'              "$unsaved"
     'linkat'                                              '^true 0 ' # there is a second way
     'chmod\("'                                            '^true 0 .*; config.cpp chmod failed, path='
     # Whether a share has no space, or is indexed by anyone, is a question: no answer is a "no".
@@ -52,6 +55,7 @@ expectations=(
     '^delete-last .*(openat|newfstatat|pread).*folder\.conf' "$unsaved|$unloaded|^true 6 .*; config.cpp Failed to load"
     '(openat|newfstatat|pread64).*(folder|status)\.conf'  "$unsaved|$unloaded"
     'openat.*_queue".*O_APPEND'                           "$marked"
+    'openat.*/@eaDir".*O_PATH'                            "$marked|^true 0 " # for writing; or reading, or a directory
     'flock.*_queue>, LOCK_EX.*ENOLCK'                     "$marked"
     'newfstatat\([0-9]+<[^>]*_queue>'                     "$marked|^true 0 " # opened for writing, or for reading
     '_queue'                                              '^true 0 '

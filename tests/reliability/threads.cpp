@@ -1,5 +1,8 @@
-// Eight threads of one process call everything at once; the thread sanitizer looks on.
+// Eight threads of one process call everything at once; the thread sanitizer looks on. And threads that are
+// cancelled.
 #include "harness.h"
+
+#include <pthread.h>
 
 #include <thread>
 
@@ -57,7 +60,45 @@ std::vector<std::function<void()>> CallsOf(Own &own) {
     };
 }
 
+/// Until it is cancelled.
+void *CallOn(void *argument) {
+    Json::Value record;
+    std::array<char, 4096> database{};
+    for (;;) {
+        FILEIDXDBPathGet("photo", database.data(), database.size());
+        StatusMgr::SetUpdated("marker");
+        StatusMgr::Pause(1);
+        IndexMgr::Get(record, "/photo/always");
+        ::pthread_testcancel();
+    }
+    return argument;
+}
+
 }  // namespace
+
+void CancelledThreads(const std::string &) {
+    SkipUnderSanitizers("their runtimes do not survive the cancelling of threads");
+    MakeMachine();
+    const pid_t daemon = StartDaemon();
+    Check(IndexMgr::Upsert(Array(FolderRequest("/photo/always", "x"))), "the first folder");
+    std::mt19937 random(1);
+    const int rounds = Rounds(300, 3000);
+    const SameDescriptors same;
+    for (int round = 0; round < rounds; ++round) {
+        pthread_t thread{};
+        Check(::pthread_create(&thread, nullptr, CallOn, nullptr) == 0, "a thread");
+        ::usleep(random() % 1000);  // the instant to cancel at, not a wait
+        void *end = nullptr;
+        Check(::pthread_cancel(thread) == 0 && ::pthread_join(thread, &end) == 0 && end == PTHREAD_CANCELED,
+              "a cancelled thread went on");
+        Json::Value record;
+        Check(StatusMgr::SetUpdated("after") && IndexMgr::Get(record, "/photo/always"),
+              "a lock or a file is lost");
+    }
+    Kill(daemon);
+    Figure("%d cancelled threads | each left, with its locks and descriptors given back and the files whole",
+           rounds);
+}
 
 void Threads(const std::string &) {
     MakeMachine();

@@ -248,6 +248,7 @@ int VLIBCErrorGetLine(void) {
 }
 
 int VLIBCExec(const char *szProgram, const char *arg1, const char *arg2, const char *arg3, const char *arg4) {
+    const NotCancelled removing;
     std::string line = "exec " + std::string(szProgram);
     for (const char *argument : {arg1, arg2, arg3, arg4}) {
         line += argument != nullptr ? " " + std::string(argument) : "";

@@ -6,6 +6,8 @@
 /// one line of the journal.
 #pragma once
 
+#include <pthread.h>
+
 #include <functional>
 #include <limits>
 #include <optional>
@@ -18,6 +20,13 @@ namespace fileindex_test {
 
 constexpr int kAlways = std::numeric_limits<int>::max();
 
+/// What a replaced function does by itself, in the place of another process, is not cancelled.
+struct NotCancelled {
+    int before = 0;
+    NotCancelled() { ::pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &before); }
+    ~NotCancelled() { ::pthread_setcancelstate(before, nullptr); }
+};
+
 /// One rule: from the nth matching call on, `times` calls fail, or do something else first.
 struct Fault {
     std::string call;                ///< the function's name
@@ -27,6 +36,13 @@ struct Fault {
     long result = -1;                ///< what the call returns
     int error = 5;                   ///< errno (EIO), or the platform's error code
     std::function<void()> action{};  ///< if set: done first, and then the call takes place as ever
+};
+
+/// A change of one file, as the kernel was asked for it.
+struct FileChange {
+    enum class Kind { kWrite, kLength, kFlush } kind;
+    size_t at = 0;  ///< where the data goes, or the new length
+    std::string data = {};
 };
 
 class Script {
@@ -49,6 +65,10 @@ public:
     void Record(std::string effect) { journal_.push_back(std::move(effect)); }
     [[nodiscard]] std::vector<std::string> Journal() const { return journal_; }
     void ClearJournal() { calls_.clear(), journal_.clear(); }
+
+    /// The changes of the file at this path, while it is set.
+    std::string watched;
+    std::vector<FileChange> changes;
 
     /// Fixed answers of time() and rand(), while set.
     std::optional<long> now;

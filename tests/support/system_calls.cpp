@@ -1,6 +1,6 @@
 // The C functions that the library reaches for, each counted and ready to fail as a test says (script.h).
 // What is not to fail goes on to the C library.
-#undef _FORTIFY_SOURCE  // its inline open and realpath would clash with the definitions below
+#undef _FORTIFY_SOURCE  // its inline open, openat and realpath would clash with the definitions below
 
 #include "fake_daemon.h"
 #include "script.h"
@@ -21,6 +21,8 @@
 #include <new>
 #include <string>
 
+using fileindex_test::FileChange;
+using fileindex_test::NotCancelled;
 using fileindex_test::Script;
 
 namespace {
@@ -57,6 +59,12 @@ void RecordWrite(const std::string &path, const void *data, ssize_t size) {
     }
 }
 
+void RecordChange(const std::string &path, FileChange change) {
+    if (!path.empty() && path == Script::Current().watched) {
+        Script::Current().changes.push_back(std::move(change));
+    }
+}
+
 void RecordLock(const std::string &path, int operation) {
     const std::string prefix = "/tmp/fileidx_cfg_";
     if (!path.starts_with(prefix)) {
@@ -79,11 +87,25 @@ ssize_t Write(const char *name, int fd, const void *data, size_t size, Position.
         }
         size = std::min(size, static_cast<size_t>(fault->result));  // a short write is a real one
     }
+    const off_t offset = (::lseek(fd, 0, SEEK_CUR), ..., position);
     const auto written = CallNext<ssize_t>(name, fd, data, size, position...);
     const int error = errno;
     RecordWrite(path, data, written);
+    if (written > 0) {
+        RecordChange(path, {FileChange::Kind::kWrite, static_cast<size_t>(offset),
+                            std::string(static_cast<const char *>(data), static_cast<size_t>(written))});
+    }
     errno = error;
     return written;
+}
+
+int Flush(const char *name, int fd) {
+    const std::string path = PathOf(fd);
+    const int result = Call<int>(name, path, fd);
+    if (result == 0) {
+        RecordChange(path, {FileChange::Kind::kFlush});
+    }
+    return result;
 }
 
 }  // namespace
@@ -97,6 +119,18 @@ int open(const char *path, int flags, ...) {
     const mode_t mode = (flags & (O_CREAT | O_TMPFILE)) != 0 ? va_arg(arguments, mode_t) : 0;
     va_end(arguments);
     return Call<int>("open", path, path, flags, mode);
+}
+
+int openat(int directory, const char *name, int flags, ...) {
+    va_list arguments;
+    va_start(arguments, flags);
+    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): started just above
+    const mode_t mode = (flags & (O_CREAT | O_TMPFILE)) != 0 ? va_arg(arguments, mode_t) : 0;
+    va_end(arguments);
+    if (directory == AT_FDCWD) {  // not the library's: the C++ library removes directories with it
+        return CallNext<int>("openat", directory, name, flags, mode);
+    }
+    return Call<int>("openat", PathOf(directory) + "/" + name, directory, name, flags, mode);
 }
 
 /// A close that fails has closed all the same.
@@ -155,16 +189,28 @@ int linkat(int fromFd, const char *from, int toFd, const char *to, int flags) no
     return Call<int>("linkat", to, fromFd, from, toFd, to, flags);
 }
 
-int mkdir(const char *path, mode_t mode) noexcept {
-    return Call<int>("mkdir", path, path, mode);
+int mkdirat(int directory, const char *name, mode_t mode) noexcept {
+    return Call<int>("mkdirat", PathOf(directory) + "/" + name, directory, name, mode);
+}
+
+int fstatat(int directory, const char *name, struct stat *buffer, int flags) noexcept {
+    return Call<int>("fstatat", PathOf(directory) + "/" + name, directory, name, buffer, flags);
 }
 
 int ftruncate(int fd, off_t length) noexcept {
-    return Call<int>("ftruncate", PathOf(fd), fd, length);
+    const int result = Call<int>("ftruncate", PathOf(fd), fd, length);
+    if (result == 0) {
+        RecordChange(PathOf(fd), {FileChange::Kind::kLength, static_cast<size_t>(length)});
+    }
+    return result;
 }
 
-int fallocate(int fd, int mode, off_t offset, off_t length) {
-    return Call<int>("fallocate", PathOf(fd), fd, mode, offset, length);
+int fsync(int fd) {
+    return Flush("fsync", fd);
+}
+
+int fdatasync(int fd) {
+    return Flush("fdatasync", fd);
 }
 
 int socket(int domain, int type, int protocol) noexcept {
@@ -176,6 +222,7 @@ int connect(int fd, const struct sockaddr *address, socklen_t length) {
         errno = fault->error;
         return -1;
     }
+    const NotCancelled connecting;
     return fileindex_test::FakeDaemon::Connect(fd, address);
 }
 

@@ -104,7 +104,7 @@ TEST_F(EventQueue, AlwaysTakenAwayEndsTheAttempts) {
     Fail({.call = "flock", .about = kQueue, .times = kAlways, .action = [&] { fs::rename(kQueue, taken); }});
     AddSetting();
     EXPECT_EQ("", ReadFile(taken));
-    EXPECT_LE(Script::Current().Calls("open", kQueue), 16 + 3);
+    EXPECT_LE(Script::Current().Calls("openat", kQueue), 16 + 3);
 }
 
 TEST_F(EventQueue, WrittenShortCountsAsWritten) {
@@ -121,8 +121,38 @@ TEST_F(EventQueue, WrittenShortCountsAsWritten) {
     const std::string size = std::to_string(kSettingLine.size() + 1);
     EXPECT_EQ("0 utils.cpp:502 write fail, (5, " + size + ") | utils.cpp:502 write fail, (-1, " + size + ")",
               Left());
-    EXPECT_EQ(kSettingLine.substr(0, 5) + kSettingLine.substr(0, 5), ReadFile(kQueue));
+    EXPECT_EQ("", ReadFile(kQueue)) << "cut off again";
     EXPECT_EQ("(missing)", StatusConf());
+}
+
+TEST_F(EventQueue, IsNotLostBehindALineThatBrokeOff) {
+    GivenQueue(kReindexLine + "\n" + R"({"event":1,"pa)");
+    EXPECT_TRUE(AddCustomEvent(kSetting, "/vol1/photo/b", Json::Value()));
+    EXPECT_TRUE(AddCustomEvent(kSetting, "/vol1/photo/c", Json::Value()));
+    const std::string lineOf[] = {R"({"data":null,"event":131072,"path":"/vol1/photo/b"})",
+                                  R"({"data":null,"event":131072,"path":"/vol1/photo/c"})"};
+    EXPECT_THAT(Queue(), ElementsAre(kReindexLine, R"({"event":1,"pa)", lineOf[0], lineOf[1]));
+    EXPECT_EQ(1, Script::Current().Calls("write", std::to_string(lineOf[0].size() + 2))) << "all in one";
+
+    GivenQueue("x");
+    LOG_LEVEL = 7;
+    Fail({.call = "write", .about = kQueue, .result = 3});
+    EXPECT_TRUE(AddSetting());
+    EXPECT_EQ("x", ReadFile(kQueue));
+    EXPECT_EQ("0 utils.cpp:502 write fail, (3, " + std::to_string(kSettingLine.size() + 2) + ")", Left());
+}
+
+TEST_F(EventQueue, GoesToTheDirectoryThatWasLookedAt) {
+    GivenQueue("");
+    const std::string directory = fs::path(kQueue).parent_path();
+    fs::create_directory("/vol1/photo/victim");
+    Fail({.call = "openat", .about = kQueue, .nth = 2, .action = [&] {
+              fs::rename(directory, "/vol1/photo/hidden");
+              fs::create_directory_symlink("victim", directory);
+          }});
+    EXPECT_TRUE(AddSetting());
+    EXPECT_TRUE(fs::is_empty("/vol1/photo/victim"));
+    EXPECT_EQ(kSettingLine + "\n", ReadFile("/vol1/photo/hidden/VORK@file_index_queue"));
 }
 
 TEST_F(EventQueue, ThatCannotBeUsedMarksTheShareForReindexing) {
@@ -133,7 +163,8 @@ TEST_F(EventQueue, ThatCannotBeUsedMarksTheShareForReindexing) {
         {"fifo", [] { ::mkfifo(kQueue, 0600); }},
         {"link", [&] { fs::create_symlink(elsewhere, kQueue); }},
         {"link to a file", [&] { WriteFile(elsewhere, ""), fs::create_symlink(elsewhere, kQueue); }},
-        {"no memory", [] { Fail({.call = "open", .about = kQueue, .action = [] { throw std::bad_alloc(); }}); }},
+        {"another file", [&] { WriteFile(elsewhere, ""), fs::create_hard_link(elsewhere, kQueue); }},
+        {"no memory", [] { Fail({.call = "openat", .about = kQueue, .action = [] { throw std::bad_alloc(); }}); }},
     };
     fs::create_directory("/vol1/photo/@eaDir");
     LOG_LEVEL = 7;
@@ -144,19 +175,22 @@ TEST_F(EventQueue, ThatCannotBeUsedMarksTheShareForReindexing) {
         fs::remove(kQueue);
         fs::remove(kStatusConf);
         plant();
+        const bool isOther = std::string(name) == "another file";
         EXPECT_EQ("no" + (isNoLock ? " 0 utils.cpp:507 flock fail, path=" + std::string(kQueue) +
                                          ", reason=No locks available"
-                                   : ""),
+                          : isOther ? " 0 utils.cpp:95 Failed to open queue=" + std::string(kQueue) +
+                                          ", reason=Too many links"
+                                    : ""),
                   AskAlone("AddCustomEvent /vol1/photo/a"));
         EXPECT_EQ(kNeedReindex, StatusConf());
-        EXPECT_EQ(std::string(name) == "link to a file" ? "" : "(missing)", ReadFile(elsewhere));
+        EXPECT_EQ(isOther || std::string(name) == "link to a file" ? "" : "(missing)", ReadFile(elsewhere));
         EXPECT_THAT(Script::Current().Finish(), IsEmpty());
     }
 }
 
 TEST_F(EventQueue, SaysWhenNotEvenTheMarkCanBeSet) {
     const LockAgent other(kStatusLock);
-    Fail({.call = "open", .about = kQueue, .error = EMFILE});
+    Fail({.call = "openat", .about = kQueue, .error = EMFILE});
     EXPECT_FALSE(AddSetting());
     EXPECT_EQ(kBusy + " | utils.cpp:522 ShareSetNeedReindex failed, share=photo", Left());
 }

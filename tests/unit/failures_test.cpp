@@ -6,9 +6,12 @@
 //   1 step                        what the operation does undisturbed
 //   call numbers | answer, code and records | steps done
 //
-// The same request is then repeated; the line says so when that does not end like the undisturbed one. A call that
-// has no line, a line that has no call and any other outcome are failures of the test.
+// A thread that is cancelled in one of these calls leaves, with everything given back. The same request is then
+// repeated; the line says so when that does not end like the undisturbed one. A call that has no line, a line that
+// has no call and any other outcome are failures of the test.
 #include "fixture.h"
+
+#include <pthread.h>
 
 #include <algorithm>
 #include <cerrno>
@@ -25,6 +28,13 @@ namespace fs = std::filesystem;
 
 namespace fileindex_test {
 namespace {
+
+// A thread that is cancelled ends the process in a check of the address sanitizer's own runtime.
+#ifdef __SANITIZE_ADDRESS__
+constexpr bool kCanCancel = false;
+#else
+constexpr bool kCanCancel = true;
+#endif
 
 /// "1-3,5" for 1, 2, 3, 5.
 std::string Ranges(const std::vector<size_t> &numbers) {
@@ -48,8 +58,10 @@ Call KeyOf(const Call &made) {
     if (name.starts_with("V") || name.starts_with("Monitor") || name == "connect") {
         return {name, ""};
     }
-    for (const char *file : {"folder.conf", "status.conf", "folder.lock", "status.lock", "_queue"}) {
-        if ((name == "open" || name == "write" || name == "flock") && about.find(file) != std::string::npos) {
+    const std::set<std::string> ofFiles = {"open", "openat", "mkdirat", "fstatat", "write", "flock"};
+    for (const char *file :
+         {"folder.conf", "status.conf", "folder.lock", "status.lock", "_queue", "indexdb", "@eaDir"}) {
+        if (ofFiles.contains(name) && about.find(file) != std::string::npos) {
             return {name, file};
         }
     }
@@ -105,6 +117,24 @@ protected:
         return outcome;
     }
 
+    /// The thread of the operation is cancelled in the nth such call, so that the next cancellation point ends it.
+    void CancelIn(const Call &call, int nth) {
+        Furnish();
+        Fail({.call = call.first, .about = call.second, .nth = nth, .action = [] {
+                  ::pthread_cancel(::pthread_self());
+              }});
+        const auto descriptors = OpenDescriptors();
+        pthread_t thread{};
+        const auto body = [](void *test) -> void * { return Ask(static_cast<Failures *>(test)->call_), nullptr; };
+        ASSERT_EQ(0, ::pthread_create(&thread, nullptr, body, this));
+        ::pthread_join(thread, nullptr);
+        EXPECT_EQ(descriptors, OpenDescriptors()) << call_ << ", " << call.first << " " << nth;
+        EXPECT_FALSE(IsLocked(kFolderLock) || IsLocked(kStatusLock)) << call_ << ", " << call.first << " " << nth;
+        EXPECT_EQ(0, Platform::Current().shareRecords) << call_;
+        EXPECT_THAT(Script::Current().Finish(), IsEmpty());
+        Left();
+    }
+
     /// What became of the operation whose nth such call failed.
     std::string Outcome(const Call &call, size_t nth, const std::string &answer,
                         const std::vector<std::string> &steps, const std::string &list) {
@@ -151,7 +181,11 @@ protected:
                 same = outcomes.insert(same, {outcome, {}});
             }
             same->second[call].push_back(nth);
-            if (call.first != "flock" && isWrapped) {
+            const std::set<std::string> neverThrow = {"flock", "fstatat", "mkdirat"};
+            if (kCanCancel) {
+                CancelIn(call, static_cast<int>(nth));
+            }
+            if (!neverThrow.contains(call.first) && isWrapped) {
                 const auto action = [] { throw std::runtime_error("thrown"); };  // ends in the operation
                 EXPECT_NO_THROW(With(
                     {.call = call.first, .about = call.second, .nth = static_cast<int>(nth), .action = action}));

@@ -121,5 +121,30 @@ TEST_F(FoldersStore, AreGovernedInTheOrderOfTheList) {
     EXPECT_EQ("/photo", GetMostSuitableCfg({folders[1], folders[0]}, "/vol1/photo/2019")["path"].asString());
 }
 
+/// Looks at the document as a class derived from the store may, and as a pointer to the member lets anybody.
+class Curious : public Folders {
+public:
+    static Json::Value &DocumentOf(Folders &store) { return store.*(&Curious::document_); }
+};
+
+TEST_F(FoldersStore, HoldsTheDocumentThatWasLoadedAndThenTheOneSaved) {
+    GivenFolderConf(R"({"/photo/a":{"more":1,"video":true}})");
+    Folders store;
+    EXPECT_TRUE(store.Load());
+    Json::Value &document = Curious::DocumentOf(store);
+    EXPECT_EQ(R"({"/photo/a":{"more":1,"video":true}})", Print(document));
+
+    document["/photo/a"]["more"] = 2;
+    EXPECT_TRUE(store.SaveJson());
+    EXPECT_EQ(R"({"/photo/a":{"more":2,"video":true}})", FolderConf());
+
+    Json::Value report;
+    EXPECT_TRUE(store.Upsert(report, Parse(R"({"path":"/photo/a","name":"A"})")));
+    EXPECT_TRUE(store.Save());
+    EXPECT_EQ(FolderConf(), Print(document));
+    EXPECT_EQ(R"({"audio":false,"document":false,"name":"A","path":"/photo/a","photo":false,"video":true})",
+              Print(document["/photo/a"]));
+}
+
 }  // namespace
 }  // namespace fileindex_test

@@ -74,12 +74,12 @@ TEST_F(StorageLocation, RefusesBadArgumentsInOrder) {
 }
 
 TEST_F(StorageLocation, OfTheDatabaseIsMadeWithTheUmaskAndToldEvenWhenItCannotBe) {
-    Fail({.call = "mkdir", .about = kDatabase, .error = EACCES});
+    Fail({.call = "mkdirat", .about = kDatabase, .error = EACCES});
     EXPECT_EQ(std::string(kDatabase).size(), FILEIDXDBPathGet("photo", buffer_.data(), 4096));
     EXPECT_EQ(std::string("0 utils.cpp:750 mkdir failed, path=") + kDatabase + ", reason=Permission denied",
               Left());
     const auto held = [] { EXPECT_EQ(1, Platform::Current().shareRecords) << "given back last"; };
-    Fail({.call = "mkdir", .about = kDatabase, .action = held});
+    Fail({.call = "mkdirat", .about = kDatabase, .action = held});
     ::umask(0027);
     EXPECT_EQ(std::string(kDatabase).size(), FILEIDXDBPathGet("photo", buffer_.data(), 4096));
     EXPECT_EQ(fs::perms(0750), fs::status(kDatabase).permissions());
@@ -93,6 +93,18 @@ TEST_F(StorageLocation, CleaningRemovesTheIndexDataAndNothingElse) {
     EXPECT_EQ("kept", ReadFile("/vol1/photo/@eaDir/other"));
     Fail({.call = "VLIBCExec", .times = 3, .result = 1});
     EXPECT_TRUE(IndexMgr::CleanShareIndexData("photo")) << "what rm says does not count";
+}
+
+TEST_F(StorageLocation, BehindALinkIsToldButNotMade) {
+    fs::create_directory("/vol1/photo/elsewhere");
+    fs::create_directory_symlink("elsewhere", "/vol1/photo/@eaDir");
+    EXPECT_EQ(std::string(kDatabase).size(), FILEIDXDBPathGet("photo", buffer_.data(), 4096));
+    const std::string notMade =
+        std::string("0 utils.cpp:750 mkdir failed, path=") + kDatabase + ", reason=Not a directory";
+    EXPECT_EQ(notMade, Left());
+    EXPECT_TRUE(fs::is_empty("/vol1/photo/elsewhere"));
+    EXPECT_EQ("yes " + notMade, AskAlone("CleanShareIndexData photo")) << "the platform follows no link either";
+    EXPECT_EQ(3, Script::Current().Calls("VLIBCExec"));
 }
 
 TEST_F(StorageLocation, CleaningStopsAtAPathThatIsCut) {

@@ -7,6 +7,7 @@
 #include <filesystem>
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace fs = std::filesystem;
 
@@ -32,6 +33,13 @@ TEST_F(ConfigLoad, TakesAnyBytesAndSoManyLevels) {
         EXPECT_FALSE(Document().Load());
         EXPECT_EQ(kStatusConfUnreadable, Left());
     }
+}
+
+TEST_F(ConfigLoad, OfFoldersRefusesAByteOrderMark) {
+    GivenFolderConf("\xef\xbb\xbf{}");
+    std::vector<Folder> folders;
+    EXPECT_FALSE(IndexMgr::List(folders));
+    EXPECT_EQ(std::string("6 config.cpp Failed to load json from ") + kFolderConf, Left());
 }
 
 TEST_F(ConfigLoad, OfWhatIsNoFileLeavesTheEmptyObject) {

@@ -2,10 +2,13 @@
 #include "fixture.h"
 
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
+#include <csignal>
 #include <filesystem>
+#include <functional>
 #include <string>
 
 namespace fs = std::filesystem;
@@ -101,6 +104,55 @@ TEST_F(ConfigLock, FileIsOwnWritableClosedOnExecAndNoLink) {
     EXPECT_EQ(kBusy, Left());
     EXPECT_FALSE(fs::exists(target));
     document.Unlock();
+}
+
+TEST_F(ConfigLock, CountsOnlyOnAFileThatStrangersCannotTakeAway) {
+    constexpr uid_t kStranger = 4711;
+    const struct {
+        const char *name;
+        std::function<void()> prepare;
+        uid_t user;
+        bool locked;
+    } rows[] = {
+        {"root's", [] { ::chown(kStatusLock, 0, 0); }, kStranger, true},
+        {"our own", [] { ::chown(kStatusLock, kStranger, 0); }, kStranger, true},
+        {"a stranger's", [] { ::chown(kStatusLock, kStranger, 0); }, 0, false},
+        {"without a name", [] { Fail({.call = "flock", .times = 3, .action = [] { ::unlink(kStatusLock); }}); }, 0,
+         false},
+        {"anew after losing its name", [] { Fail({.call = "flock", .action = [] { ::unlink(kStatusLock); }}); }, 0,
+         true},
+        {"a FIFO", [] { ::unlink(kStatusLock), ::mkfifo(kStatusLock, 0600); }, 0, false},
+    };
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
+        fs::remove(kStatusLock);
+        WriteFile(kStatusLock, "");
+        ::chmod(kStatusLock, 0666);
+        row.prepare();
+        ASSERT_EQ(0, ::seteuid(row.user));
+        Document document;
+        EXPECT_EQ(row.locked, document.Lock(true));
+        document.Unlock();
+        ASSERT_EQ(0, ::seteuid(0));
+        EXPECT_EQ(row.locked ? "" : kBusy, Left());
+        EXPECT_THAT(Script::Current().Finish(), IsEmpty());
+    }
+}
+
+TEST_F(ConfigLock, DoesNotWaitForALease) {
+    WriteFile(kStatusLock, "");
+    const int fd = ::open(kStatusLock, O_RDONLY);
+    ASSERT_EQ(0, ::fcntl(fd, F_SETLEASE, F_RDLCK));
+    const auto previous = std::signal(SIGIO, SIG_IGN);
+    ::alarm(5);  // the kernel would give the holder 45 s
+    Document document;
+    EXPECT_FALSE(document.Lock(true));
+    ::alarm(0);
+    EXPECT_EQ(kBusy, Left());
+    document.Unlock();
+    ::fcntl(fd, F_SETLEASE, F_UNLCK);
+    ::close(fd);
+    std::signal(SIGIO, previous);
 }
 
 TEST_F(ConfigLock, IsNotReleasedByTheDestructorButByTheEndOfTheProcess) {

@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <cmath>
 #include <filesystem>
 #include <set>
 #include <string>
@@ -67,13 +68,16 @@ TEST_F(ConfigSave, ThatFailsLeavesTheOldBytes) {
         std::string text;
     } rows[] = {
         {"not to be opened", {.call = "open", .about = kStatusConf, .error = EACCES}, longer},
-        {"no room kept", {.call = "fallocate", .about = kStatusConf, .error = ENOSPC}, longer},
-        {"nothing written", {.call = "write", .about = kStatusConf, .error = ENOSPC}, longer},
+        {"no room for the tail", {.call = "write", .about = kStatusConf, .error = ENOSPC}, longer},
         {"interrupted", {.call = "write", .about = kStatusConf, .error = EINTR}, longer},
-        {"cut while shrinking", {.call = "write", .about = kStatusConf, .result = 1}, "{}"},
-        {"the end not set", {.call = "ftruncate", .about = kStatusConf, .error = EIO}, "{}"},
+        {"the tail cut", {.call = "write", .about = kStatusConf, .result = 5000}, longer},
+        {"the tail not flushed", {.call = "fdatasync", .about = kStatusConf}, longer},
+        {"the head not written", {.call = "write", .about = kStatusConf, .nth = 2}, longer},
+        {"the head cut while shrinking", {.call = "write", .about = kStatusConf, .nth = 2, .result = 1}, "{}"},
+        {"the head not flushed", {.call = "fdatasync", .about = kStatusConf, .nth = 2}, longer},
+        {"never to be flushed", {.call = "fdatasync", .about = kStatusConf, .nth = 2, .times = 3}, longer},
+        {"always interrupted", {.call = "fdatasync", .times = 202, .error = EINTR}, longer},
         {"the old bytes not to be read", {.call = "pread", .about = kStatusConf}, longer},
-        {"lost at the last moment", {.call = "close", .about = kStatusConf}, longer},
     };
     for (const auto &row : rows) {
         SCOPED_TRACE(row.name);
@@ -93,23 +97,80 @@ TEST_F(ConfigSave, ThatFailsLeavesTheOldBytes) {
     }
 }
 
-TEST_F(ConfigSave, CutAnywhereRestoresTheOldBytesHoweverRoughTheWayBack) {
+TEST_F(ConfigSave, RefusesWhatNoLoadWouldAccept) {
+    struct Made : Status {
+        explicit Made(const Json::Value &document) { document_ = document; }
+    };
+    Json::Value infinite;
+    infinite["a"] = HUGE_VAL;
+    Json::Value deep;
+    for (int level = 0; level < 257; ++level) {
+        Json::Value outer(Json::arrayValue);
+        outer.append(deep);
+        deep = outer;
+    }
+    GivenStatusConf(R"({"old":"document"})");
+    for (const Json::Value &document : {infinite, deep}) {
+        EXPECT_FALSE(Made(document).Save());
+        EXPECT_EQ(kStatusConfUnwritable, Left());
+        EXPECT_EQ(R"({"old":"document"})", StatusConf());
+    }
+    EXPECT_TRUE(Made(deep[0]).Save());
+    EXPECT_TRUE(Document().Load());
+}
+
+TEST_F(ConfigSave, SucceedsOnceTheHeadIsFlushed) {
+    const std::string old = R"({"old":")" + std::string(9000, 'o') + "\"}";
+    const Fault rows[] = {
+        {.call = "ftruncate", .about = kStatusConf},
+        {.call = "fdatasync", .about = kStatusConf, .nth = 3},
+        {.call = "close", .about = kStatusConf},
+        {.call = "fdatasync", .times = 3, .error = EINVAL},  // a file system that knows no flush
+        {.call = "fdatasync", .times = 3, .error = ENOSYS},
+    };
+    for (const Fault &fault : rows) {
+        SCOPED_TRACE(fault.call + std::to_string(fault.error));
+        GivenStatusConf(old);
+        Fail(fault);
+        EXPECT_TRUE(Document(R"({"new":1})").Save());
+        EXPECT_THAT(Script::Current().Finish(), IsEmpty());
+        Document read;
+        EXPECT_TRUE(read.Load());
+        EXPECT_EQ(R"({"new":1})", read.Text());
+        EXPECT_TRUE(Document(R"({"newer":1})").Save());
+        EXPECT_EQ(R"({"newer":1})", StatusConf()) << "nothing is left of the tail";
+    }
+}
+
+TEST_F(ConfigSave, WhoseHeadIsCutRestoresTheOldBytesHoweverRoughTheWayBack) {
     constexpr long kSize = 153600;
     constexpr long kBlock = 4096;
     const std::string text = R"({"new":")" + std::string(kSize - 10, 'n') + "\"}";
     for (const long oldSize : {kSize / 2, kSize, kSize * 2}) {
         const std::string old = R"({"old":")" + std::string(static_cast<size_t>(oldSize) - 10, 'o') + "\"}";
-        for (long done = 0; done < std::max(oldSize, kSize); done += kBlock) {
+        for (long done = 0; done < kSize; done += kBlock) {
             GivenStatusConf(old);
-            Fail({.call = "write", .about = kStatusConf, .result = std::max(1L, done)});
-            Fail({.call = "write", .about = kStatusConf, .nth = 2, .error = EINTR});
-            Fail({.call = "write", .about = kStatusConf, .nth = 3, .result = kBlock});
+            Fail({.call = "write", .about = kStatusConf, .nth = 2, .result = std::max(1L, done)});
+            Fail({.call = "write", .about = kStatusConf, .nth = 3, .error = EINTR});
+            Fail({.call = "write", .about = kStatusConf, .nth = 4, .result = kBlock});
             ASSERT_FALSE(Document(text).Save());
             ASSERT_EQ(kStatusConfUnwritable, Left());
             ASSERT_TRUE(old == ReadFile(kStatusConf)) << oldSize << " " << done;
             ASSERT_THAT(Script::Current().Finish(), IsEmpty());
         }
     }
+}
+
+// The tail is then the only whole document, and stays.
+TEST_F(ConfigSave, WithoutAnyWayBackLeavesTheNewDocument) {
+    GivenStatusConf(R"({"old":"document"})");
+    Fail({.call = "write", .about = kStatusConf, .nth = 2, .result = 3});
+    Fail({.call = "write", .about = kStatusConf, .nth = 3, .error = EIO});
+    EXPECT_FALSE(Document(R"({"new":1})").Save());
+    EXPECT_EQ(kStatusConfUnwritable, Left());
+    Document read;
+    EXPECT_TRUE(read.Load());
+    EXPECT_EQ(R"({"new":1})", read.Text());
 }
 
 TEST_F(ConfigSave, OfANewFileTakesEveryWayAndLeavesNoneWhenItFails) {
@@ -125,8 +186,9 @@ TEST_F(ConfigSave, OfANewFileTakesEveryWayAndLeavesNoneWhenItFails) {
         {"not to be made", {{.call = "open", .about = kConfigDir, .nth = 2, .error = EACCES}}, false},
         {"nothing written", {{.call = "write", .about = kConfigDir, .error = ENOSPC}}, false},
         {"written short", {{.call = "write", .about = kConfigDir, .result = 1}}, false},
-        {"for its owner alone", {{.call = "fchmod"}}, false},
-        {"lost at the last moment", {{.call = "close", .about = kConfigDir}}, false},
+        {"its mode left to the end", {{.call = "fchmod"}}, true},
+        {"not flushed", {{.call = "fsync", .about = kConfigDir}}, false},
+        {"its name not flushed", {{.call = "fsync", .about = kConfigDir, .nth = 2}}, false},
         {"named in the second way", {nameOnce}, true},
         {"made by another meanwhile",
          {{.call = "linkat", .action = [] { GivenStatusConf(R"({"theirs":"and longer"})"); }}},
@@ -135,7 +197,8 @@ TEST_F(ConfigSave, OfANewFileTakesEveryWayAndLeavesNoneWhenItFails) {
         {"named from the start in the end", {nameNever}, true},
         {"not to be named", {nameNever, {.call = "open", .about = kStatusConf, .nth = 2, .error = EEXIST}}, false},
         {"named, nothing written", {nameless, {.call = "write", .about = kConfigDir, .error = ENOSPC}}, false},
-        {"named, lost at the last moment", {nameless, {.call = "close", .about = kStatusConf}}, false},
+        {"named, not flushed", {nameless, {.call = "fsync", .about = kStatusConf}}, false},
+        {"named, its name not flushed", {nameless, {.call = "fsync", .about = kConfigDir, .nth = 2}}, false},
     };
     for (const auto &row : rows) {
         SCOPED_TRACE(row.name);
@@ -147,15 +210,6 @@ TEST_F(ConfigSave, OfANewFileTakesEveryWayAndLeavesNoneWhenItFails) {
         EXPECT_EQ(row.saved ? R"({"a":1})" : "(missing)", StatusConf());
         EXPECT_EQ(row.saved ? 1U : 0U, Listing(kConfigDir).size());
         EXPECT_EQ(descriptors, OpenDescriptors());
-        EXPECT_THAT(Script::Current().Finish(), IsEmpty());
-    }
-}
-
-TEST_F(ConfigSave, ReservesTheSpaceOfALongerDocumentAsFarAsItCan) {
-    for (const int error : {EINTR, EOPNOTSUPP, ENOSYS}) {
-        GivenStatusConf("{}");
-        Fail({.call = "fallocate", .about = kStatusConf, .error = error});
-        EXPECT_TRUE(Document(R"({"longer":"than before"})").Save());
         EXPECT_THAT(Script::Current().Finish(), IsEmpty());
     }
 }
