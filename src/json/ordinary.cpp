@@ -23,6 +23,7 @@ using simdjson::dom::element_type;
 using simdjson::dom::object;
 
 constexpr std::size_t kMaxDepth = 16;  // far below the exact reader's limit
+constexpr std::size_t kMinCapacity = 64;  // with less, parsing allocates by itself
 
 /// The two readers may differ about halves of surrogate pairs. One search settles it for most texts.
 bool MayHaveSurrogates(std::string_view text) {
@@ -139,7 +140,7 @@ struct OrdinaryReader::Parser {
 private:
     /// Allocates ahead of need, so that slowly growing lines do not allocate each time.
     bool HasRoomFor(std::size_t size) {
-        return size <= parser.capacity() || Allocate(std::max(size, 2 * parser.capacity()));
+        return size <= parser.capacity() || Allocate(std::max({size, kMinCapacity, 2 * parser.capacity()}));
     }
 
     /// The one place that asks an object of the JSON library's own; a parser that is made does without them.
