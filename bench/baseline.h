@@ -1,8 +1,7 @@
 /// \file
 /// The straightforward implementation of each hot operation: what the library is measured against. Results are the
 /// library's, cost is not.
-#ifndef FILEINDEX_BENCH_BASELINE_H
-#define FILEINDEX_BENCH_BASELINE_H
+#pragma once
 
 #include <fileindex/folder.h>
 
@@ -42,5 +41,3 @@ bool AddEvent(int type, const std::string &fullPath, const std::string &queueFil
 bool SendCommand(const std::string &command, const Json::Value &data);
 
 }  // namespace baseline
-
-#endif

@@ -1,6 +1,6 @@
 #include "data.h"
 
-#include "json/text.h"
+#include "base/json/text.h"
 
 #include <filesystem>
 #include <fstream>
@@ -11,7 +11,7 @@ namespace bench {
 
 namespace {
 
-using VORK::FILEINDEX::internal::ToString;
+using VORK::ToString;
 
 std::string RandomTail(std::mt19937 &random, Escapes escapes) {
     static const char *const kWords[] = {"photos",    "Фото", "Holiday trip",           "日本", "archive",

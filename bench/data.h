@@ -1,7 +1,6 @@
 /// \file
 /// Realistic folders and queues: paths of 80 to 200 bytes, some not ASCII, some with escapes.
-#ifndef FILEINDEX_BENCH_DATA_H
-#define FILEINDEX_BENCH_DATA_H
+#pragma once
 
 #include <json/value.h>
 
@@ -38,5 +37,3 @@ void WriteUnusualQueue(const std::string &path, std::size_t lines);
 std::string ReadWhole(const std::string &path);
 
 }  // namespace bench
-
-#endif

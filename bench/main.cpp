@@ -6,8 +6,8 @@
 // paths for itself: run it in a private namespace.
 
 #include "data.h"
+#include "queue/queue_file.h"
 #include "rows.h"
-#include "utils/queue_file.h"
 
 #include <fileindex/index_mgr.h>
 

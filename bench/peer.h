@@ -1,7 +1,6 @@
 /// \file
 /// A daemon that accepts each connection and reads it to the end.
-#ifndef FILEINDEX_BENCH_PEER_H
-#define FILEINDEX_BENCH_PEER_H
+#pragma once
 
 #include <thread>
 
@@ -22,5 +21,3 @@ private:
 };
 
 }  // namespace bench
-
-#endif

@@ -1,8 +1,7 @@
 /// \file
 /// The table of what is measured: each row an operation of the library, the straightforward way to do the same,
 /// the physical floor, and the ratios that must be reached.
-#ifndef FILEINDEX_BENCH_ROWS_H
-#define FILEINDEX_BENCH_ROWS_H
+#pragma once
 
 #include <functional>
 #include <string>
@@ -26,5 +25,3 @@ struct Row {
 std::vector<Row> Rows(std::size_t scale);
 
 }  // namespace bench
-
-#endif

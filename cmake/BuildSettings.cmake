@@ -45,3 +45,13 @@ if(FILEINDEX_COVERAGE)
     add_compile_options(--coverage)
     add_link_options(--coverage)
 endif()
+
+# Every platform and C function is reached through an undefined symbol of its documented name, so that a program
+# can put its own definition in front. Fortified headers would turn syslog into __syslog_chk and open into
+# __open_2, large-file redirection open into open64; link-time optimisation might bind calls early.
+function(plain_c_calls target)
+    target_compile_options(${target} PRIVATE -U_FORTIFY_SOURCE -fno-lto)
+    if(CMAKE_SIZEOF_VOID_P EQUAL 8)
+        target_compile_options(${target} PRIVATE -U_FILE_OFFSET_BITS -U_TIME_BITS)
+    endif()
+endfunction()

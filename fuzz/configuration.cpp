@@ -1,8 +1,8 @@
 // Any bytes as a configuration file, and any JSON as a request.
 
+#include "base/json/text.h"
 #include "checks.h"
 #include "config/tail.h"
-#include "json/text.h"
 #include "names.h"
 
 #include <fileindex/folders.h>

@@ -1,8 +1,8 @@
 // A sequence of operations on the library and on a model in memory: after each of them folder.conf, status.conf,
 // the queues and the daemon's commands are those of the model.
 
+#include "base/json/text.h"
 #include "checks.h"
-#include "json/text.h"
 #include "names.h"
 
 #include <fileindex/index_mgr.h>

@@ -1,7 +1,7 @@
 // Any paths: the path functions and the rule of coverage against their definitions.
 
 #include "checks.h"
-#include "coverage.h"
+#include "folders/coverage.h"
 
 #include <fileindex/folder.h>
 #include <fileindex/index_mgr.h>

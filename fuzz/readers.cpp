@@ -1,9 +1,9 @@
+#include "base/json/text.h"
 #include "checks.h"
-#include "folder_access.h"
+#include "folders/folder_access.h"
 #include "json/ordinary.h"
-#include "json/text.h"
 #include "names.h"
-#include "utils/queue_file.h"
+#include "queue/queue_file.h"
 
 #include <json/json.h>
 
@@ -17,6 +17,7 @@ namespace fileindex_fuzz {
 
 namespace {
 
+using namespace VORK;
 using namespace VORK::FILEINDEX::internal;  // NOLINT(google-build-using-namespace): the subject of every check
 
 constexpr char kFile[] = "/tmp/queue";

@@ -1,8 +1,8 @@
 // What every fuzz target begins and ends with; FUZZ_TARGET is its function.
 
+#include "base/unique_fd.h"
 #include "checks.h"
 #include "names.h"
-#include "scoped.h"
 
 #include <fcntl.h>
 #include <fuzzer/FuzzedDataProvider.h>

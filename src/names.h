@@ -1,8 +1,7 @@
 /// \file
 /// Fixed paths, keys, limits and codes that other parties know as well. What one function alone spells out for a
 /// call, such as the arguments of the notification tool, stands there.
-#ifndef FILEINDEX_SRC_NAMES_H
-#define FILEINDEX_SRC_NAMES_H
+#pragma once
 
 #include <cstddef>
 
@@ -76,5 +75,3 @@ inline constexpr int kPlatformQuota = 0x2400;
 inline constexpr int kDebugLevel = 7;
 
 }  // namespace VORK::FILEINDEX::internal
-
-#endif

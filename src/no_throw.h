@@ -1,7 +1,6 @@
 /// \file
 /// The border at which exceptions end: callers in other languages and of other compilers get a plain failure.
-#ifndef FILEINDEX_SRC_NO_THROW_H
-#define FILEINDEX_SRC_NO_THROW_H
+#pragma once
 
 #include <cxxabi.h>
 
@@ -23,5 +22,3 @@ __attribute__((no_sanitize("null"))) auto NoThrow(Operation operation, decltype(
 }
 
 }  // namespace VORK::FILEINDEX::internal
-
-#endif

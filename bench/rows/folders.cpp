@@ -1,6 +1,6 @@
+#include "base/json/text.h"
 #include "baseline.h"
-#include "folder_access.h"
-#include "json/text.h"
+#include "folders/folder_access.h"
 #include "rows/support.h"
 
 #include <fileindex/folders.h>
@@ -20,11 +20,11 @@ namespace bench {
 
 namespace {
 
+using VORK::ToString;
 using VORK::FILEINDEX::Folder;
 using VORK::FILEINDEX::Folders;
 using VORK::FILEINDEX::IndexMgr;
 using VORK::FILEINDEX::internal::FolderAccess;
-using VORK::FILEINDEX::internal::ToString;
 
 Row IsPathIndexed(std::size_t folders) {
     const auto prepare = [folders] { WriteFolderConf(SharePaths(folders, 10)); };

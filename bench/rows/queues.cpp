@@ -1,6 +1,6 @@
 #include "baseline.h"
+#include "queue/queue_file.h"
 #include "rows/support.h"
-#include "utils/queue_file.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/index_mgr.h>

@@ -1,5 +1,5 @@
+#include "base/json/text.h"
 #include "baseline.h"
-#include "json/text.h"
 #include "peer.h"
 #include "rows/support.h"
 
@@ -22,8 +22,8 @@ namespace bench {
 
 namespace {
 
+using VORK::ToString;
 using VORK::FILEINDEX::StatusMgr;
-using VORK::FILEINDEX::internal::ToString;
 
 Row OneCommand() {
     Json::Value data(Json::objectValue);

@@ -1,7 +1,6 @@
 /// \file
 /// What several groups of rows need.
-#ifndef FILEINDEX_BENCH_ROWS_SUPPORT_H
-#define FILEINDEX_BENCH_ROWS_SUPPORT_H
+#pragma once
 
 #include "data.h"
 #include "rows.h"
@@ -26,5 +25,3 @@ std::vector<Row> ServiceRows();
 std::vector<Row> ProcessRows(std::size_t scale);
 
 }  // namespace bench
-
-#endif

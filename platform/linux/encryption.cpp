@@ -1,5 +1,5 @@
 // Encrypted shares: directories encrypted by the file system, and encrypting file systems.
-#include "common/descriptor.h"
+#include "base/unique_fd.h"
 #include "common/failure.h"
 #include "filesystem/path_mount.h"
 #include "filesystem/types.h"
@@ -18,6 +18,7 @@
 #include <optional>
 #include <string>
 
+using namespace VORK;
 using namespace VORK::PLATFORM;
 
 namespace {
@@ -86,7 +87,7 @@ std::optional<State> StateOf(const std::string &path) {
     if (found->isRemote || IsSurelyPlain(found->path)) {
         return State::kPlain;
     }
-    const Descriptor directory = Open(found->path.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+    const UniqueFd directory = Open(found->path.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
     if (!directory) {
         return std::nullopt;
     }

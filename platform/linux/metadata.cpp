@@ -19,6 +19,7 @@
 #include <memory>
 #include <string>
 
+using namespace VORK;
 using namespace VORK::PLATFORM;
 
 namespace {
@@ -39,7 +40,7 @@ bool BelongsToRootAlone(const struct stat &status) {
 }
 
 bool IsEmpty(int directory) {
-    const CancellationOff guard;
+    const NoCancellation guard;
     const std::unique_ptr<DIR, int (*)(DIR *)> entries(
         fdopendir(openat(directory, ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC)), closedir);
     int count = 0;
@@ -54,7 +55,7 @@ bool IsEmpty(int directory) {
 // it.
 void KeepFromServices(int directory, const char *name) {
     constexpr int kMostNames = 1000;
-    const Descriptor entry = OpenAt(directory, name, O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
+    const UniqueFd entry = OpenAt(directory, name, O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
     struct stat status {};
     if (entry && fstat(entry.Get(), &status) == 0 && status.st_uid == 0) {
         if (S_ISDIR(status.st_mode) || status.st_nlink == 1) {
@@ -90,7 +91,7 @@ int MakeAsRoot(int parent, const char *name) {
     if (!isNew && errno != EEXIST) {
         return FailErrno(errno);
     }
-    const Descriptor directory = OpenAt(parent, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+    const UniqueFd directory = OpenAt(parent, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
     if (!directory) {
         return errno == ENOTDIR || errno == ELOOP ? Fail(VORK_ERR_EXISTS) : FailErrno(errno);
     }
@@ -130,7 +131,7 @@ int VORKEAMKDir(int flags, const char *szPath) try {
     if (!IsComponent(place.name)) {
         return Fail(VORK_ERR_BAD_PARAMETER);
     }
-    const Descriptor parent = OpenDirectory(*Shares().Current().table, place.directory);
+    const UniqueFd parent = OpenDirectory(*Shares().Current().table, place.directory);
     if (!parent) {
         return FailErrno(errno);
     }

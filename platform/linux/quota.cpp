@@ -1,5 +1,5 @@
 // Room on a volume: free blocks, btrfs quota groups, a user's quota.
-#include "common/descriptor.h"
+#include "base/unique_fd.h"
 #include "common/failure.h"
 #include "filesystem/btrfs.h"
 #include "filesystem/path_mount.h"
@@ -20,6 +20,7 @@
 #include <optional>
 #include <string>
 
+using namespace VORK;
 using namespace VORK::PLATFORM;
 
 namespace {
@@ -62,7 +63,7 @@ int WhyNot(unsigned int uid, const char *path, uint64_t required) {
     if (place->isRemote) {
         return VORK_ERR_IO;  // asking could hang
     }
-    const Descriptor volume = Open(place->path.c_str(), O_RDONLY | O_NONBLOCK | O_NOFOLLOW | O_CLOEXEC);
+    const UniqueFd volume = Open(place->path.c_str(), O_RDONLY | O_NONBLOCK | O_NOFOLLOW | O_CLOEXEC);
     if (!volume) {
         return CodeOfErrno(errno);
     }

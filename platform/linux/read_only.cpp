@@ -11,6 +11,7 @@
 #include <exception>
 #include <optional>
 
+using namespace VORK;
 using namespace VORK::PLATFORM;
 
 int VLIBShareIsReadOnlyGet(const struct _tag_VORKSHARE *pShare, int *pReadOnly) try {

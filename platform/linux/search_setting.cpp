@@ -11,6 +11,7 @@
 #include <optional>
 #include <string>
 
+using namespace VORK;
 using namespace VORK::PLATFORM;
 
 namespace {

@@ -1,7 +1,7 @@
+#include "base/json/text.h"
+#include "base/unique_fd.h"
 #include "config/load_save.h"
-#include "json/text.h"
 #include "names.h"
-#include "scoped.h"
 
 #include <fileindex/config.h>
 #include <fileindex/error.h>
@@ -42,13 +42,13 @@ bool Config::Lock(bool exclusive) {
     const int operation = (exclusive ? LOCK_EX : LOCK_SH) | LOCK_NB;
     for (int attempt = 0; attempt < kLockAttempts; ++attempt) {
         if (attempt > 0) {
-            const internal::NoCancellation closing;
+            const NoCancellation closing;
             close(lock_fd_);
             lock_fd_ = -1;
         }
         // Non-blocking: a stranger's lease on the file would hold the call for the kernel's whole grace time.
-        lock_fd_ = internal::OpenUncancelled(GetLockPath().c_str(),
-                                             O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0644);
+        constexpr int kFlags = O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK;
+        lock_fd_ = Open(GetLockPath().c_str(), kFlags, 0644).Release();
         if (lock_fd_ < 0) {
             break;
         }
@@ -72,20 +72,20 @@ void Config::Unlock() {
     if (lock_fd_ < 0) {
         return;
     }
-    const internal::NoCancellation closing;
+    const NoCancellation closing;
     flock(lock_fd_, LOCK_UN);
     close(lock_fd_);
 }
 
 bool Config::LoadJson() {
-    return internal::LoadConfig(
-        GetPath(), [this](const std::string &text) { return internal::JsonReader().Parse(text, document_); });
+    return internal::LoadConfig(GetPath(),
+                                [this](const std::string &text) { return JsonReader().Parse(text, document_); });
 }
 
 bool Config::SaveJson() {
     return internal::SaveConfig(GetPath(), [this](std::string &text) {
-        text = internal::ToString(document_) + '\n';
-        return internal::CanBeWritten(document_);
+        text = ToString(document_) + '\n';
+        return CanBeWritten(document_);
     });
 }
 

@@ -1,7 +1,7 @@
 #include "config/in_place_file.h"
 
+#include "base/unique_fd.h"
 #include "config/tail.h"
-#include "scoped.h"
 
 #include <fcntl.h>
 #include <sys/file.h>
@@ -176,7 +176,7 @@ std::string DirectoryOf(const std::string &path) {
 }
 
 bool FlushNames(const std::string &directory) {
-    const UniqueFd fd(OpenUncancelled(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    const UniqueFd fd = Open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
     return fd && Flush(fsync, fd.Get());
 }
 
@@ -200,7 +200,7 @@ bool Publish(int fd, const std::string &path) {
 /// find the file empty. One that could not be written goes away again: empty it would be a broken configuration,
 /// missing it is none yet.
 bool CreateByName(const std::string &path, const std::string &text) {
-    const UniqueFd fd(OpenUncancelled(path.c_str(), O_RDWR | O_CREAT | O_EXCL | kOpenFlags, 0644));
+    const UniqueFd fd = Open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | kOpenFlags, 0644);
     if (!fd) {
         return false;
     }
@@ -215,7 +215,7 @@ bool CreateByName(const std::string &path, const std::string &text) {
 /// Creates the file with its content in one step: it is written without a name and gets the name last, so nobody
 /// ever finds it empty or half written, and a writer that dies leaves nothing.
 bool Create(const std::string &path, const std::string &text) {
-    const UniqueFd fd(OpenUncancelled(DirectoryOf(path).c_str(), O_TMPFILE | O_RDWR | O_CLOEXEC, 0644));
+    const UniqueFd fd = Open(DirectoryOf(path).c_str(), O_TMPFILE | O_RDWR | O_CLOEXEC, 0644);
     if (!fd) {
         const bool unsupported = errno == EOPNOTSUPP || errno == EISDIR || errno == EINVAL;
         return unsupported && CreateByName(path, text);
@@ -236,7 +236,7 @@ bool Create(const std::string &path, const std::string &text) {
 }  // namespace
 
 bool ReadFile(const std::string &path, std::string &text, bool &undisturbed) {
-    const UniqueFd fd(OpenUncancelled(path.c_str(), O_RDONLY | kOpenFlags));
+    const UniqueFd fd = Open(path.c_str(), O_RDONLY | kOpenFlags);
     struct stat status = {};
     if (!fd || !IsRegular(fd.Get(), status)) {
         return false;
@@ -257,13 +257,13 @@ bool ReadFile(const std::string &path, std::string &text, bool &undisturbed) {
 }
 
 bool WriteFile(const std::string &path, const std::string &text) {
-    UniqueFd fd(OpenUncancelled(path.c_str(), O_RDWR | kOpenFlags));
+    UniqueFd fd = Open(path.c_str(), O_RDWR | kOpenFlags);
     if (!fd && errno == ENOENT) {
         if (Create(path, text)) {
             return true;
         }
         // Another writer may have made it meanwhile.
-        fd = UniqueFd(OpenUncancelled(path.c_str(), O_RDWR | kOpenFlags));
+        fd = Open(path.c_str(), O_RDWR | kOpenFlags);
     }
     return fd && Replace(fd, text);
 }

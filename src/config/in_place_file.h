@@ -1,7 +1,6 @@
 /// \file
 /// JSON files that readers may read at any time and writers replace in place, without a temporary file.
-#ifndef FILEINDEX_SRC_CONFIG_IN_PLACE_FILE_H
-#define FILEINDEX_SRC_CONFIG_IN_PLACE_FILE_H
+#pragma once
 
 #include <string>
 
@@ -23,5 +22,3 @@ bool ReadFile(const std::string &path, std::string &text, bool &undisturbed);
 bool WriteFile(const std::string &path, const std::string &text);
 
 }  // namespace VORK::FILEINDEX::internal
-
-#endif

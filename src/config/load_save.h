@@ -1,7 +1,6 @@
 /// \file
 /// Loading and saving a configuration file, with the records and codes of every failure.
-#ifndef FILEINDEX_SRC_CONFIG_LOAD_SAVE_H
-#define FILEINDEX_SRC_CONFIG_LOAD_SAVE_H
+#pragma once
 
 #include <functional>
 #include <string>
@@ -21,5 +20,3 @@ using TextMaker = std::function<bool(std::string &text)>;
 bool SaveConfig(const std::string &path, const TextMaker &make);
 
 }  // namespace VORK::FILEINDEX::internal
-
-#endif

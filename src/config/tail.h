@@ -6,8 +6,7 @@
 /// with its length and checksum. It shares no page with what is written over the old document, so a crash that
 /// cuts one of the two short leaves the other whole. A save ends with cutting it off: a finished file is plain
 /// JSON.
-#ifndef FILEINDEX_SRC_CONFIG_TAIL_H
-#define FILEINDEX_SRC_CONFIG_TAIL_H
+#pragma once
 
 #include <cstddef>
 #include <string>
@@ -33,5 +32,3 @@ struct FileContent {
 FileContent ContentOf(std::string_view bytes);
 
 }  // namespace VORK::FILEINDEX::internal
-
-#endif

@@ -1,7 +1,7 @@
+#include "base/json/text.h"
 #include "config/load_save.h"
-#include "folder_access.h"
+#include "folders/folder_access.h"
 #include "json/ordinary.h"
-#include "json/text.h"
 #include "names.h"
 
 #include <fileindex/error.h>
@@ -67,9 +67,9 @@ void AppendRecord(std::string &out, const Folder &folder) {
     AppendMember(out, "audio", folder.audio);
     AppendMember(out, "document", folder.document);
     out += "\"name\":";
-    internal::AppendQuoted(out, folder.name);
+    AppendQuoted(out, folder.name);
     out += ",\"path\":";
-    internal::AppendQuoted(out, folder.path);
+    AppendQuoted(out, folder.path);
     out += ',';
     AppendMember(out, "photo", folder.photo);
     AppendMember(out, "video", folder.video);
@@ -81,7 +81,7 @@ std::string TextOf(const std::map<std::string, Folder> &folders) {
     std::string text;
     for (const auto &[path, folder] : folders) {
         text += text.empty() ? '{' : ',';
-        internal::AppendQuoted(text, path);
+        AppendQuoted(text, path);
         text += ':';
         AppendRecord(text, folder);
     }

@@ -1,4 +1,4 @@
-#include "folder_access.h"
+#include "folders/folder_access.h"
 #include "names.h"
 #include "no_throw.h"
 

@@ -1,6 +1,6 @@
-#include "coverage.h"
-#include "folder_access.h"
-#include "json/text.h"
+#include "base/json/text.h"
+#include "folders/coverage.h"
+#include "folders/folder_access.h"
 #include "names.h"
 #include "no_throw.h"
 
@@ -20,7 +20,6 @@ namespace VORK {
 namespace FILEINDEX {
 
 using internal::kFoldersModule;
-using internal::ToString;
 
 namespace {
 

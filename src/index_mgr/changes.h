@@ -1,7 +1,6 @@
 /// \file
 /// What a batch of additions or removals has changed and others must hear of.
-#ifndef FILEINDEX_SRC_INDEX_MGR_CHANGES_H
-#define FILEINDEX_SRC_INDEX_MGR_CHANGES_H
+#pragma once
 
 #include <json/value.h>
 
@@ -17,5 +16,3 @@ struct Changes {
 };
 
 }  // namespace VORK::FILEINDEX::internal
-
-#endif

@@ -1,9 +1,8 @@
 /// \file
 /// The events that follow a saved change, each queued for one of several paths of a request.
-#ifndef FILEINDEX_SRC_INDEX_MGR_EVENTS_H
-#define FILEINDEX_SRC_INDEX_MGR_EVENTS_H
+#pragma once
 
-#include "utils/event_queue.h"
+#include "queue/events.h"
 
 #include <json/value.h>
 
@@ -18,5 +17,3 @@ PendingReindexes PendingReindexesOf(const Json::Value &reports);
 bool UpdateOne(PendingReindexes &pending, const std::string &path, const Json::Value &data);
 
 }  // namespace VORK::FILEINDEX::internal
-
-#endif

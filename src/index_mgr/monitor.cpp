@@ -1,8 +1,8 @@
-#include "folder_access.h"
-#include "json/text.h"
+#include "base/json/text.h"
+#include "folders/folder_access.h"
 #include "names.h"
 #include "no_throw.h"
-#include "utils/storage.h"
+#include "share/location.h"
 
 #include <fileindex/folders.h>
 #include <fileindex/index_mgr.h>

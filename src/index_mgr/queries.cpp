@@ -1,8 +1,8 @@
-#include "coverage.h"
-#include "folder_access.h"
+#include "config/unlocker.h"
+#include "folders/coverage.h"
+#include "folders/folder_access.h"
 #include "names.h"
 #include "no_throw.h"
-#include "scoped.h"
 
 #include <fileindex/fileidx.h>
 #include <fileindex/folders.h>

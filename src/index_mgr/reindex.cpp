@@ -1,8 +1,8 @@
-#include "json/elements.h"
-#include "json/text.h"
+#include "base/json/elements.h"
+#include "base/json/text.h"
 #include "names.h"
 #include "no_throw.h"
-#include "utils/event_queue.h"
+#include "queue/events.h"
 
 #include <fileindex/error.h>
 #include <fileindex/index_mgr.h>

@@ -1,14 +1,14 @@
-#include "folder_access.h"
+#include "base/json/elements.h"
+#include "base/json/text.h"
+#include "config/unlocker.h"
+#include "folders/folder_access.h"
 #include "index_mgr/changes.h"
 #include "index_mgr/events.h"
 #include "index_mgr/share_folders.h"
 #include "index_mgr/stop_indexing.h"
-#include "json/elements.h"
-#include "json/text.h"
 #include "names.h"
 #include "no_throw.h"
-#include "scoped.h"
-#include "utils/storage.h"
+#include "share/location.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/error.h>

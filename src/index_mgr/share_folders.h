@@ -1,7 +1,6 @@
 /// \file
 /// The folders of one share, for the operations that change or clean shares.
-#ifndef FILEINDEX_SRC_INDEX_MGR_SHARE_FOLDERS_H
-#define FILEINDEX_SRC_INDEX_MGR_SHARE_FOLDERS_H
+#pragma once
 
 #include <fileindex/folders.h>
 #include <fileindex/paths.h>
@@ -29,5 +28,3 @@ inline std::vector<Folder> FoldersOf(Folders &store, const std::string &share) {
 }
 
 }  // namespace VORK::FILEINDEX::internal
-
-#endif

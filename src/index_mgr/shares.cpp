@@ -1,10 +1,10 @@
-#include "folder_access.h"
+#include "config/unlocker.h"
+#include "folders/folder_access.h"
 #include "index_mgr/share_folders.h"
 #include "index_mgr/stop_indexing.h"
 #include "names.h"
 #include "no_throw.h"
-#include "scoped.h"
-#include "utils/storage.h"
+#include "share/location.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/fileidx.h>

@@ -1,8 +1,8 @@
 #include "index_mgr/stop_indexing.h"
 
-#include "folder_access.h"
+#include "daemon/services.h"
+#include "folders/folder_access.h"
 #include "names.h"
-#include "utils/services.h"
 
 namespace VORK::FILEINDEX::internal {
 

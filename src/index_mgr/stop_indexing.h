@@ -1,7 +1,6 @@
 /// \file
 /// What happens when the last indexed folder of the whole system is gone.
-#ifndef FILEINDEX_SRC_INDEX_MGR_STOP_INDEXING_H
-#define FILEINDEX_SRC_INDEX_MGR_STOP_INDEXING_H
+#pragma once
 
 #include <fileindex/folders.h>
 
@@ -20,5 +19,3 @@ bool IsEmpty(const Folders &store);
 void StopIndexing(const StopIndexingLines &lines);
 
 }  // namespace VORK::FILEINDEX::internal
-
-#endif

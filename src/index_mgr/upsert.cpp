@@ -1,12 +1,12 @@
-#include "folder_access.h"
+#include "base/json/elements.h"
+#include "base/json/text.h"
+#include "config/unlocker.h"
+#include "daemon/services.h"
+#include "folders/folder_access.h"
 #include "index_mgr/changes.h"
 #include "index_mgr/events.h"
-#include "json/elements.h"
-#include "json/text.h"
 #include "names.h"
 #include "no_throw.h"
-#include "scoped.h"
-#include "utils/services.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/error.h>

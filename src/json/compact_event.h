@@ -1,7 +1,6 @@
 /// \file
 /// Queue lines in the very form their usual writers give them.
-#ifndef FILEINDEX_SRC_JSON_COMPACT_EVENT_H
-#define FILEINDEX_SRC_JSON_COMPACT_EVENT_H
+#pragma once
 
 #include <string_view>
 
@@ -18,5 +17,3 @@ struct OrdinaryEvent;
 bool ReadCompactEvent(std::string_view line, OrdinaryEvent &event);
 
 }  // namespace VORK::FILEINDEX::internal
-
-#endif

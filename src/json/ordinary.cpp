@@ -22,7 +22,7 @@ using simdjson::dom::element;
 using simdjson::dom::element_type;
 using simdjson::dom::object;
 
-constexpr std::size_t kMaxDepth = 16;  // far below the exact reader's limit
+constexpr std::size_t kMaxDepth = 16;     // far below the exact reader's limit
 constexpr std::size_t kMinCapacity = 64;  // with less, parsing allocates by itself
 
 /// The two readers may differ about halves of surrogate pairs. One search settles it for most texts.

@@ -4,8 +4,7 @@
 /// It decides only what it is sure of and leaves everything else to JsonReader, so that its answers are never
 /// different: members that are unsorted or of unusual types, extreme reals, deep nesting, escaped surrogates, text
 /// that is not UTF-8 or not JSON at all. A differential fuzz target keeps the two in step.
-#ifndef FILEINDEX_SRC_JSON_ORDINARY_H
-#define FILEINDEX_SRC_JSON_ORDINARY_H
+#pragma once
 
 #include <cstddef>
 #include <memory>
@@ -53,5 +52,3 @@ private:
 };
 
 }  // namespace VORK::FILEINDEX::internal
-
-#endif

@@ -1,8 +1,8 @@
-#include "json/text.h"
+#include "base/json/text.h"
+#include "config/unlocker.h"
 #include "names.h"
 #include "no_throw.h"
-#include "scoped.h"
-#include "utils/storage.h"
+#include "share/location.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/error.h>

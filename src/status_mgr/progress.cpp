@@ -1,8 +1,8 @@
-#include "coverage.h"
+#include "folders/coverage.h"
 #include "names.h"
 #include "no_throw.h"
-#include "utils/queue_file.h"
-#include "utils/storage.h"
+#include "queue/queue_file.h"
+#include "share/location.h"
 
 #include <fileindex/index_mgr.h>
 #include <fileindex/indexability.h>

@@ -1,5 +1,5 @@
 // The rate and the estimate of "fileindexctl status --watch".
-#include "progress.h"
+#include "facts/progress.h"
 
 #include <gtest/gtest.h>
 
@@ -7,8 +7,8 @@
 
 namespace {
 
-using fileindexctl::DurationText;
-using fileindexctl::Progress;
+using VORK::FILEINDEXCTL::DurationText;
+using VORK::FILEINDEXCTL::Progress;
 using Files = std::map<std::string, unsigned long>;
 
 struct Look {

@@ -1,7 +1,7 @@
 // Which records reach the system log while a command waits for a lock.
-#include "records.h"
+#include "facts/records.h"
 
-#include "patience.h"
+#include "facts/patience.h"
 
 #include <gmock/gmock.h>
 
@@ -11,9 +11,9 @@
 #include <string>
 #include <vector>
 
-using fileindexctl::Patience;
-using fileindexctl::Records;
 using testing::ElementsAre;
+using VORK::FILEINDEXCTL::Patience;
+using VORK::FILEINDEXCTL::Records;
 
 namespace {
 

@@ -1,7 +1,7 @@
-// Files and child processes for the tests of the platform, which run as root in a file system of
-// their own.
-#ifndef TESTS_PLATFORM_SUPPORT_H
-#define TESTS_PLATFORM_SUPPORT_H
+/// \file
+/// Files and child processes for the tests of the platform, which run as root in a file system of
+/// their own.
+#pragma once
 
 #include <vork/error.h>
 #include <vork/share.h>
@@ -74,5 +74,3 @@ inline std::string Encryption(const std::string &path) {
 }
 
 }  // namespace platform_test
-
-#endif

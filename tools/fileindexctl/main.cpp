@@ -1,7 +1,7 @@
-#include "failure.h"
-#include "output.h"
-#include "parser.h"
-#include "text.h"
+#include "command_line/parser.h"
+#include "report/failure.h"
+#include "report/output.h"
+#include "report/text.h"
 
 #include <fileindex/error.h>
 
@@ -14,7 +14,7 @@
 
 namespace {
 
-using namespace fileindexctl;
+using namespace VORK::FILEINDEXCTL;
 
 // At this level the library also records events that it dropped, which its results do not tell.
 constexpr int kLogDroppedEvents = 7;
@@ -42,7 +42,7 @@ bool AsksForJson(int argc, const char *const argv[]) {
 ExitStatus Run(const Invocation &invocation, Output &output) {
     if (invocation.command == nullptr) {
         std::fputs(invocation.help.c_str(), stdout);
-        return ExitStatus::Done;
+        return ExitStatus::kDone;
     }
     try {
         return invocation.command->run(invocation.arguments, output);
@@ -76,6 +76,6 @@ int main(int argc, char *argv[]) {
         return static_cast<int>(status);
     } catch (const std::exception &error) {
         std::fprintf(stderr, "fileindexctl: %s\n", Printable(error.what()).c_str());
-        return static_cast<int>(ExitStatus::Partly);
+        return static_cast<int>(ExitStatus::kPartly);
     }
 }

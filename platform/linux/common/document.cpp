@@ -17,7 +17,6 @@ namespace VORK::PLATFORM {
 
 namespace {
 
-constexpr size_t kMaxFileSize = 64U << 20U;
 constexpr std::chrono::milliseconds kLockWait{2000};
 constexpr std::chrono::milliseconds kLockRetry{2};
 constexpr int kMaxNesting = 256;
@@ -53,7 +52,7 @@ bool TakeOverModeAndOwner(int fd, const std::string &path, mode_t modeIfNew) {
 
 bool WriteTemporary(const std::string &temporary, const std::string &target, const std::string &text,
                     mode_t modeIfNew) {
-    const Descriptor file = Open(temporary.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_NOFOLLOW | O_CLOEXEC, 0600);
+    const UniqueFd file = Open(temporary.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_NOFOLLOW | O_CLOEXEC, 0600);
     if (!file) {
         return false;
     }
@@ -63,7 +62,7 @@ bool WriteTemporary(const std::string &temporary, const std::string &target, con
 
 // Makes the rename itself durable. The new text is in place whatever comes of it.
 void SyncDirectoryOf(const std::string &path) {
-    const Descriptor directory =
+    const UniqueFd directory =
         Open(path.substr(0, path.rfind('/') + 1).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
     if (directory) {
         fsync(directory.Get());
@@ -71,37 +70,6 @@ void SyncDirectoryOf(const std::string &path) {
 }
 
 }  // namespace
-
-std::optional<std::string> ReadAll(int fd) {
-    std::string text;
-    char chunk[16384];
-    for (;;) {
-        const ssize_t count = read(fd, chunk, sizeof chunk);
-        if (count < 0 && errno == EINTR) {
-            continue;
-        }
-        if (count < 0) {
-            return std::nullopt;
-        }
-        if (count == 0) {
-            return text;
-        }
-        if (text.size() + static_cast<size_t>(count) > kMaxFileSize) {
-            errno = EFBIG;
-            return std::nullopt;
-        }
-        text.append(chunk, static_cast<size_t>(count));
-    }
-}
-
-std::optional<std::string> ReadFile(const std::string &path) {
-    // Non-blocking, so that a pipe in the file's place holds nobody up.
-    const Descriptor file = Open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
-    if (!file) {
-        return std::nullopt;
-    }
-    return ReadAll(file.Get());
-}
 
 std::optional<Json::Value> ParseObject(const std::string &text) try {
     Json::CharReaderBuilder builder;
@@ -145,7 +113,7 @@ FileLock::~FileLock() {
 }
 
 std::optional<FileLock> TakeLock(const std::string &lockPath) {
-    Descriptor file = Open(lockPath.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0600);
+    UniqueFd file = Open(lockPath.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0600);
     if (!file) {
         return std::nullopt;
     }

@@ -1,8 +1,9 @@
-// JSON documents on disk: read whole, replaced whole, changed by one process at a time.
-#ifndef PLATFORM_LINUX_COMMON_DOCUMENT_H
-#define PLATFORM_LINUX_COMMON_DOCUMENT_H
+/// \file
+/// JSON documents on disk: read whole, replaced whole, changed by one process at a time.
+#pragma once
 
-#include "common/descriptor.h"
+#include "base/unique_fd.h"
+#include "base/whole_file.h"
 
 #include <json/value.h>
 
@@ -11,12 +12,6 @@
 #include <utility>
 
 namespace VORK::PLATFORM {
-
-/// Everything that can be read from the descriptor, up to 64 MiB; nothing, with errno set, on failure.
-std::optional<std::string> ReadAll(int fd);
-
-/// The whole file; nothing, with errno set, on failure.
-std::optional<std::string> ReadFile(const std::string &path);
 
 /// Parses one JSON object, strictly: no comments, no trailing text, no member twice. Nothing when the text is
 /// anything else.
@@ -36,13 +31,13 @@ bool ReplaceFile(const std::string &path, const std::string &text, unsigned int 
 /// copy of the descriptor, and closing ours alone would leave the lock with the child.
 class FileLock {
 public:
-    explicit FileLock(Descriptor file) : file_(std::move(file)) {}
+    explicit FileLock(UniqueFd file) : file_(std::move(file)) {}
     FileLock(FileLock &&) noexcept = default;
     FileLock &operator=(FileLock &&) = delete;
     ~FileLock();
 
 private:
-    Descriptor file_;
+    UniqueFd file_;
 };
 
 /// Takes the exclusive lock on the lock file, making the file when needed. Waits two seconds at most: the
@@ -50,5 +45,3 @@ private:
 std::optional<FileLock> TakeLock(const std::string &lockPath);
 
 }  // namespace VORK::PLATFORM
-
-#endif

@@ -1,6 +1,6 @@
-// Reporting a failure to the caller's thread, in one expression.
-#ifndef PLATFORM_LINUX_COMMON_FAILURE_H
-#define PLATFORM_LINUX_COMMON_FAILURE_H
+/// \file
+/// Reporting a failure to the caller's thread, in one expression.
+#pragma once
 
 namespace VORK::PLATFORM {
 
@@ -25,5 +25,3 @@ int FailErrno(int error, Place where = Place::Here());
 int CodeOfErrno(int error);
 
 }  // namespace VORK::PLATFORM
-
-#endif

@@ -1,6 +1,6 @@
 #include "filesystem/btrfs.h"
 
-#include "common/descriptor.h"
+#include "base/unique_fd.h"
 
 #include <endian.h>
 #include <fcntl.h>
@@ -19,10 +19,10 @@ namespace VORK::PLATFORM {
 namespace {
 
 // The directory itself, or the one that holds the file: opening a device or a pipe could do anything.
-Descriptor OpenDirectoryOf(const std::string &path) {
+UniqueFd OpenDirectoryOf(const std::string &path) {
     struct stat status {};
     if (lstat(path.c_str(), &status) != 0) {
-        return Descriptor();
+        return UniqueFd();
     }
     const std::string directory = S_ISDIR(status.st_mode) ? path : path.substr(0, path.rfind('/') + 1);
     return Open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
@@ -130,7 +130,7 @@ std::optional<uint64_t> RoomInGroup(int fd, uint64_t group) {
 }  // namespace
 
 std::optional<Subvolume> SubvolumeOf(const std::string &path) {
-    const Descriptor directory = OpenDirectoryOf(path);
+    const UniqueFd directory = OpenDirectoryOf(path);
     if (!directory) {
         return std::nullopt;
     }
@@ -138,7 +138,7 @@ std::optional<Subvolume> SubvolumeOf(const std::string &path) {
 }
 
 std::optional<uint64_t> RoomInQuotaGroups(const std::string &path) {
-    const Descriptor directory = OpenDirectoryOf(path);
+    const UniqueFd directory = OpenDirectoryOf(path);
     const std::optional<Subvolume> subvolume = directory ? SubvolumeAt(directory.Get()) : std::nullopt;
     if (!subvolume) {
         return std::nullopt;

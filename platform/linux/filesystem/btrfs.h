@@ -1,6 +1,6 @@
-// What btrfs knows about its subvolumes.
-#ifndef PLATFORM_LINUX_FILESYSTEM_BTRFS_H
-#define PLATFORM_LINUX_FILESYSTEM_BTRFS_H
+/// \file
+/// What btrfs knows about its subvolumes.
+#pragma once
 
 #include <array>
 #include <cstdint>
@@ -27,5 +27,3 @@ std::optional<Subvolume> SubvolumeOf(const std::string &path);
 std::optional<uint64_t> RoomInQuotaGroups(const std::string &path);
 
 }  // namespace VORK::PLATFORM
-
-#endif

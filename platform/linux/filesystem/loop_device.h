@@ -1,8 +1,8 @@
-// Files mounted as if they were disks.
-#ifndef PLATFORM_LINUX_FILESYSTEM_LOOP_DEVICE_H
-#define PLATFORM_LINUX_FILESYSTEM_LOOP_DEVICE_H
+/// \file
+/// Files mounted as if they were disks.
+#pragma once
 
-#include "filesystem/mount_table.h"
+#include "base/mount_table.h"
 
 #include <string>
 
@@ -12,5 +12,3 @@ namespace VORK::PLATFORM {
 std::string BackingFileOf(const Mount &mount);
 
 }  // namespace VORK::PLATFORM
-
-#endif

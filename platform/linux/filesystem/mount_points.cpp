@@ -12,6 +12,7 @@
 #include <optional>
 #include <string_view>
 
+using namespace VORK;
 using namespace VORK::PLATFORM;
 
 namespace {

@@ -10,7 +10,7 @@ namespace VORK::PLATFORM {
 
 namespace {
 
-Descriptor OpenIn(int directory, const std::string &path) {
+UniqueFd OpenIn(int directory, const std::string &path) {
     return OpenAt(directory, path.c_str(), O_PATH | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
 }
 
@@ -22,17 +22,17 @@ DirectoryAndName::DirectoryAndName(const std::string &path) {
     name = path.substr(slash + 1);
 }
 
-Descriptor OpenDirectory(const ShareTable &shares, const std::string &path) {
+UniqueFd OpenDirectory(const ShareTable &shares, const std::string &path) {
     const std::vector<const Share *> holding = shares.AllHolding(path);
     const std::string &start = holding.empty() ? path : holding.front()->path;
-    Descriptor directory = OpenIn(AT_FDCWD, start);
+    UniqueFd directory = OpenIn(AT_FDCWD, start);
     std::string_view left = std::string_view(path).substr(start.size());
     while (directory && !left.empty()) {
         left.remove_prefix(1);
         const std::string_view component = left.substr(0, left.find('/'));
         if (!IsComponent(component)) {
             errno = EINVAL;
-            return Descriptor();
+            return UniqueFd();
         }
         directory = OpenIn(directory.Get(), std::string(component));
         left.remove_prefix(component.size());

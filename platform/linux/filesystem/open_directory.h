@@ -1,8 +1,8 @@
-// Opening directories in shares, whose users may put a link in the place of any of them at any moment.
-#ifndef PLATFORM_LINUX_FILESYSTEM_OPEN_DIRECTORY_H
-#define PLATFORM_LINUX_FILESYSTEM_OPEN_DIRECTORY_H
+/// \file
+/// Opening directories in shares, whose users may put a link in the place of any of them at any moment.
+#pragma once
 
-#include "common/descriptor.h"
+#include "base/unique_fd.h"
 #include "shares/share_table.h"
 
 #include <string>
@@ -20,8 +20,6 @@ struct DirectoryAndName {
 /// Opens the directory (O_PATH) for system calls that take names in it. From the outermost share's directory that
 /// holds it downwards no link is followed, and neither is one in the last place of a path outside the shares;
 /// links above are the administrator's. Nothing, with errno set (ENOTDIR for a link), on failure.
-Descriptor OpenDirectory(const ShareTable &shares, const std::string &path);
+UniqueFd OpenDirectory(const ShareTable &shares, const std::string &path);
 
 }  // namespace VORK::PLATFORM
-
-#endif

@@ -1,8 +1,8 @@
-// From a path to the mount that holds it, without touching servers that may be dead.
-#ifndef PLATFORM_LINUX_FILESYSTEM_PATH_MOUNT_H
-#define PLATFORM_LINUX_FILESYSTEM_PATH_MOUNT_H
+/// \file
+/// From a path to the mount that holds it, without touching servers that may be dead.
+#pragma once
 
-#include "filesystem/mount_table.h"
+#include "base/mount_table.h"
 
 #include <optional>
 #include <string>
@@ -20,5 +20,3 @@ struct PathMount {
 std::optional<PathMount> FindMount(const std::string &path);
 
 }  // namespace VORK::PLATFORM
-
-#endif

@@ -15,6 +15,7 @@
 #include <optional>
 #include <string>
 
+using namespace VORK;
 using namespace VORK::PLATFORM;
 
 namespace {

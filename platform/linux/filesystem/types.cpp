@@ -14,6 +14,7 @@
 #include <exception>
 #include <iterator>
 
+using namespace VORK;
 using namespace VORK::PLATFORM;
 
 namespace VORK::PLATFORM {

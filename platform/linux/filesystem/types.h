@@ -1,6 +1,6 @@
-// The platform's own codes for file system types.
-#ifndef PLATFORM_LINUX_FILESYSTEM_TYPES_H
-#define PLATFORM_LINUX_FILESYSTEM_TYPES_H
+/// \file
+/// The platform's own codes for file system types.
+#pragma once
 
 #include <string_view>
 
@@ -32,5 +32,3 @@ bool IsRemoteType(int type);
 bool IsImageType(int type);
 
 }  // namespace VORK::PLATFORM
-
-#endif

@@ -1,6 +1,6 @@
-// The registrations kept for the notification daemon.
-#ifndef PLATFORM_LINUX_NOTIFYD_REGISTRATIONS_H
-#define PLATFORM_LINUX_NOTIFYD_REGISTRATIONS_H
+/// \file
+/// The registrations kept for the notification daemon.
+#pragma once
 
 #include <json/value.h>
 
@@ -19,5 +19,3 @@ bool StoreRegistration(const Json::Value &description, const std::string &name, 
 bool RemoveRegistration(const std::string &queuePath, const std::string &name);
 
 }  // namespace VORK::PLATFORM
-
-#endif

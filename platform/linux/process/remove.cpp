@@ -45,7 +45,7 @@ int RemoveInShare(const char *options, const char *path) {
     if (shares->Holding(place.directory) == nullptr) {
         return Refuse(VORK_ERR_NO_SUCH_SHARE);
     }
-    const Descriptor directory = OpenDirectory(*shares, place.directory);
+    const UniqueFd directory = OpenDirectory(*shares, place.directory);
     struct stat status {};
     if (!directory || fstat(directory.Get(), &status) != 0) {
         return Refuse(CodeOfErrno(errno));

@@ -1,6 +1,6 @@
-// Removing files in shares, whose users may exchange directories for links meanwhile.
-#ifndef PLATFORM_LINUX_PROCESS_REMOVE_H
-#define PLATFORM_LINUX_PROCESS_REMOVE_H
+/// \file
+/// Removing files in shares, whose users may exchange directories for links meanwhile.
+#pragma once
 
 namespace VORK::PLATFORM {
 
@@ -11,5 +11,3 @@ namespace VORK::PLATFORM {
 int RemoveInShare(const char *options, const char *path);
 
 }  // namespace VORK::PLATFORM
-
-#endif

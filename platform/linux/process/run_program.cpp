@@ -1,7 +1,7 @@
 #include "process/run_program.h"
 
-#include "common/cancellation.h"
-#include "common/descriptor.h"
+#include "base/cancellation.h"
+#include "base/unique_fd.h"
 #include "common/failure.h"
 
 #include <vork/error.h>
@@ -105,7 +105,7 @@ RunResult Reap(pid_t child) {
 
 // False when the moment passed and the program still runs.
 bool EndsBefore(pid_t child, std::chrono::steady_clock::time_point deadline) {
-    const Descriptor handle(static_cast<int>(syscall(SYS_pidfd_open, child, 0U)));
+    const UniqueFd handle(static_cast<int>(syscall(SYS_pidfd_open, child, 0U)));
     if (!handle) {
         return errno == ESRCH;
     }
@@ -130,7 +130,7 @@ bool EndsBefore(pid_t child, std::chrono::steady_clock::time_point deadline) {
 }  // namespace
 
 RunResult RunProgram(const char *path, const char *const argv[], const RunOptions &options) {
-    const CancellationOff guard;
+    const NoCancellation guard;
     FileActions actions;
     Attributes attributes;
     int error = actions.Prepare(options);

@@ -1,6 +1,6 @@
-// Running one program: spawned without a shell, waited for, bounded when asked to.
-#ifndef PLATFORM_LINUX_PROCESS_RUN_PROGRAM_H
-#define PLATFORM_LINUX_PROCESS_RUN_PROGRAM_H
+/// \file
+/// Running one program: spawned without a shell, waited for, bounded when asked to.
+#pragma once
 
 #include <chrono>
 #include <optional>
@@ -36,5 +36,3 @@ RunResult RunProgram(const char *path, const char *const argv[], const RunOption
 int ResultOf(const RunResult &result);
 
 }  // namespace VORK::PLATFORM
-
-#endif

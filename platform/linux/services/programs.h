@@ -1,6 +1,6 @@
-// The programs behind the service managers: run quietly, bounded, their ends turned into platform errors.
-#ifndef PLATFORM_LINUX_SERVICES_PROGRAMS_H
-#define PLATFORM_LINUX_SERVICES_PROGRAMS_H
+/// \file
+/// The programs behind the service managers: run quietly, bounded, their ends turned into platform errors.
+#pragma once
 
 #include "services/service_manager.h"
 
@@ -16,5 +16,3 @@ int RunQuietly(const char *program, const std::vector<const char *> &arguments, 
 const char *FirstProgram(std::initializer_list<const char *> candidates);
 
 }  // namespace VORK::PLATFORM
-
-#endif

@@ -1,6 +1,6 @@
-// The program that starts and stops services on this machine.
-#ifndef PLATFORM_LINUX_SERVICES_SERVICE_MANAGER_H
-#define PLATFORM_LINUX_SERVICES_SERVICE_MANAGER_H
+/// \file
+/// The program that starts and stops services on this machine.
+#pragma once
 
 #include <chrono>
 #include <memory>
@@ -32,5 +32,3 @@ std::unique_ptr<ServiceManager> MakeSystemd();
 std::unique_ptr<ServiceManager> MakeInitScripts();
 
 }  // namespace VORK::PLATFORM
-
-#endif

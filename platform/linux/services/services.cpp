@@ -15,6 +15,7 @@
 #include <string_view>
 #include <vector>
 
+using namespace VORK;
 using namespace VORK::PLATFORM;
 
 namespace {

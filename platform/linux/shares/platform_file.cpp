@@ -1,6 +1,6 @@
 #include "shares/platform_file.h"
 
-#include "common/descriptor.h"
+#include "base/unique_fd.h"
 #include "common/document.h"
 #include "common/failure.h"
 
@@ -108,7 +108,7 @@ ShareSource::Snapshot PlatformFileShares::Current() {
 }
 
 void PlatformFileShares::Load() {
-    const Descriptor file = Open(path_.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+    const UniqueFd file = Open(path_.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
     struct stat status {};
     if (!file || fstat(file.Get(), &status) != 0) {
         Keep(CodeOfErrno(errno));

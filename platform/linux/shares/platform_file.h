@@ -1,6 +1,6 @@
-// Shares from the platform's own file, "/usr/vork/etc/platform.conf".
-#ifndef PLATFORM_LINUX_SHARES_PLATFORM_FILE_H
-#define PLATFORM_LINUX_SHARES_PLATFORM_FILE_H
+/// \file
+/// Shares from the platform's own file, "/usr/vork/etc/platform.conf".
+#pragma once
 
 #include "shares/share_source.h"
 
@@ -49,5 +49,3 @@ private:
 };
 
 }  // namespace VORK::PLATFORM
-
-#endif

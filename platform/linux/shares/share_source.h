@@ -1,6 +1,6 @@
-// Where the share table comes from.
-#ifndef PLATFORM_LINUX_SHARES_SHARE_SOURCE_H
-#define PLATFORM_LINUX_SHARES_SHARE_SOURCE_H
+/// \file
+/// Where the share table comes from.
+#pragma once
 
 #include "shares/share_table.h"
 
@@ -30,5 +30,3 @@ public:
 ShareSource &Shares();
 
 }  // namespace VORK::PLATFORM
-
-#endif

@@ -1,6 +1,6 @@
-// The shares as they were at one moment, ready for lookups by name and by path.
-#ifndef PLATFORM_LINUX_SHARES_SHARE_TABLE_H
-#define PLATFORM_LINUX_SHARES_SHARE_TABLE_H
+/// \file
+/// The shares as they were at one moment, ready for lookups by name and by path.
+#pragma once
 
 #include <string>
 #include <string_view>
@@ -49,5 +49,3 @@ bool IsComponent(std::string_view text);
 bool IsAtOrBelow(std::string_view path, std::string_view directory);
 
 }  // namespace VORK::PLATFORM
-
-#endif

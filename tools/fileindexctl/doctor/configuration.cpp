@@ -1,11 +1,11 @@
 // Do the configuration files parse, and can they be changed, by root alone?
-#include "../failure.h"
-#include "../platform_file.h"
-#include "../registrations.h"
-#include "../status_file.h"
-#include "../text.h"
-#include "finding.h"
-#include "ownership.h"
+#include "doctor/finding.h"
+#include "doctor/ownership.h"
+#include "facts/platform_file.h"
+#include "facts/registrations.h"
+#include "facts/status_file.h"
+#include "report/failure.h"
+#include "report/text.h"
 
 #include <fileindex/folders.h>
 
@@ -15,7 +15,7 @@
 #include <fstream>
 #include <system_error>
 
-namespace fileindexctl::doctor {
+namespace VORK::FILEINDEXCTL::DOCTOR {
 
 namespace {
 
@@ -104,7 +104,7 @@ Findings CheckFile(VORK::FILEINDEX::Config &config, const Repairs &repairs) {
     }
     const Failure failure = FailureOf(config);
     findings.push_back(
-        failure.Status() == ExitStatus::Permission
+        failure.Status() == ExitStatus::kPermission
             ? NotAllowed(failure.what())
             : Finding{failure.what(), "every operation on it fails", "mend it with an editor", repairs});
     return findings;
@@ -196,7 +196,7 @@ Findings CheckPlatform() {
                                 "it is ignored; if it is misspelt, a share or a setting is missing",
                                 "correct its name if it is misspelt",
                                 {},
-                                Level::Note,
+                                Level::kNote,
                                 {member}});
         }
         if (!document["shares"].isNull() && !document["shares"].isObject()) {
@@ -206,7 +206,7 @@ Findings CheckPlatform() {
         }
         return findings;
     } catch (const Failure &failure) {
-        if (failure.Status() == ExitStatus::Permission) {
+        if (failure.Status() == ExitStatus::kPermission) {
             return {NotAllowed(failure.what())};
         }
         return {{failure.what(), "without it the platform knows no shares, and nothing can be indexed",
@@ -228,4 +228,4 @@ Findings CheckConfiguration(const Facts & /*facts*/) {
     return findings;
 }
 
-}  // namespace fileindexctl::doctor
+}  // namespace VORK::FILEINDEXCTL::DOCTOR

@@ -1,21 +1,21 @@
 // "doctor": what is wrong, why it matters, what to do about it.
-#include "../confirm.h"
-#include "../failure.h"
-#include "../handlers.h"
-#include "../platform_file.h"
-#include "../status_file.h"
-#include "../text.h"
-#include "finding.h"
-#include "repairs.h"
+#include "command_line/handlers.h"
+#include "doctor/finding.h"
+#include "doctor/repairs.h"
+#include "facts/platform_file.h"
+#include "facts/status_file.h"
+#include "report/confirm.h"
+#include "report/failure.h"
+#include "report/text.h"
 
 #include <unistd.h>
 
 #include <algorithm>
 #include <numeric>
 
-namespace fileindexctl {
+namespace VORK::FILEINDEXCTL {
 
-namespace doctor {
+namespace DOCTOR {
 
 namespace {
 
@@ -55,7 +55,7 @@ void Append(Findings &findings, const Findings &more) {
 }
 
 Finding NotAllowed(const std::string &what, const std::vector<std::string> &items) {
-    return {what, "this user may not look at it", "run this as the administrator", {}, Level::Unexamined, items};
+    return {what, "this user may not look at it", "run this as the administrator", {}, Level::kUnexamined, items};
 }
 
 namespace {
@@ -156,7 +156,7 @@ std::string RemedyText(const Finding &finding) {
 }
 
 const char *NameOf(Level level) {
-    return level == Level::Wrong ? "wrong" : level == Level::Note ? "note" : "unexamined";
+    return level == Level::kWrong ? "wrong" : level == Level::kNote ? "note" : "unexamined";
 }
 
 Report Examine() {
@@ -169,7 +169,7 @@ Report Examine() {
                                         "it depends on them",
                                         "mend what is found in the configuration",
                                         {},
-                                        Level::Unexamined}}});
+                                        Level::kUnexamined}}});
         } else {
             report.results.push_back({check.name, Grouped(check.run(facts))});
         }
@@ -180,11 +180,11 @@ Report Examine() {
 template <typename Counted>  // a Result or a Report
 std::string CountText(const Counted &counted) {
     std::vector<std::string> counts;
-    for (const Level level : {Level::Wrong, Level::Note, Level::Unexamined}) {
+    for (const Level level : {Level::kWrong, Level::kNote, Level::kUnexamined}) {
         const std::size_t count = counted.Count(level);
         if (count > 0) {
             counts.push_back(std::to_string(count) + " " + NameOf(level) +
-                             (level == Level::Note && count > 1 ? "s" : ""));
+                             (level == Level::kNote && count > 1 ? "s" : ""));
         }
     }
     return counts.empty() ? "ok" : Enumerate(counts);
@@ -198,9 +198,9 @@ void ShowSummary(const Report &report, Output &output) {
     const auto lines = Align(rows, 0);
     for (std::size_t i = 0; i < lines.size(); ++i) {
         const Result &result = report.results[i];
-        output.Line(lines[i], result.Count(Level::Wrong) > 0 ? Colour::Bad
-                              : result.findings.empty()      ? Colour::Good
-                                                             : Colour::Plain);
+        output.Line(lines[i], result.Count(Level::kWrong) > 0 ? Colour::kBad
+                              : result.findings.empty()       ? Colour::kGood
+                                                              : Colour::kPlain);
     }
 }
 
@@ -208,7 +208,7 @@ void ShowFindings(const Report &report, Output &output) {
     for (const auto &result : report.results) {
         for (const auto &finding : result.findings) {
             const std::string level =
-                finding.level == Level::Wrong ? "" : std::string(" (") + NameOf(finding.level) + ")";
+                finding.level == Level::kWrong ? "" : std::string(" (") + NameOf(finding.level) + ")";
             output.Line("");
             output.Line(Printable(result.check + level + ": " + WhatText(finding)));
             output.Line(Printable("  why:    " + finding.why));
@@ -257,12 +257,12 @@ Report Fix(const Report &before, const Arguments &arguments, Patience patience, 
     const Repairs repairs = before.AllRepairs();
     output.Data()["fixes"] = DifferenceJson(repairs);
     if (repairs.empty()) {
-        output.Note(before.Count(Level::Wrong) == 0 ? "there is nothing to mend"
-                                                    : "nothing of this can be mended from here");
+        output.Note(before.Count(Level::kWrong) == 0 ? "there is nothing to mend"
+                                                     : "nothing of this can be mended from here");
         return before;
     }
     if (geteuid() != 0) {  // some would succeed, and leave a lock file that is not root's
-        throw Failure(ExitStatus::Permission, "no permission to mend anything; run this as the administrator");
+        throw Failure(ExitStatus::kPermission, "no permission to mend anything; run this as the administrator");
     }
     output.Line("");
     ShowDifference(repairs, output);
@@ -279,18 +279,18 @@ Report Fix(const Report &before, const Arguments &arguments, Patience patience, 
 
 }  // namespace
 
-}  // namespace doctor
+}  // namespace DOCTOR
 
 ExitStatus ExamineSystem(const Arguments &arguments, Output &output) {
     const Patience patience(arguments);
-    doctor::Report report = doctor::Examine();
-    output.Data()["findings"] = doctor::FindingsJson(report);
-    doctor::ShowSummary(report, output);
-    doctor::ShowFindings(report, output);
+    DOCTOR::Report report = DOCTOR::Examine();
+    output.Data()["findings"] = DOCTOR::FindingsJson(report);
+    DOCTOR::ShowSummary(report, output);
+    DOCTOR::ShowFindings(report, output);
     if (arguments.Has("--fix")) {
-        report = doctor::Fix(report, arguments, patience, output);
+        report = DOCTOR::Fix(report, arguments, patience, output);
     }
-    return report.Count(doctor::Level::Wrong) == 0 ? ExitStatus::Done : ExitStatus::No;
+    return report.Count(DOCTOR::Level::kWrong) == 0 ? ExitStatus::kDone : ExitStatus::kNo;
 }
 
-}  // namespace fileindexctl
+}  // namespace VORK::FILEINDEXCTL

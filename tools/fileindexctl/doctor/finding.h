@@ -1,10 +1,9 @@
 /// \file
 /// What the doctor finds, and what it can do about it.
-#ifndef FILEINDEXCTL_DOCTOR_FINDING_H
-#define FILEINDEXCTL_DOCTOR_FINDING_H
+#pragma once
 
-#include "../paths.h"
-#include "../patience.h"
+#include "facts/paths.h"
+#include "facts/patience.h"
 
 #include <vork/share.h>
 
@@ -15,7 +14,7 @@
 #include <string>
 #include <vector>
 
-namespace fileindexctl::doctor {
+namespace VORK::FILEINDEXCTL::DOCTOR {
 
 struct Repair {
     std::string target;                   ///< the file that changes, or the service
@@ -35,9 +34,9 @@ struct Repair {
 using Repairs = std::vector<Repair>;
 
 enum class Level {
-    Wrong,
-    Note,        ///< may be as somebody wants it, or does not matter on this machine
-    Unexamined,  ///< could not be looked at, mostly for want of rights
+    kWrong,
+    kNote,        ///< may be as somebody wants it, or does not matter on this machine
+    kUnexamined,  ///< could not be looked at, mostly for want of rights
 };
 
 struct Finding {
@@ -45,7 +44,7 @@ struct Finding {
     std::string why;     ///< why it matters
     std::string remedy;  ///< "%" stands for the item, as a word of a shell command
     Repairs repairs{};
-    Level level = Level::Wrong;
+    Level level = Level::kWrong;
 
     /// The files, folders or shares it is about. Findings that differ in nothing else become one.
     std::vector<std::string> items{};
@@ -100,6 +99,4 @@ std::string QueueOf(const VORKSHARE &share);
 // monitor.cpp
 Findings CheckMonitor(const Facts &facts);
 
-}  // namespace fileindexctl::doctor
-
-#endif
+}  // namespace VORK::FILEINDEXCTL::DOCTOR

@@ -1,10 +1,10 @@
 // The two lock files: are they root's alone, so that nobody else can hold them, and does somebody keep one?
-#include "../descriptor.h"
-#include "../failure.h"
-#include "../file_locks.h"
-#include "../status_file.h"
-#include "finding.h"
-#include "ownership.h"
+#include "base/unique_fd.h"
+#include "doctor/finding.h"
+#include "doctor/ownership.h"
+#include "facts/file_locks.h"
+#include "facts/status_file.h"
+#include "report/failure.h"
 
 #include <fileindex/folders.h>
 
@@ -15,12 +15,12 @@
 
 #include <cerrno>
 
-namespace fileindexctl::doctor {
+namespace VORK::FILEINDEXCTL::DOCTOR {
 
 namespace {
 
 void Make(const std::string &path) {
-    if (!Descriptor(open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0600))) {
+    if (!UniqueFd(open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0600))) {
         throw ErrnoFailure(path, "made");
     }
 }
@@ -45,16 +45,16 @@ std::string Defect(const struct stat &status) {
 // file after somebody else has taken the other. In /tmp only its owner can exchange it meanwhile, and then for
 // something of his own that has no business under this name either.
 void Remove(const std::string &path) {
-    const Descriptor file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
+    const UniqueFd file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
     struct stat status {};
     if ((file ? fstat(file.Get(), &status) : lstat(path.c_str(), &status)) != 0) {
         throw ErrnoFailure(path, "looked at");
     }
     if (Defect(status).empty() || !LosesNothing(status)) {
-        throw Failure(ExitStatus::CannotSave, path + " has been replaced meanwhile, and stays");
+        throw Failure(ExitStatus::kCannotSave, path + " has been replaced meanwhile, and stays");
     }
     if (file && flock(file.Get(), LOCK_EX | LOCK_NB) != 0) {
-        throw Failure(ExitStatus::Busy, path + " is held by another program, and stays");
+        throw Failure(ExitStatus::kBusy, path + " is held by another program, and stays");
     }
     if (unlink(path.c_str()) != 0) {
         throw ErrnoFailure(path, "removed");
@@ -70,7 +70,7 @@ Finding Missing(const std::string &path) {
             "the library makes it with mode 0644; then everybody may hold it",
             "install -m 600 /dev/null %",
             {{path, "makes it, with mode 0600", {"+ owner 0:0, mode 0600"}, act}},
-            Level::Note,
+            Level::kNote,
             {path}};
 }
 
@@ -80,7 +80,7 @@ Finding Unusable(const std::string &path, const struct stat &status, const std::
         "the lock cannot be relied on, so " + meanwhile,
         S_ISDIR(status.st_mode) ? "rm -r %; the next change makes it anew" : "rm %; the next change makes it anew",
         {},
-        Level::Wrong,
+        Level::kWrong,
         {path}};
     if (LosesNothing(status)) {
         const auto act = [path](Patience &) {
@@ -141,4 +141,4 @@ Findings CheckLocks(const Facts & /*facts*/) {
     return findings;
 }
 
-}  // namespace fileindexctl::doctor
+}  // namespace VORK::FILEINDEXCTL::DOCTOR

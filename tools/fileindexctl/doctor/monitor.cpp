@@ -1,16 +1,16 @@
 // What the notification daemon was asked to watch.
-#include "../config_lock.h"
-#include "../failure.h"
-#include "../registrations.h"
-#include "../share_record.h"
-#include "../text.h"
-#include "finding.h"
-#include "repairs.h"
+#include "doctor/finding.h"
+#include "doctor/repairs.h"
+#include "facts/config_lock.h"
+#include "facts/registrations.h"
+#include "facts/share_record.h"
+#include "report/failure.h"
+#include "report/text.h"
 
 #include <fileindex/folders.h>
 #include <fileindex/index_mgr.h>
 
-namespace fileindexctl::doctor {
+namespace VORK::FILEINDEXCTL::DOCTOR {
 
 namespace {
 
@@ -42,7 +42,7 @@ std::string RegisterAnew(Patience &patience) {
         }
     }
     if (!failed.empty()) {
-        throw Failure(ExitStatus::Partly,
+        throw Failure(ExitStatus::kPartly,
                       "not registered: " + Enumerate(failed) + "; the former registrations are " + former);
     }
     return former;
@@ -71,8 +71,8 @@ Findings CheckMonitor(const Facts &facts) {
     try {
         registrations = ReadRegistrations();
     } catch (const Failure &failure) {
-        return {failure.Status() == ExitStatus::Permission ? NotAllowed(failure.what())
-                                                           : Broken(failure.what(), facts)};
+        return {failure.Status() == ExitStatus::kPermission ? NotAllowed(failure.what())
+                                                            : Broken(failure.what(), facts)};
     }
     Findings findings;
     for (const auto &[share, count] : facts.folderCount) {
@@ -82,11 +82,11 @@ Findings CheckMonitor(const Facts &facts) {
                                 "changes in it are not noticed",
                                 "\"fileindexctl share resume %\" if it is to go on",
                                 {},
-                                Level::Note,
+                                Level::kNote,
                                 {share}});
         }
     }
     return findings;
 }
 
-}  // namespace fileindexctl::doctor
+}  // namespace VORK::FILEINDEXCTL::DOCTOR

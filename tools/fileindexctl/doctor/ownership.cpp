@@ -1,7 +1,7 @@
-#include "ownership.h"
+#include "doctor/ownership.h"
 
-#include "../descriptor.h"
-#include "../failure.h"
+#include "base/unique_fd.h"
+#include "report/failure.h"
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -9,7 +9,7 @@
 #include <array>
 #include <cstdio>
 
-namespace fileindexctl::doctor {
+namespace VORK::FILEINDEXCTL::DOCTOR {
 
 namespace {
 
@@ -43,11 +43,11 @@ struct stat AfterMending(struct stat status, Modes modes) {
 
 // On the file that was opened, whatever stands under its name by now.
 void Correct(const std::string &path, Modes modes) {
-    const Descriptor file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
+    const UniqueFd file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
     struct stat status {};
     const bool opened = file && fstat(file.Get(), &status) == 0;
     if (opened && !MayBeMended(status)) {
-        throw Failure(ExitStatus::CannotSave, path + " has been replaced meanwhile, or has further names");
+        throw Failure(ExitStatus::kCannotSave, path + " has been replaced meanwhile, or has further names");
     }
     const struct stat after = AfterMending(status, modes);
     if (!opened || (status.st_uid != 0 && fchown(file.Get(), after.st_uid, after.st_gid) != 0) ||
@@ -73,7 +73,7 @@ Findings CheckOwnership(const std::string &path, Modes modes, const std::string 
                  why,
                  "put a copy of % into its place, which is root's",
                  {},
-                 Level::Wrong,
+                 Level::kWrong,
                  {path}}};
     }
     const auto act = [path, modes](Patience &) {
@@ -85,8 +85,8 @@ Findings CheckOwnership(const std::string &path, Modes modes, const std::string 
              why,
              "chown root %; chmod " + OctalText(mended) + " %",
              {{path, does, {"- " + now, "+ " + OwnershipText(AfterMending(status, modes))}, act}},
-             Level::Wrong,
+             Level::kWrong,
              {path}}};
 }
 
-}  // namespace fileindexctl::doctor
+}  // namespace VORK::FILEINDEXCTL::DOCTOR

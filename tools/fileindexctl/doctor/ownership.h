@@ -1,15 +1,14 @@
 /// \file
 /// Owner and mode of files and directories.
-#ifndef FILEINDEXCTL_DOCTOR_OWNERSHIP_H
-#define FILEINDEXCTL_DOCTOR_OWNERSHIP_H
+#pragma once
 
-#include "finding.h"
+#include "doctor/finding.h"
 
 #include <sys/stat.h>
 
 #include <string>
 
-namespace fileindexctl::doctor {
+namespace VORK::FILEINDEXCTL::DOCTOR {
 
 /// What a mode has to have, and what it may not have.
 struct Modes {
@@ -24,6 +23,4 @@ inline constexpr Modes kNotForOthersToWrite{0, 0022};
 /// for a link. A file with further names is left to people: its owner may have meant another one of them.
 Findings CheckOwnership(const std::string &path, Modes modes, const std::string &why);
 
-}  // namespace fileindexctl::doctor
-
-#endif
+}  // namespace VORK::FILEINDEXCTL::DOCTOR

@@ -1,10 +1,10 @@
 // The queues: can events get in, can only root write them, and is everything in them legible?
-#include "../failure.h"
-#include "../file_locks.h"
-#include "../queue_files.h"
-#include "../share_record.h"
-#include "finding.h"
-#include "ownership.h"
+#include "doctor/finding.h"
+#include "doctor/ownership.h"
+#include "facts/file_locks.h"
+#include "facts/queue_files.h"
+#include "facts/share_record.h"
+#include "report/failure.h"
 
 #include <vork/metadata.h>
 
@@ -15,7 +15,7 @@
 #include <cerrno>
 #include <cstring>
 
-namespace fileindexctl::doctor {
+namespace VORK::FILEINDEXCTL::DOCTOR {
 
 namespace {
 
@@ -37,8 +37,8 @@ Findings CheckWritable(const std::string &path) {
 }
 
 Finding Planted(const std::string &what, const std::string &path, const std::string &share) {
-    return {what, kWhyNotRoots, "rm %, then \"fileindexctl reindex " + ShellWord("/" + share) + "\"",
-            {},   Level::Wrong, {path}};
+    return {what, kWhyNotRoots,  "rm %, then \"fileindexctl reindex " + ShellWord("/" + share) + "\"",
+            {},   Level::kWrong, {path}};
 }
 
 Findings CheckFile(const std::string &path, const std::string &share) {
@@ -86,7 +86,7 @@ void LeaveToPlatform(Finding &finding, const std::string &directory) {
     for (Repair &repair : finding.repairs) {
         repair.act = [directory](Patience &) {
             if (VORKEAMKDir(0, directory.c_str()) < 0) {
-                throw Failure(ExitStatus::CannotSave, directory + " cannot be given to root");
+                throw Failure(ExitStatus::kCannotSave, directory + " cannot be given to root");
             }
             return std::string();
         };
@@ -104,7 +104,7 @@ Findings CheckQueue(const std::string &share, const VORKSHARE &record) {
     }
     if (!S_ISDIR(status.st_mode)) {
         return {
-            {"a link, or no directory", kWhyNotWritable, "rm %; it is made anew", {}, Level::Wrong, {directory}}};
+            {"a link, or no directory", kWhyNotWritable, "rm %; it is made anew", {}, Level::kWrong, {directory}}};
     }
     Findings findings = CheckOwnership(directory, kNotForOthersToWrite, kWhyNotRoots);
     for (Finding &finding : findings) {
@@ -141,4 +141,4 @@ Findings CheckQueues(const Facts &facts) {
     return findings;
 }
 
-}  // namespace fileindexctl::doctor
+}  // namespace VORK::FILEINDEXCTL::DOCTOR

@@ -1,9 +1,9 @@
-#include "repairs.h"
+#include "doctor/repairs.h"
 
-#include "../config_lock.h"
-#include "../failure.h"
-#include "../status_file.h"
-#include "../text.h"
+#include "facts/config_lock.h"
+#include "facts/status_file.h"
+#include "report/failure.h"
+#include "report/text.h"
 
 #include <algorithm>
 #include <array>
@@ -12,7 +12,7 @@
 #include <filesystem>
 #include <system_error>
 
-namespace fileindexctl::doctor {
+namespace VORK::FILEINDEXCTL::DOCTOR {
 
 namespace fs = std::filesystem;
 
@@ -103,7 +103,7 @@ std::string KeepCopy(const std::string &path) {
     }
     std::string copy = FreeName(path);
     if (!fs::copy_file(path, copy, fs::copy_options::none, error)) {
-        throw Failure(ExitStatus::CannotSave, "no copy of " + path + " could be kept: " + error.message());
+        throw Failure(ExitStatus::kCannotSave, "no copy of " + path + " could be kept: " + error.message());
     }
     return copy;
 }
@@ -112,7 +112,7 @@ void ShowDifference(const Repairs &repairs, Output &output) {
     for (const auto &repair : repairs) {
         output.Line(Printable("to change: " + repair.target));
         for (const auto &line : repair.difference) {
-            output.Line("  " + line, line.front() == '-' ? Colour::Bad : Colour::Good);
+            output.Line("  " + line, line.front() == '-' ? Colour::kBad : Colour::kGood);
         }
     }
 }
@@ -127,4 +127,4 @@ void CarryOut(const Repairs &repairs, Patience &patience, Output &output) {
     Try([&] { Edit(repairs, patience, output); }, output);
 }
 
-}  // namespace fileindexctl::doctor
+}  // namespace VORK::FILEINDEXCTL::DOCTOR

@@ -1,15 +1,14 @@
 /// \file
 /// Mending what was found.
-#ifndef FILEINDEXCTL_DOCTOR_REPAIRS_H
-#define FILEINDEXCTL_DOCTOR_REPAIRS_H
+#pragma once
 
-#include "../output.h"
-#include "../patience.h"
-#include "finding.h"
+#include "doctor/finding.h"
+#include "facts/patience.h"
+#include "report/output.h"
 
 #include <string>
 
-namespace fileindexctl::doctor {
+namespace VORK::FILEINDEXCTL::DOCTOR {
 
 /// Gives the file another name, with the time in it, and answers that. Throws Failure.
 std::string SetAside(const std::string &path);
@@ -24,6 +23,4 @@ void ShowDifference(const Repairs &repairs, Output &output);
 /// warning, and the others go on.
 void CarryOut(const Repairs &repairs, Patience &patience, Output &output);
 
-}  // namespace fileindexctl::doctor
-
-#endif
+}  // namespace VORK::FILEINDEXCTL::DOCTOR

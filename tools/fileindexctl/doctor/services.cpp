@@ -1,12 +1,12 @@
 // The programs on the other side: the daemon, the services, the search setting. While no folder is indexed, none
 // of them has to be there.
-#include "../daemon.h"
-#include "../failure.h"
-#include "../patience.h"
-#include "../platform_file.h"
-#include "../system_services.h"
-#include "finding.h"
-#include "repairs.h"
+#include "doctor/finding.h"
+#include "doctor/repairs.h"
+#include "facts/daemon.h"
+#include "facts/patience.h"
+#include "facts/platform_file.h"
+#include "facts/system_services.h"
+#include "report/failure.h"
 
 #include <vork/process.h>
 #include <vork/search.h>
@@ -18,7 +18,7 @@
 #include <array>
 #include <chrono>
 
-namespace fileindexctl::doctor {
+namespace VORK::FILEINDEXCTL::DOCTOR {
 
 namespace {
 
@@ -37,18 +37,18 @@ std::string StartCommand(const std::string &name) {
 
 bool IsDaemonThere() {
     const DaemonCondition condition = ProbeDaemon().condition;
-    return condition != DaemonCondition::Absent && condition != DaemonCondition::Stale;
+    return condition != DaemonCondition::kAbsent && condition != DaemonCondition::kStale;
 }
 
 // The service may report success before the daemon listens, or while it fails.
 std::string Start(Patience & /*patience*/) {
     if (VLIBServiceStart(kDaemon, 1) < 0) {
-        throw Failure(ExitStatus::Unreachable, std::string(kDaemon) + " could not be started");
+        throw Failure(ExitStatus::kUnreachable, std::string(kDaemon) + " could not be started");
     }
     Patience patience(kLongestStart);
     while (!IsDaemonThere()) {
         if (!patience.Again()) {
-            throw Failure(ExitStatus::Unreachable,
+            throw Failure(ExitStatus::kUnreachable,
                           std::string(kDaemon) +
                               " was started, but does not listen; the system log may tell "
                               "why");
@@ -79,10 +79,10 @@ bool IsPlatformReadable() {
 std::string SwitchSearchOn(Patience & /*patience*/) {
     std::string copy = KeepCopy(kPlatformFile);
     if (VORKSMBSetSpotlight(1) < 0) {
-        throw Failure(ExitStatus::CannotSave, "the search setting could not be changed");
+        throw Failure(ExitStatus::kCannotSave, "the search setting could not be changed");
     }
     if (VLIBServiceRestart(kFileSharing) < 0) {
-        throw Failure(ExitStatus::Unreachable,
+        throw Failure(ExitStatus::kUnreachable,
                       "search is on, but the file-sharing service could not be restarted");
     }
     return copy;
@@ -91,7 +91,7 @@ std::string SwitchSearchOn(Patience & /*patience*/) {
 // Nothing is lost yet.
 Findings CheckIdleDaemon() {
     const DaemonCondition condition = ProbeDaemon().condition;
-    if (condition != DaemonCondition::Absent && condition != DaemonCondition::Stale) {
+    if (condition != DaemonCondition::kAbsent && condition != DaemonCondition::kStale) {
         return {};
     }
     return {{"fileindexd does not run",
@@ -99,7 +99,7 @@ Findings CheckIdleDaemon() {
              IsServiceKnown(kDaemon) ? "the first folder that is added starts it"
                                      : "install the daemon's package before the first folder is added",
              {},
-             Level::Note}};
+             Level::kNote}};
 }
 
 }  // namespace
@@ -111,26 +111,26 @@ Findings CheckDaemon(const Facts &facts) {
     const std::string socket = kDaemonSocket;
     const DaemonState state = ProbeDaemon();
     switch (state.condition) {
-        case DaemonCondition::Listening:
+        case DaemonCondition::kListening:
             return {};
-        case DaemonCondition::Absent:
+        case DaemonCondition::kAbsent:
             return {Standstill("fileindexd does not run: there is no " + socket)};
-        case DaemonCondition::Stale:
+        case DaemonCondition::kStale:
             return {Standstill("fileindexd does not run: nobody listens on " + socket + ", which is left over")};
-        case DaemonCondition::Full:
+        case DaemonCondition::kFull:
             return {{"fileindexd accepts no connections on " + socket,
                      "it hangs: commands wait, and fail in the end",
                      "restart fileindexd; the system log may tell what it waits for"}};
-        case DaemonCondition::Denied:
+        case DaemonCondition::kDenied:
             return state.listens.value_or(false) ? Findings() : Findings{NotAllowed("whether fileindexd listens")};
-        case DaemonCondition::Unknown:
+        case DaemonCondition::kUnknown:
             break;
     }
     return {{"whether fileindexd listens cannot be told: " + state.text,
              "commands may not reach it",
              "see the system log",
              {},
-             Level::Unexamined}};
+             Level::kUnexamined}};
 }
 
 Findings CheckServices(const Facts &facts) {
@@ -151,7 +151,7 @@ Findings CheckServices(const Facts &facts) {
                             "the search setting is without effect, which indexing does not need",
                             "install the package of Samba if clients are to search",
                             {},
-                            Level::Note});
+                            Level::kNote});
     }
     return findings;
 }
@@ -165,7 +165,7 @@ Findings CheckSearch(const Facts &facts) {
                  std::string(kPlatformFile) + " cannot be read",
                  "mend what is found in the configuration",
                  {},
-                 Level::Unexamined}};
+                 Level::kUnexamined}};
     }
     Finding finding{"the search setting is off", "folders are indexed, but clients cannot search them",
                     "switch it on in " + std::string(kPlatformFile) + ", and restart the file-sharing service"};
@@ -176,4 +176,4 @@ Findings CheckSearch(const Facts &facts) {
     return {finding};
 }
 
-}  // namespace fileindexctl::doctor
+}  // namespace VORK::FILEINDEXCTL::DOCTOR

@@ -1,9 +1,9 @@
 // Shares, their folders and their flags.
-#include "../platform_file.h"
-#include "../share_record.h"
-#include "../status_file.h"
-#include "../text.h"
-#include "finding.h"
+#include "doctor/finding.h"
+#include "facts/platform_file.h"
+#include "facts/share_record.h"
+#include "facts/status_file.h"
+#include "report/text.h"
 
 #include <fileindex/indexability.h>
 
@@ -17,7 +17,7 @@
 #include <cstring>
 #include <set>
 
-namespace fileindexctl::doctor {
+namespace VORK::FILEINDEXCTL::DOCTOR {
 
 namespace {
 
@@ -40,7 +40,7 @@ Finding Gone(const std::string &share, const Facts &facts) {
                   "share remove %\" if it is gone for good"
                 : "mend the list of shares in " + std::string(kPlatformFile) + " first: it is not whole",
             {},
-            Level::Wrong,
+            Level::kWrong,
             {share}};
 }
 
@@ -53,7 +53,7 @@ Finding Unusable(const std::string &share, int error, const Facts &facts) {
                     kNothingIndexed,
                     "rename one of them, or bind mount the directory under the share's name",
                     {},
-                    Level::Wrong,
+                    Level::kWrong,
                     {share}};
         case VORK_ERR_NO_SUCH_SHARE:
             return Gone(share, facts);
@@ -64,7 +64,7 @@ Finding Unusable(const std::string &share, int error, const Facts &facts) {
                     kNothingIndexed,
                     (isListed ? "correct its entry in " : "mend ") + std::string(kPlatformFile),
                     {},
-                    Level::Wrong,
+                    Level::kWrong,
                     {share}};
     }
 }
@@ -79,7 +79,7 @@ Findings CheckDirectory(const std::string &share, const VORKSHARE &record, const
                  kNothingIndexed,
                  "make the directory, or mount its volume",
                  {},
-                 Level::Wrong,
+                 Level::kWrong,
                  {record.szPath}}};
     }
     const bool isMarked =
@@ -91,7 +91,7 @@ Findings CheckDirectory(const std::string &share, const VORKSHARE &record, const
              "its folders cannot be indexed for want of space",
              "make room (10 MiB)",
              {},
-             Level::Wrong,
+             Level::kWrong,
              {share}}};
 }
 
@@ -107,7 +107,7 @@ Findings CheckFolder(const std::string &path, const std::string &fullPath) {
                  "changes in it are not indexed",
                  "mend what is found of the share",
                  {},
-                 Level::Wrong,
+                 Level::kWrong,
                  {path}}};
     }
     if (error == 0 && VORK::FILEINDEX::CanPathBeIndexed(path)) {
@@ -120,7 +120,7 @@ Findings CheckFolder(const std::string &path, const std::string &fullPath) {
              "it reads as paused, and is not kept up",
              "\"fileindexctl explain %\" tells which rule it breaks",
              {},
-             Level::Wrong,
+             Level::kWrong,
              {path}}};
 }
 
@@ -145,7 +145,7 @@ Finding StaleFlag(const std::string &share, const std::string &flag) {
         "a share that is given this name later would start with the mark",
         "remove the mark",
         {{StatusFile().GetPath(), "removes the mark", {"- " + Quoted(flag) + ": " + Quoted(share)}, {}, remove}},
-        Level::Wrong,
+        Level::kWrong,
         {share}};
 }
 
@@ -154,7 +154,7 @@ Finding SpaceFlag(const std::string &share) {
                     "its folders are not indexed until it is revived",
                     "\"fileindexctl revive %\"",
                     {},
-                    Level::Wrong,
+                    Level::kWrong,
                     {share}};
     if (!IsSharePresent(share)) {
         finding.what += ", and away";
@@ -172,7 +172,7 @@ Finding ReindexFlag(const std::string &share) {
             "changes have been lost, and the index is behind",
             "\"fileindexctl reindex /%\"; this is found until fileindexd has cleared the mark",
             {},
-            Level::Wrong,
+            Level::kWrong,
             {share}};
 }
 
@@ -206,7 +206,7 @@ Findings CheckFlags(const Facts &facts) {
                             "nothing is indexed until somebody ends the pause",
                             "\"fileindexctl resume\" if it is to go on",
                             {},
-                            Level::Note});
+                            Level::kNote});
     }
     for (const char *flag : {"no_space", "need_reindex"}) {
         for (const auto &share : Marked(facts, flag)) {
@@ -220,4 +220,4 @@ Findings CheckFlags(const Facts &facts) {
     return findings;
 }
 
-}  // namespace fileindexctl::doctor
+}  // namespace VORK::FILEINDEXCTL::DOCTOR

@@ -1,0 +1,68 @@
+#include "daemon/services.h"
+
+#include "names.h"
+
+#include <vork/search.h>
+#include <vork/service.h>
+
+#include <syslog.h>
+
+namespace VORK::FILEINDEX::internal {
+
+namespace {
+
+constexpr int kServiceFlag = 1;  // the platform's
+
+bool RestartFileSharing(const RecordAt &failure) {
+    if (VLIBServiceRestart(kFileSharingService) < 0) {
+        const PlatformError error;
+        syslog(LOG_ERR, "%s:%d VLIBServiceRestart failed: err=[0x%04X %s:%d]", failure.module, failure.line,
+               error.code, error.file, error.line);
+        return false;
+    }
+    return true;
+}
+
+}  // namespace
+
+bool StartDaemon(const RecordAt &failure) {
+    if (VLIBServiceStart(kDaemonService, kServiceFlag) < 0) {
+        const PlatformError error;
+        syslog(LOG_ERR, "%s:%d VLIBServiceStart failed: err=[0x%04X %s:%d]", failure.module, failure.line,
+               error.code, error.file, error.line);
+        return false;
+    }
+    return true;
+}
+
+bool StopDaemon(const RecordAt &failure) {
+    if (VLIBServiceStop(kDaemonService, kServiceFlag) < 0) {
+        const PlatformError error;
+        syslog(LOG_ERR, "%s:%d VLIBServiceStop failed: err=[0x%04X %s:%d]", failure.module, failure.line,
+               error.code, error.file, error.line);
+        return false;
+    }
+    return true;
+}
+
+bool SetSearch(bool on, const RecordAt &failure) {
+    if (VORKSMBSetSpotlight(on ? 1 : 0) < 0) {
+        const PlatformError error;
+        syslog(LOG_ERR, "%s:%d VORKSMBSetSpotlight failed: err=[0x%04X %s:%d]", failure.module, failure.line,
+               error.code, error.file, error.line);
+        return false;
+    }
+    return true;
+}
+
+void EnsureSearch(bool on, const RecordAt &setFailure, const RecordAt &restartFailure) {
+    const bool isOn = VORKSMBIsEnableSpotlight() != 0;
+    if (isOn == on) {
+        return;
+    }
+    if (SetSearch(on, setFailure)) {
+        (void)RestartFileSharing(restartFailure);
+    }
+}
+
+}  // namespace VORK::FILEINDEX::internal

@@ -1,0 +1,38 @@
+/// \file
+/// What the library's own code may do with a Folder or the store beyond their interface.
+#pragma once
+
+#include <fileindex/folders.h>
+#include <fileindex/paths.h>
+
+#include <map>
+#include <string>
+
+namespace VORK::FILEINDEX::internal {
+
+/// In the order of kMediaKeys.
+inline constexpr bool Folder::*kMediaFlags[] = {&Folder::document, &Folder::audio, &Folder::video, &Folder::photo};
+
+struct FolderAccess {
+    /// The full path as found when the path was set, without asking again; empty when it could not be resolved.
+    static const std::string &StoredFullPath(const Folder &folder) { return folder.full_path_; }
+
+    static const std::map<std::string, Folder> &All(const Folders &store) { return store.folders_; }
+
+    /// As Folders::Load, without making the document: for a store that nobody but the library will look into.
+    static bool Load(Folders &store);
+
+    /// As Folders::Save, likewise.
+    static bool Save(const Folders &store);
+
+    /// Fills the list from the document. Not an object: one record, FILEINDEX_ERR_MALFORMED_CONFIG, false.
+    static bool TakeDocument(Folders &store);
+
+    /// Finds the full path anew. One of another path is worse than none, so the former is forgotten first.
+    static bool Resolve(Folder &folder) {
+        folder.full_path_.clear();
+        return GetFullPath(folder.full_path_, folder.path);
+    }
+};
+
+}  // namespace VORK::FILEINDEX::internal

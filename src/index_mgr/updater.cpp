@@ -1,0 +1,79 @@
+#include "daemon/services.h"
+#include "folders/folder_access.h"
+#include "names.h"
+#include "no_throw.h"
+
+#include <fileindex/folders.h>
+#include <fileindex/index_mgr.h>
+#include <fileindex/paths.h>
+#include <fileindex/updater.h>
+
+#include <vork/service.h>
+
+#include <syslog.h>
+
+#include <set>
+#include <string>
+#include <vector>
+
+namespace VORK {
+namespace FILEINDEX {
+
+using namespace internal;
+
+namespace {
+
+bool StopIndexing() {
+    if (VLIBServiceStop(kDaemonService, 1) >= 0) {
+        return true;
+    }
+    // The words name the start although the stop failed; support tools know the record by them.
+    const PlatformError error;
+    syslog(LOG_ERR, "%s:%d VLIBServiceStart failed: err=[0x%04X %s:%d]", kUtilsModule, 641, error.code, error.file,
+           error.line);
+    return false;
+}
+
+bool StartIndexing(const std::vector<Folder> &folders) {
+    if (!StartDaemon({kUtilsModule, 650}) || !SetSearch(!folders.empty(), {kUtilsModule, 654})) {
+        return false;
+    }
+    std::set<std::string> shares;
+    Json::Value paths(Json::arrayValue);
+    for (const Folder &folder : folders) {
+        std::string share;
+        if (!GetShareNameByPath(share, folder.path)) {
+            syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", kUtilsModule, 661, folder.path.c_str());
+            return false;
+        }
+        shares.insert(share);
+        paths.append(folder.path);
+    }
+    for (const std::string &share : shares) {
+        if (!IndexMgr::UpsertVorkNotifydCfg(share)) {
+            syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", kUtilsModule, 671, share.c_str());
+            return false;
+        }
+    }
+    if (!IndexMgr::Reindex(paths)) {
+        syslog(LOG_ERR, "%s:%d Reindex failed", kUtilsModule, 678);
+        return false;
+    }
+    return true;
+}
+
+}  // namespace
+
+bool Updater_zol60_beta2() {
+    return NoThrow([] {
+        Folders store;
+        std::vector<Folder> folders;
+        if (!FolderAccess::Load(store) || !store.List(folders)) {
+            return false;
+        }
+        return folders.empty() ? StopIndexing() : StartIndexing(folders);
+    });
+}
+
+}  // namespace FILEINDEX
+}  // namespace VORK

@@ -1,0 +1,88 @@
+#include "names.h"
+#include "share/location.h"
+#include "share/lookup.h"
+
+#include <fileindex/error.h>
+#include <fileindex/paths.h>
+
+#include <sys/stat.h>
+#include <syslog.h>
+
+#include <string_view>
+#include <utility>
+
+namespace VORK {
+namespace FILEINDEX {
+
+using internal::HasNul;
+using internal::kUtilsModule;
+
+bool GetFullPath(std::string &out, const std::string &sharePath) {
+    std::string shareName;
+    if (!GetShareNameByPath(shareName, sharePath)) {
+        syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", kUtilsModule, 389, sharePath.c_str());
+        return false;
+    }
+    // The platform would see the path up to a NUL only, and so another one.
+    const internal::Share share = HasNul(sharePath) ? internal::Share() : internal::FindShare(shareName);
+    if (!share) {
+        ErrorHandler::SetError(FILEINDEX_ERR_PATH);
+        return false;
+    }
+    const std::string_view directory = share->szPath;
+    const std::string_view volume = directory.substr(0, directory.rfind('/'));  // all of it when there is no "/"
+    std::string fullPath;
+    fullPath.reserve(volume.size() + sharePath.size());
+    fullPath.append(volume).append(sharePath);
+    out = std::move(fullPath);
+    return true;
+}
+
+bool GetShareNameByPath(std::string &outShareName, const std::string &sharePath) {
+    if (sharePath.empty()) {
+        return false;
+    }
+    const std::size_t end = sharePath.find('/', 1);
+    outShareName = sharePath.substr(1, end == std::string::npos ? end : end - 1);
+    return true;
+}
+
+bool GetShareNamePathByFullPath(std::string &outShareName, std::string &outSharePath,
+                                const std::string &fullPath) {
+    char name[internal::kShareNameSize] = {};
+    char path[internal::kPathSize] = {};
+    if (HasNul(fullPath) || VORKShareNamePathGet(fullPath.c_str(), name, sizeof(name), path, sizeof(path)) < 0) {
+        syslog(LOG_ERR, "%s:%d VORKShareNamePathGet failed, path=%s", kUtilsModule, 418, fullPath.c_str());
+        ErrorHandler::SetError(FILEINDEX_ERR_PATH);
+        return false;
+    }
+    outShareName = name;
+    outSharePath = path;
+    return true;
+}
+
+std::string ReplaceShareName(const std::string &sharePath, const std::string &newShareName) {
+    if (sharePath.empty()) {
+        return std::string();
+    }
+    const std::size_t rest = sharePath.find('/', 1);
+    const std::string root = "/" + newShareName;
+    return rest == std::string::npos ? root : root + sharePath.substr(rest);
+}
+
+bool StringStartWith(const std::string &str, const std::string &prefix) {
+    return str.compare(0, prefix.size(), prefix) == 0;
+}
+
+bool IsDirExist(const std::string &path) {
+    struct stat status = {};
+    return !HasNul(path) && lstat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
+}
+
+bool IsFileExist(const std::string &path) {
+    struct stat status = {};
+    return !HasNul(path) && lstat(path.c_str(), &status) == 0 && S_ISREG(status.st_mode);
+}
+
+}  // namespace FILEINDEX
+}  // namespace VORK

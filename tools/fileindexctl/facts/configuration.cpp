@@ -1,0 +1,256 @@
+#include "facts/configuration.h"
+
+#include "facts/paths.h"
+#include "report/failure.h"
+#include "report/folder_text.h"
+#include "report/text.h"
+
+#include <fileindex/status.h>
+
+#include <json/reader.h>
+
+#include <algorithm>
+#include <ctime>
+#include <iterator>
+#include <memory>
+
+namespace VORK::FILEINDEXCTL {
+
+namespace {
+
+constexpr int kVersion = 1;
+constexpr int kDeepest = 256;  // as in the configuration files
+constexpr long long kNotPaused = -1;
+
+// Shares and markers are members with names of their own, which the library's questions cannot list.
+class StatusFile : public VORK::FILEINDEX::Status {
+public:
+    std::set<std::string> MembersOf(const char *name) const {
+        const Json::Value none(Json::objectValue);
+        return document_.isObject() ? Names(document_.get(name, none)) : std::set<std::string>();
+    }
+
+    std::set<std::string> Markers() {
+        std::set<std::string> markers = Names(document_);
+        std::erase_if(markers, [this](const std::string &name) { return IsOwn(name) || !IsUpdated(name); });
+        return markers;
+    }
+
+    static bool IsOwn(const std::string &name) {
+        return name == "resume_time" || name == "no_space" || name == "need_reindex";
+    }
+
+private:
+    static std::set<std::string> Names(const Json::Value &object) {
+        if (!object.isObject()) {
+            return {};
+        }
+        const auto names = object.getMemberNames();
+        return {names.begin(), names.end()};
+    }
+};
+
+// A pause that is over reads as none.
+long long InEffect(long long resumeTime) {
+    return resumeTime != 0 && resumeTime <= std::time(nullptr) ? kNotPaused : resumeTime;
+}
+
+Json::Value Flags(const std::set<std::string> &names) {
+    Json::Value flags(Json::objectValue);
+    for (const auto &name : names) {
+        flags[name] = true;
+    }
+    return flags;
+}
+
+std::string Member(const std::string &parent, const std::string &name) {
+    return parent + "[" + Quoted(name) + "]";
+}
+
+// The checks, each of which names the member at fault.
+class Checker {
+public:
+    explicit Checker(const std::string &source) : source_(source) {}
+
+    [[noreturn]] void Fault(const std::string &member, const std::string &what) const {
+        throw Failure(ExitStatus::kMalformed, source_ + ": " + (member.empty() ? "" : member + ": ") + what);
+    }
+
+    void RequireObject(const Json::Value &value, const std::string &member) const {
+        if (!value.isObject()) {
+            Fault(member, "an object is expected");
+        }
+    }
+
+    Json::Value Parse(const std::string &text) const {
+        Json::CharReaderBuilder builder;
+        Json::CharReaderBuilder::strictMode(&builder.settings_);
+        builder.settings_["stackLimit"] = kDeepest;
+        const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
+        Json::Value document;
+        std::string errors;
+        try {
+            if (reader->parse(text.data(), text.data() + text.size(), &document, &errors)) {
+                return document;
+            }
+        } catch (const Json::Exception &) {
+            Fault({}, "it is nested more deeply than " + std::to_string(kDeepest) + " levels");
+        }
+        std::replace(errors.begin(), errors.end(), '\n', ' ');
+        Fault({}, "this is no JSON: " + errors.substr(0, errors.find_last_not_of(' ') + 1));
+    }
+
+    FolderRecords Folders(const Json::Value &folders) const {
+        RequireObject(folders, "folder");
+        FolderRecords records;
+        for (const auto &path : folders.getMemberNames()) {
+            records[path] = Record(path, folders[path], Member("folder", path));
+        }
+        return records;
+    }
+
+    StatusSettings Status(const Json::Value &status) const {
+        RequireObject(status, "status");
+        StatusSettings settings;
+        for (const auto &name : status.getMemberNames()) {
+            const std::string member = Member("status", name);
+            if (name == "resume_time") {
+                settings.resumeTime = InEffect(Time(status[name], member));
+            } else if (name == "no_space") {
+                settings.noSpace = Set(status[name], member);
+            } else if (name == "need_reindex") {
+                settings.needReindex = Set(status[name], member);
+            } else if (Boolean(status[name], member)) {
+                settings.markers.insert(name);
+            }
+        }
+        return settings;
+    }
+
+private:
+    bool Boolean(const Json::Value &value, const std::string &member) const {
+        if (!value.isBool()) {
+            Fault(member, "true or false is expected");
+        }
+        return value.asBool();
+    }
+
+    std::string Text(const Json::Value &value, const std::string &member) const {
+        if (!value.isString()) {
+            Fault(member, "a text is expected");
+        }
+        return value.asString();
+    }
+
+    long long Time(const Json::Value &value, const std::string &member) const {
+        if (!value.isInt64() || value.asInt64() < kNotPaused) {
+            Fault(member, "-1, 0 or a time is expected");
+        }
+        return value.asInt64();
+    }
+
+    // false is taken at its word here; the files themselves never hold it.
+    std::set<std::string> Set(const Json::Value &value, const std::string &member) const {
+        RequireObject(value, member);
+        std::set<std::string> names;
+        for (const auto &name : value.getMemberNames()) {
+            if (Boolean(value[name], Member(member, name))) {
+                names.insert(name);
+            }
+        }
+        return names;
+    }
+
+    // What is absent is empty or false, as in folder.conf.
+    Json::Value Record(const std::string &path, const Json::Value &given, const std::string &member) const {
+        RequireObject(given, member);
+        if (path.empty() || path.front() != '/' || path.find('\0') != std::string::npos) {
+            Fault(member, "a share path is expected: it begins with \"/\" and a share's name");
+        }
+        Json::Value record = VORK::FILEINDEX::Folder().asJson();
+        record["path"] = path;
+        for (const auto &name : given.getMemberNames()) {
+            const std::string place = Member(member, name);
+            if (name == "path" && Text(given[name], place) != path) {
+                Fault(place, "it differs from the name of the record");
+            } else if (name == "name") {
+                record[name] = Text(given[name], place);
+            } else if (std::find(std::begin(kMediaKinds), std::end(kMediaKinds), name) != std::end(kMediaKinds)) {
+                record[name] = Boolean(given[name], place);
+            } else if (name != "path") {
+                Fault(place, "there is no such member");
+            }
+        }
+        return record;
+    }
+
+    const std::string &source_;
+};
+
+}  // namespace
+
+FolderRecords StoredFolders() {
+    FolderRecords records;
+    for (const auto &folder : ReadFolders()) {
+        records[folder.path] = folder.asJson();
+    }
+    return records;
+}
+
+StatusSettings StoredStatus() {
+    StatusFile file;
+    ForgetErrors();
+    if (!file.Load()) {
+        throw FailureOf(file);
+    }
+    StatusSettings settings;
+    if (!file.GetPauseInfo(settings.resumeTime)) {
+        throw Failure(ExitStatus::kMalformed, file.GetPath() + ": \"resume_time\" is no number");
+    }
+    settings.resumeTime = InEffect(settings.resumeTime);
+    settings.noSpace = file.MembersOf("no_space");
+    settings.needReindex = file.MembersOf("need_reindex");
+    settings.markers = file.Markers();
+    return settings;
+}
+
+Json::Value DocumentOf(const FolderRecords &folders, const StatusSettings &status) {
+    Json::Value document(Json::objectValue);
+    document["version"] = kVersion;
+    document["folder"] = Json::Value(Json::objectValue);
+    for (const auto &[path, record] : folders) {
+        document["folder"][path] = record;
+    }
+    document["status"] = Flags(status.markers);
+    document["status"]["resume_time"] = static_cast<Json::Int64>(status.resumeTime);
+    document["status"]["no_space"] = Flags(status.noSpace);
+    document["status"]["need_reindex"] = Flags(status.needReindex);
+    return document;
+}
+
+Configuration ParseConfiguration(const std::string &text, const std::string &source) {
+    const Checker checker(source);
+    Json::Value document = checker.Parse(text);
+    checker.RequireObject(document, {});
+    if (document.isMember("schema") && document.isMember("data")) {  // what "export --json" writes
+        const Json::Value data = document["data"];
+        checker.RequireObject(data, "data");
+        document = data;
+    }
+    if (document["version"] != kVersion) {
+        checker.Fault("version", "1 is expected");
+    }
+    Configuration configuration;
+    for (const auto &name : document.getMemberNames()) {
+        if (name == "folder") {
+            configuration.folders = checker.Folders(document[name]);
+        } else if (name == "status") {
+            configuration.status = checker.Status(document[name]);
+        } else if (name != "version") {
+            checker.Fault(name, "there is no such member");
+        }
+    }
+    return configuration;
+}
+
+}  // namespace VORK::FILEINDEXCTL

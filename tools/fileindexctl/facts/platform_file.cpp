@@ -1,0 +1,62 @@
+#include "facts/platform_file.h"
+
+#include "report/failure.h"
+
+#include <json/reader.h>
+
+#include <cerrno>
+#include <cstring>
+#include <fstream>
+#include <set>
+
+namespace VORK::FILEINDEXCTL {
+
+Json::Value ReadPlatformFile() {
+    const std::string path = kPlatformFile;
+    std::ifstream file(path);
+    if (!file) {
+        throw Failure(errno == EACCES ? ExitStatus::kPermission : ExitStatus::kNotConfigured,
+                      path + ": " + std::strerror(errno));
+    }
+    Json::CharReaderBuilder builder;
+    Json::CharReaderBuilder::strictMode(&builder.settings_);
+    Json::Value document;
+    std::string errors;
+    try {
+        if (!Json::parseFromStream(builder, file, &document, &errors) || !document.isObject()) {
+            throw Failure(ExitStatus::kMalformed, path + " is not a JSON object");
+        }
+    } catch (const Json::Exception &) {  // nested too deeply
+        throw Failure(ExitStatus::kMalformed, path + " is not a JSON object");
+    }
+    return document;
+}
+
+std::vector<std::string> UnknownMembers(const Json::Value &document) {
+    std::vector<std::string> unknown;
+    const auto add = [&](const Json::Value &object, const std::string &prefix,
+                         const std::set<std::string> &known) {
+        for (const auto &name : object.isObject() ? object.getMemberNames() : std::vector<std::string>()) {
+            if (known.count(name) == 0) {
+                unknown.push_back(prefix + name);
+            }
+        }
+    };
+    add(document, "", {"shares", "search"});
+    const Json::Value &shares = document["shares"];
+    for (const auto &share : shares.isObject() ? shares.getMemberNames() : std::vector<std::string>()) {
+        add(shares[share], "shares." + share + ".", {"path", "recycle", "snapshot"});
+    }
+    return unknown;
+}
+
+std::vector<std::string> ConfiguredShares() {
+    try {
+        const Json::Value document = ReadPlatformFile();
+        return document["shares"].isObject() ? document["shares"].getMemberNames() : std::vector<std::string>();
+    } catch (const Failure &) {
+        return {};
+    }
+}
+
+}  // namespace VORK::FILEINDEXCTL

@@ -1,0 +1,162 @@
+#include "facts/registrations.h"
+
+#include "facts/queue_files.h"
+#include "report/failure.h"
+
+#include <json/reader.h>
+#include <json/value.h>
+#include <json/writer.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <chrono>
+#include <cstring>
+#include <fstream>
+#include <iterator>
+#include <thread>
+
+namespace VORK::FILEINDEXCTL {
+
+namespace {
+
+constexpr unsigned kMask = 0xFFCE;
+constexpr const char *kIgnored = "@eaDir";
+
+std::string Text(const Json::Value &value) {
+    Json::StreamWriterBuilder builder;
+    builder["indentation"] = "";
+    return Json::writeString(builder, value);
+}
+
+Watches::value_type WatchOf(Json::Value entry) {
+    const std::string path = entry["path"].asString();
+    entry.removeMember("path");
+    return {path, Text(entry)};
+}
+
+bool IsRegistration(const Json::Value &entry) {
+    return entry.isObject() && entry["queue"].isString() && entry["name"].isString();
+}
+
+Json::Value ReadDocument() {
+    errno = 0;
+    std::ifstream file(kRegistrationsFile);
+    if (!file && errno == ENOENT) {
+        return {};
+    }
+    if (!file && errno == EACCES) {
+        throw Denied(kRegistrationsFile);
+    }
+    if (!file) {
+        throw Failure(ExitStatus::kCannotSave, std::string(kRegistrationsFile) + ": " + std::strerror(errno));
+    }
+    // As strictly as the platform, which changes nothing in a file that it refuses.
+    Json::CharReaderBuilder builder;
+    Json::CharReaderBuilder::strictMode(&builder.settings_);
+    Json::Value document;
+    std::string errors;
+    if (!Json::parseFromStream(builder, file, &document, &errors)) {
+        throw Failure(ExitStatus::kMalformed, std::string(kRegistrationsFile) + " cannot be read as JSON");
+    }
+    const Json::Value &list = document["registrations"];
+    if (!list.isArray() || !std::all_of(list.begin(), list.end(), IsRegistration)) {
+        throw Json::LogicError("no registrations");
+    }
+    return document;
+}
+
+bool IsOwn(const Json::Value &entry) {
+    return entry["name"].asString() == kRegistration;
+}
+
+Failure Malformed() {
+    return {ExitStatus::kMalformed, std::string(kRegistrationsFile) + " does not hold registrations"};
+}
+
+// The first registration makes the file, and withdrawing the last leaves an empty list. Where only other programs
+// have registered, the system may still be being set up.
+bool TellsPauses(const Json::Value &document) {
+    const Json::Value &list = document["registrations"];
+    return list.isArray() && (list.empty() || std::any_of(list.begin(), list.end(), IsOwn));
+}
+
+}  // namespace
+
+std::map<std::string, Watches> ReadRegistrations() try {
+    std::map<std::string, Watches> registrations;
+    const Json::Value document = ReadDocument();
+    for (const auto &entry : document["registrations"]) {
+        if (!IsOwn(entry)) {
+            continue;
+        }
+        Watches &watches = registrations[entry["queue"].asString()];
+        for (const auto &watch : entry["config"]) {
+            watches.insert(WatchOf(watch));
+        }
+    }
+    return registrations;
+} catch (const Json::Exception &) {
+    throw Malformed();
+}
+
+bool IsQueuePaused(const std::string &queue) try {
+    const Json::Value document = ReadDocument();
+    const Json::Value &list = document["registrations"];
+    return TellsPauses(document) && std::none_of(list.begin(), list.end(), [&](const Json::Value &entry) {
+               return IsOwn(entry) && entry["queue"].asString() == queue;
+           });
+} catch (const Json::Exception &) {
+    throw Malformed();
+}
+
+namespace {
+
+std::set<std::string> Unregistered(const std::set<std::string> &shares) {
+    std::set<std::string> paused;
+    for (const auto &share : shares) {
+        const std::string queue = QueuePathOf(share);
+        if (!queue.empty() && IsQueuePaused(queue)) {
+            paused.insert(share);
+        }
+    }
+    return paused;
+}
+
+}  // namespace
+
+std::set<std::string> PausedShares(const std::set<std::string> &shares) {
+    constexpr auto kBetweenSaveAndRegistration = std::chrono::milliseconds(100);
+    auto paused = Unregistered(shares);
+    if (paused.empty()) {
+        return paused;
+    }
+    // A change saves its folders and has them watched a moment later: one that is at work is no pause.
+    std::this_thread::sleep_for(kBetweenSaveAndRegistration);
+    return Unregistered(paused);
+}
+
+std::string PausedText(const std::string &share) {
+    return "the share " + Quoted(share) + " is paused (fileindexctl share resume " + ShellWord(share) + ")";
+}
+
+void WarnOfResumption(const std::set<std::string> &touched, const std::set<std::string> &indexed,
+                      Output &output) try {
+    std::set<std::string> shares;
+    std::set_intersection(touched.begin(), touched.end(), indexed.begin(), indexed.end(),
+                          std::inserter(shares, shares.end()));
+    for (const auto &share : PausedShares(shares)) {
+        output.Warn("the share " + Quoted(share) + " is paused; this change has it watched again");
+    }
+} catch (const Failure &) {
+    // The change itself will meet what is wrong with the file.
+}
+
+Watches::value_type ExpectedWatch(const std::string &fullPath) {
+    Json::Value entry(Json::objectValue);
+    entry["path"] = fullPath;
+    entry["mask"] = kMask;
+    entry["ignore"].append(kIgnored);
+    return WatchOf(entry);
+}
+
+}  // namespace VORK::FILEINDEXCTL

@@ -1,0 +1,103 @@
+#include "report/screen.h"
+
+#include "report/text.h"
+
+#include <sys/ioctl.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstdio>
+#include <cstdlib>
+#include <ctime>
+#include <string_view>
+
+namespace VORK::FILEINDEXCTL {
+
+namespace {
+
+constexpr std::string_view kEnter = "\033[?25l\033[?7l";  // no cursor, no wrapping
+constexpr std::string_view kLeave = "\033[?7h\033[?25h";
+constexpr std::string_view kClearRestOfLine = "\033[K";
+constexpr std::string_view kClearBelow = "\033[J";
+
+void Print(std::string_view text) {
+    std::fwrite(text.data(), 1, text.size(), stdout);
+}
+
+winsize Size() {
+    winsize size{};
+    if (ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) != 0 || size.ws_col == 0 || size.ws_row == 0) {
+        size.ws_col = 80;
+        size.ws_row = 24;
+    }
+    return size;
+}
+
+}  // namespace
+
+bool Screen::IsUsable() {
+    const char *terminal = std::getenv("TERM");
+    return isatty(STDOUT_FILENO) != 0 && terminal != nullptr && std::string_view(terminal) != "dumb";
+}
+
+unsigned Screen::Width() {
+    return Size().ws_col;
+}
+
+void Screen::Enter() {
+    drawn_ = 0;
+    Print(kEnter);
+}
+
+void Screen::Leave() {
+    Print(kLeave);
+    std::fflush(stdout);
+}
+
+void Screen::Draw(const std::vector<std::string> &lines) {
+    if (drawn_ > 0) {
+        Print("\033[" + std::to_string(drawn_) + "A\r");
+    }
+    const std::size_t room = Size().ws_row - 1U;  // the cursor stands below
+    drawn_ = std::min(lines.size(), room);
+    for (std::size_t i = 0; i < drawn_; ++i) {
+        Print(Printable(lines[i]));
+        Print(kClearRestOfLine);
+        Print("\n");
+    }
+    Print(kClearBelow);
+    std::fflush(stdout);
+}
+
+Signals::Signals() {
+    sigemptyset(&taken_);
+    for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGQUIT, SIGTSTP, SIGWINCH}) {
+        struct sigaction action {};
+        // What the parent had ignored, as nohup does, stays so.
+        if (sigaction(signal, nullptr, &action) == 0 && action.sa_handler != SIG_IGN) {
+            sigaddset(&taken_, signal);
+        }
+    }
+    sigprocmask(SIG_BLOCK, &taken_, &before_);
+}
+
+Signals::~Signals() {
+    sigprocmask(SIG_SETMASK, &before_, nullptr);
+}
+
+int Signals::Await(unsigned long seconds) const {
+    const timespec time{static_cast<time_t>(seconds), 0};
+    return std::max(sigtimedwait(&taken_, nullptr, &time), 0);
+}
+
+void Signals::Deliver(int signal) const {
+    raise(signal);
+    sigset_t only{};
+    sigemptyset(&only);
+    sigaddset(&only, signal);
+    sigprocmask(SIG_UNBLOCK, &only, nullptr);
+    sigprocmask(SIG_BLOCK, &only, nullptr);
+}
+
+}  // namespace VORK::FILEINDEXCTL

@@ -1,0 +1,138 @@
+#include "command_line/handlers.h"
+#include "facts/daemon.h"
+#include "facts/paths.h"
+#include "facts/queue.h"
+#include "facts/queue_files.h"
+#include "facts/registrations.h"
+#include "report/confirm.h"
+#include "report/failure.h"
+#include "report/steps.h"
+#include "report/text.h"
+
+#include <fileindex/folders.h>
+#include <fileindex/index_mgr.h>
+#include <fileindex/updater.h>
+
+#include <vork/search.h>
+
+#include <set>
+#include <string>
+#include <vector>
+
+namespace VORK::FILEINDEXCTL {
+
+namespace {
+
+constexpr std::string_view kUtils = "utils.cpp";
+
+std::vector<PlannedStep> Plan(const Folders &folders) {
+    if (folders.empty()) {
+        return {{"service", "fileindexd could not be stopped", {{kUtils, 641}}, {}, Evidence::kNone}};
+    }
+    return {
+        {"service", "fileindexd could not be started", {{kUtils, 650}}, {}, Evidence::kNone},
+        {"search setting", "the search setting could not be switched on", {{kUtils, 654}}},
+        {"monitors", "a file-change monitor could not be registered", {{kUtils, 661}, {kUtils, 671}}},
+        {"events queued",
+         "the reindexing could not be queued",
+         {{kUtils, 678}},
+         {},
+         Evidence::kRecord,
+         SharesOf(folders)},
+    };
+}
+
+std::string Listed(const std::vector<std::string> &items) {
+    return items.empty() ? "none" : Enumerate(items);
+}
+
+// What holds afterwards, whatever the steps came to.
+void StateEffect(const Folders &folders, Output &output) {
+    std::set<std::string> waiting;
+    for (const auto &share : SharesOf(folders)) {
+        QueueFiles(QueuePathOf(share)).Visit([&](const QueueEvent *event) {
+            if (event != nullptr && event->type == kReindexEvent) {
+                waiting.insert(event->path);
+            }
+        });
+    }
+    std::vector<std::string> queued;
+    for (const auto &folder : folders) {
+        if (waiting.count(folder.GetFullPath()) > 0) {
+            queued.push_back(folder.path);
+        }
+    }
+    const DaemonState daemon = ProbeDaemon();
+    const bool search = VORKSMBIsEnableSpotlight() != 0;
+    output.Data()["daemon"] = daemon.ForPrograms();
+    output.Data()["search"] = search;
+    output.Data()["queued"] = ToArray(queued);
+    for (const auto &line : Align({{"daemon", daemon.text},
+                                   {"search", search ? "on" : "off"},
+                                   {"queued to be reindexed", Listed(queued)}},
+                                  0)) {
+        output.Line(line);
+    }
+}
+
+void Resume(const std::set<std::string> &paused, StepReport &report) {
+    for (const auto &share : paused) {
+        const bool done = !report.Has(StepResult::kFailed) && VORK::FILEINDEX::IndexMgr::ShareResume(share);
+        report.Add("worker of " + share, done ? StepResult::kDone : StepResult::kFailed,
+                   done ? "" : "the share could not be resumed");
+    }
+}
+
+void StatePlan(const Folders &folders, const std::set<std::string> &paused, Output &output) {
+    if (folders.empty()) {
+        output.Line("no folder is indexed: fileindexd is to stand still");
+        return;
+    }
+    output.Line("fileindexd is to run, with search switched on, and these to be indexed anew:");
+    for (const auto &folder : folders) {
+        output.Line("  " + folder.path);
+    }
+    const auto shares = SharesOf(folders);
+    output.Line("watched for changes: " + Enumerate({shares.begin(), shares.end()}));
+    for (const auto &share : paused) {
+        output.Line(PausedText(share));
+    }
+}
+
+}  // namespace
+
+ExitStatus Migrate(const Arguments &arguments, Output &output) {
+    const Folders folders = ReadFolders();
+    output.Data()["dry_run"] = arguments.Has("--dry-run");
+    output.Data()["folders"] = Json::Value(Json::arrayValue);
+    for (const auto &folder : folders) {
+        output.Data()["folders"].append(folder.path);
+    }
+    const auto paused = PausedShares(SharesOf(folders));
+    output.Data()["paused_shares"] = ToArray({paused.begin(), paused.end()});
+    if (arguments.Has("--dry-run")) {
+        StatePlan(folders, paused, output);
+        output.Note("nothing was done");
+        return ExitStatus::kDone;
+    }
+    if (!paused.empty()) {
+        const bool several = paused.size() > 1;
+        const std::string names = several ? "s " + Enumerate({paused.begin(), paused.end()}) + " are"
+                                          : " " + Quoted(*paused.begin()) + " is";
+        RequireConsent(arguments, "the share" + names + " paused (indexed, but not watched); this has " +
+                                      (several ? "them" : "it") + " watched again");
+    }
+    RequireMayChange();
+    StepReport report = StepReport::Perform(Plan(folders), VORK::FILEINDEX::Folders(),
+                                            [] { return VORK::FILEINDEX::Updater_zol60_beta2(); });
+    MarkDroppedEvents(report);
+    Resume(paused, report);
+    report.Show(output);
+    StateEffect(folders, output);
+    if (report.Status() != ExitStatus::kDone) {
+        output.Error(report.Status(), "this is not done whole; once the cause is mended, repeat the command");
+    }
+    return report.Status();
+}
+
+}  // namespace VORK::FILEINDEXCTL

@@ -1,0 +1,285 @@
+#include "command_line/handlers.h"
+#include "facts/config_lock.h"
+#include "facts/daemon.h"
+#include "facts/paths.h"
+#include "facts/queue_files.h"
+#include "facts/registrations.h"
+#include "report/confirm.h"
+#include "report/failure.h"
+#include "report/steps.h"
+#include "report/text.h"
+#include "verbs/folder_operations.h"
+
+#include <fileindex/folders.h>
+#include <fileindex/index_mgr.h>
+#include <fileindex/paths.h>
+
+#include <vork/search.h>
+#include <vorknotifyd/monitor_queue.h>
+
+#include <sys/stat.h>
+
+#include <algorithm>
+
+namespace VORK::FILEINDEXCTL {
+
+namespace {
+
+using VORK::FILEINDEX::IndexMgr;
+
+constexpr std::string_view kIndexMgr = "index_mgr.cpp";
+
+std::vector<std::string> PathsOf(const std::string &share, const Folders &folders) {
+    std::vector<std::string> paths;
+    for (const auto &folder : folders) {
+        if (ShareOf(folder.path) == share) {
+            paths.push_back(folder.path);
+        }
+    }
+    return paths;
+}
+
+std::vector<std::string> RequireIndexed(const std::string &share, const Folders &folders) {
+    auto paths = PathsOf(share, folders);
+    if (paths.empty()) {
+        throw Failure(ExitStatus::kNoSuchFolder, "no folder of the share \"" + share + "\" is indexed");
+    }
+    return paths;
+}
+
+bool IsWatched(const std::string &share) {
+    try {
+        return ReadRegistrations().count(QueuePathOf(share)) > 0;
+    } catch (const Failure &) {
+        return false;  // nobody can read the file, the monitor neither
+    }
+}
+
+void StateShare(const std::string &share, Output &output) {
+    const auto paths = PathsOf(share, ReadFolders());
+    output.Data()["folders"] = Json::Value(Json::arrayValue);
+    for (const auto &path : paths) {
+        output.Data()["folders"].append(path);
+    }
+    const bool isWatched = IsWatched(share);
+    output.Data()["watched"] = isWatched;
+    output.Line("share " + share + ": " + (paths.empty() ? "no folder is indexed" : Enumerate(paths)) +
+                (isWatched ? ", watched for changes" : ", not watched for changes"));
+}
+
+ExitStatus Finish(ExitStatus status, const std::string &trouble, Output &output) {
+    if (status != ExitStatus::kDone) {
+        output.Error(status, trouble);
+    }
+    return status;
+}
+
+// Folders that both names have keep the settings of the old one only.
+void AskForOverwriting(const Arguments &arguments, const std::vector<std::string> &paths, const Folders &folders,
+                       Output &output) {
+    std::vector<std::string> overwritten;
+    for (const auto &path : paths) {
+        const std::string target = VORK::FILEINDEX::ReplaceShareName(path, arguments.One("NEW"));
+        if (std::any_of(folders.begin(), folders.end(),
+                        [&](const VORK::FILEINDEX::Folder &folder) { return folder.path == target; })) {
+            overwritten.push_back(target);
+        }
+    }
+    output.Data()["overwritten"] = ToArray(overwritten);
+    if (!overwritten.empty()) {
+        RequireConsent(arguments, "this overwrites the settings of " + Enumerate(overwritten) +
+                                      " with those of the share " + Quoted(arguments.One("OLD")));
+    }
+}
+
+// The registration is kept under the queue's path, which a share that is gone cannot be asked for any more. A
+// renamed directory has stayed where it was, so the former path stands beside the new one.
+std::string FormerQueue(const std::string &oldShare, const std::string &newShare) {
+    if (IsSharePresent(oldShare)) {
+        return QueuePathOf(oldShare);
+    }
+    const std::string directory = RequireShare(newShare);
+    return directory.substr(0, directory.rfind('/') + 1) + oldShare +
+           QueuePathOf(newShare).substr(directory.size());
+}
+
+bool WasPaused(const std::string &formerQueue, const std::string &newShare) {
+    try {
+        return IsQueuePaused(formerQueue) && IsQueuePaused(QueuePathOf(newShare));
+    } catch (const Failure &) {
+        return false;  // the step that registers says what is wrong with the file
+    }
+}
+
+// The library leaves the monitor as it was.
+void RefreshMonitor(const std::string &oldShare, const std::string &newShare, Patience &patience,
+                    StepReport &report) {
+    VORK::FILEINDEX::Folders store;
+    ForgetErrors();
+    const ConfigLock lock(store,
+                          patience);  // so that no other writer's newer registration is replaced by an older one
+    if (!lock.IsHeld()) {
+        report.Add("monitor of " + newShare, StepResult::kFailed, "folder.conf is locked by another program");
+        return;
+    }
+    const std::string former = FormerQueue(oldShare, newShare);
+    if (WasPaused(former, newShare)) {
+        report.Add("monitor of " + newShare, StepResult::kSkipped, "the share is paused");
+        return;
+    }
+    const bool registered = IndexMgr::UpsertVorkNotifydCfg(newShare);
+    report.Add("monitor of " + newShare, registered ? StepResult::kDone : StepResult::kFailed,
+               registered ? "" : "it could not be registered");
+    const bool withdrawn =
+        VORKNOTIFYD::MonitorQueue::Delete(former, kRegistration, VORKNOTIFYD::MONITOR_QUEUE_TYPE_FILE);
+    report.Add("monitor of " + oldShare, withdrawn ? StepResult::kDone : StepResult::kFailed,
+               withdrawn ? "" : "it could not be withdrawn");
+}
+
+// Nothing was reached: for lack of permission?
+ExitStatus StatusOf(const StepReport &report, bool isDenied) {
+    return report.Status() == ExitStatus::kUnreachable && isDenied ? ExitStatus::kPermission : report.Status();
+}
+
+void RequireNoLink(const std::string &directory) {
+    struct stat status {};
+    if (lstat(directory.c_str(), &status) == 0 && S_ISLNK(status.st_mode)) {
+        throw Failure(ExitStatus::kCannotSave,
+                      directory + " is a symbolic link, and nothing is deleted through it; remove the link");
+    }
+}
+
+bool Exists(const std::string &path) {
+    struct stat status {};
+    return lstat(path.c_str(), &status) == 0;
+}
+
+}  // namespace
+
+ExitStatus RenameShare(const Arguments &arguments, Output &output) {
+    Patience patience(arguments);
+    const std::string oldShare = arguments.One("OLD");
+    const std::string newShare = arguments.One("NEW");
+    const Folders folders = ReadFolders();
+    const auto paths = RequireIndexed(oldShare, folders);
+    RequireShare(newShare);
+    if (oldShare == newShare) {
+        throw Failure(ExitStatus::kUsage, "both names are \"" + newShare + "\"");
+    }
+    AskForOverwriting(arguments, paths, folders, output);
+    StepReport report = StepReport::Perform({SaveStep()}, VORK::FILEINDEX::Folders(), patience,
+                                            [&] { return IndexMgr::ShareRename(oldShare, newShare); });
+    RefreshMonitor(oldShare, newShare, patience, report);
+    report.Show(output);
+    StateShare(newShare, output);
+    return Finish(report.Status(),
+                  "the folders are moved, but the monitor is not in step; \"fileindexctl share resume " +
+                      ShellWord(newShare) + "\" registers it",
+                  output);
+}
+
+ExitStatus RemoveShare(const Arguments &arguments, Output &output) {
+    Patience patience(arguments);
+    const std::string share = arguments.One("SHARE");
+    const Folders folders = ReadFolders();
+    const auto paths = RequireIndexed(share, folders);
+    const std::string restart = RestartWith(false, paths.size() == folders.size());
+    RequireConsent(arguments, "this removes " + Enumerate(paths) + " from the index" +
+                                  (restart.empty() ? "" : "; ") + restart);
+    AnnounceRestart(restart, output);
+    std::vector<PlannedStep> plan = {SaveStep()};
+    if (paths.size() == folders.size()) {
+        plan.push_back({"service", "fileindexd could not be stopped", {}, {{kIndexMgr, 535}}});
+        plan.push_back({"search setting",
+                        "the search setting did not take effect",
+                        {},
+                        {{kIndexMgr, 540}, {kIndexMgr, 542}}});
+    }
+    const bool searchWasOn = VORKSMBIsEnableSpotlight() != 0;
+    StepReport report = StepReport::Perform(plan, VORK::FILEINDEX::Folders(), patience,
+                                            [&] { return IndexMgr::ShareRemove(share); });
+    if (!searchWasOn) {
+        report.Correct("search setting", StepResult::kAlready);
+    }
+    report.Show(output);
+    StateShare(share, output);
+    if (IsSharePresent(share)) {
+        output.Warn("the share \"" + share +
+                    "\" keeps its monitor (\"fileindexctl share pause\" withdraws it) and its "
+                    "index data (\"fileindexctl share clean\" deletes it)");
+    }
+    return report.Status();
+}
+
+ExitStatus PauseShare(const Arguments &arguments, Output &output) {
+    const std::string share = arguments.One("SHARE");
+    RequireShare(share);
+    const std::vector<PlannedStep> plan = {
+        {"worker stopped", "fileindexd cannot be reached", {}, {}, Evidence::kNone},
+        {"monitor", "it could not be withdrawn", {{kIndexMgr, 484}}},
+    };
+    const StepReport report =
+        StepReport::Perform(plan, VORK::FILEINDEX::Folders(), [&] { return IndexMgr::SharePause(share); });
+    report.Show(output);
+    StateShare(share, output);
+    const bool isDenied = ProbeDaemon().condition == DaemonCondition::kDenied;
+    return Finish(
+        StatusOf(report, isDenied),
+        "the share \"" + share + "\" is not wholly at rest; once the cause is mended, repeat the command", output);
+}
+
+ExitStatus ResumeShare(const Arguments &arguments, Output &output) {
+    const std::string share = arguments.One("SHARE");
+    RequireShare(share);
+    const std::vector<PlannedStep> plan = {
+        {"monitor", "it could not be registered", {{kIndexMgr, 501}}},
+        {"worker started", "fileindexd cannot be reached", {}, {}, Evidence::kNone},
+    };
+    const StepReport report =
+        StepReport::Perform(plan, VORK::FILEINDEX::Folders(), [&] { return IndexMgr::ShareResume(share); });
+    report.Show(output);
+    StateShare(share, output);
+    return Finish(
+        StatusOf(report, MayNotWrite(kRegistrationsFile)),
+        "the share \"" + share + "\" is not wholly at work; once the cause is mended, repeat the command", output);
+}
+
+ExitStatus CleanShare(const Arguments &arguments, Output &output) {
+    const std::string share = arguments.One("SHARE");
+    RequireShare(share);
+    const std::string queue = QueuePathOf(share);
+    const std::string directory = queue.substr(0, queue.rfind('/'));
+    RequireNoLink(directory);
+    if (IndexMgr::IsShareIndexed(share)) {
+        output.Warn("folders of the share \"" + share +
+                    "\" are indexed; pause the share before, reindex them after");
+    }
+    RequireConsent(arguments,
+                   "this deletes the event queue and the index database of the share \"" + share + "\"");
+
+    const std::pair<const char *, std::string> files[] = {
+        {"queue", queue}, {"queue .tmp", queue + ".tmp"}, {"database", directory + "/VORK@.fileindexdb"}};
+    StepReport report;
+    for (const auto &[name, path] : files) {
+        report.Add(name, Exists(path) ? StepResult::kDone : StepResult::kAlready);
+    }
+    ForgetErrors();
+    IndexMgr::CleanShareIndexData(share);
+    // The library does not look at what the deleting came to, so this does.
+    for (const auto &[name, path] : files) {
+        if (Exists(path)) {
+            report.Correct(name, StepResult::kFailed, path + " is still there");
+        }
+    }
+    report.Show(output);
+    if (!report.Has(StepResult::kFailed)) {
+        output.Line("share " + share + ": no index data");
+        return ExitStatus::kDone;
+    }
+    const ExitStatus none = MayNotWrite(queue) ? ExitStatus::kPermission : ExitStatus::kCannotSave;
+    const ExitStatus status = report.Has(StepResult::kDone) ? ExitStatus::kPartly : none;
+    output.Error(status, "not everything could be deleted");
+    return status;
+}
+
+}  // namespace VORK::FILEINDEXCTL
