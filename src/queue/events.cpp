@@ -6,12 +6,12 @@
 #include "names.h"
 #include "no_throw.h"
 #include "share/location.h"
+#include "status/access.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/error.h>
 #include <fileindex/fileidx.h>
 #include <fileindex/paths.h>
-#include <fileindex/status_mgr.h>
 
 #include <vork/share.h>
 
@@ -180,7 +180,7 @@ bool QueueOrMark(int type, const std::string &fullPath, const Json::Value &data,
         return true;
     }
     // Outside every share the name is empty; the mark is then the only trace of the lost event.
-    if (!StatusMgr::ShareSetNeedReindex(share, true)) {
+    if (!ChangeStatus([&](Status &status) { return status.ShareSetNeedReindex(share, true); })) {
         syslog(LOG_ERR, "%s:%d ShareSetNeedReindex failed, share=%s", kUtilsModule, 522, share.c_str());
     }
     return false;

@@ -1,12 +1,10 @@
-#include "base/json/text.h"
-#include "config/unlocker.h"
 #include "names.h"
 #include "no_throw.h"
 #include "share/location.h"
+#include "status/access.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/error.h>
-#include <fileindex/status.h>
 #include <fileindex/status_mgr.h>
 
 #include <json/value.h>
@@ -40,29 +38,6 @@ struct Announcement {
     }
 };
 
-/// Lock, load, change, save, announce while the lock is held, unlock. Content of an unexpected type makes the
-/// JSON library throw in `change`: then nothing is saved or sent.
-template <typename Operation>
-bool Change(Operation change, const Announcement *announcement = nullptr) {
-    return NoThrow([&] {
-        Status status;
-        const ConfigUnlocker unlocker(status);
-        if (!status.Lock(true) || !status.Load() || !change(status) || !status.Save()) {
-            return false;
-        }
-        return announcement == nullptr || announcement->Send();
-    });
-}
-
-/// Without a lock: a save never shows a reader anything but a whole file.
-template <typename Operation>
-bool Ask(Operation ask) {
-    return NoThrow([&] {
-        Status status;
-        return status.Load() && ask(status);
-    });
-}
-
 /// In 32 bits, as the daemon reckons it: an end past January 2038 wraps to the past, and the daemon resumes at
 /// once instead of never.
 long long ResumeTimeIn(int hours) {
@@ -90,51 +65,53 @@ bool StatusMgr::Pause(const int &hours) {
         const long long resumeTime = ResumeTimeIn(hours);
         const Announcement pause = {kPauseCommand, Object(kResumeTimeKey, static_cast<Json::Int64>(resumeTime)),
                                     198};
-        return Change([&](Status &status) { return status.Pause(resumeTime); }, &pause);
+        return ChangeStatus([&](Status &status) { return status.Pause(resumeTime); },
+                            [&] { return pause.Send(); });
     });
 }
 
 bool StatusMgr::Resume() {
     return NoThrow([] {
         const Announcement resume = {kResumeCommand, Json::Value(Json::objectValue), 221};
-        return Change([](Status &status) { return status.Resume(); }, &resume);
+        return ChangeStatus([](Status &status) { return status.Resume(); }, [&] { return resume.Send(); });
     });
 }
 
 bool StatusMgr::GetPauseInfo(long long &resumeTime) {
-    return Ask([&](Status &status) { return status.GetPauseInfo(resumeTime); });
+    return AskStatus([&](Status &status) { return status.GetPauseInfo(resumeTime); });
 }
 
 bool StatusMgr::ShareSetNoSpace(const std::string &share, bool noSpace) {
-    return Change([&](Status &status) { return status.ShareSetNoSpace(share, noSpace); });
+    return ChangeStatus([&](Status &status) { return status.ShareSetNoSpace(share, noSpace); });
 }
 
 bool StatusMgr::ShareIsNoSpace(const std::string &share) {
-    return Ask([&](Status &status) { return status.ShareIsNoSpace(share); });
+    return AskStatus([&](Status &status) { return status.ShareIsNoSpace(share); });
 }
 
 bool StatusMgr::ShareRevive(const std::string &share) {
     return NoThrow([&] {
         // The daemon may take a name with a NUL for that of another share.
         const Announcement revive = {kReviveShareCommand, Object(kShareNameKey, share), 321, !HasNul(share)};
-        return Change([&](Status &status) { return status.ShareSetNoSpace(share, false); }, &revive);
+        return ChangeStatus([&](Status &status) { return status.ShareSetNoSpace(share, false); },
+                            [&] { return revive.Send(); });
     });
 }
 
 bool StatusMgr::ShareSetNeedReindex(const std::string &share, bool needReindex) {
-    return Change([&](Status &status) { return status.ShareSetNeedReindex(share, needReindex); });
+    return ChangeStatus([&](Status &status) { return status.ShareSetNeedReindex(share, needReindex); });
 }
 
 bool StatusMgr::ShareIsNeedReindex(const std::string &share) {
-    return Ask([&](Status &status) { return status.ShareIsNeedReindex(share); });
+    return AskStatus([&](Status &status) { return status.ShareIsNeedReindex(share); });
 }
 
 bool StatusMgr::SetUpdated(const std::string &key) {
-    return Change([&](Status &status) { return status.SetUpdated(key); });
+    return ChangeStatus([&](Status &status) { return status.SetUpdated(key); });
 }
 
 bool StatusMgr::IsUpdated(const std::string &key) {
-    return Ask([&](Status &status) { return status.IsUpdated(key); });
+    return AskStatus([&](Status &status) { return status.IsUpdated(key); });
 }
 
 }  // namespace FILEINDEX
