@@ -1,7 +1,7 @@
 // Any paths: the path functions and the rule of coverage against their definitions.
 
 #include "checks.h"
-#include "folders/coverage.h"
+#include "share/at_or_under.h"
 
 #include <fileindex/folder.h>
 #include <fileindex/index_mgr.h>

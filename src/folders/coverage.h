@@ -1,8 +1,9 @@
 /// \file
-/// Which folder covers which path: the one rule of comparison, and the choice among several folders.
+/// Which folder covers which full path, and which of several governs it.
 #pragma once
 
 #include "folders/folder_access.h"
+#include "share/at_or_under.h"
 
 #include <fileindex/folder.h>
 
@@ -10,15 +11,6 @@
 #include <string_view>
 
 namespace VORK::FILEINDEX::internal {
-
-/// Does `path` + "/" start with `folder` + "/"? So "/photo/2019" holds itself and "/photo/2019/x", not
-/// "/photo/20190". Bytes are compared, nothing is normalised.
-inline bool IsAtOrUnder(std::string_view path, std::string_view folder) {
-    if (path.size() > folder.size() && path[folder.size()] != '/') {
-        return false;  // settles most comparisons without looking at the folder's text
-    }
-    return path.starts_with(folder);
-}
 
 /// Does the folder cover the full path? One that could not be resolved covers none; compared by the rule above
 /// its empty path would cover all.

@@ -2,13 +2,13 @@
 #include "base/json/text.h"
 #include "folders/folder_access.h"
 #include "names.h"
+#include "progress/progress.h"
 
 #include <fileindex/error.h>
 #include <fileindex/folder.h>
 #include <fileindex/indexability.h>
 #include <fileindex/json_access.h>
 #include <fileindex/paths.h>
-#include <fileindex/status_mgr.h>
 
 #include <syslog.h>
 
@@ -83,7 +83,7 @@ bool Folder::AddToJson(Json::Value &obj) const {
 
 bool Folder::GetAdditional(Json::Value &out, const std::string &key) const {
     if (key == "status") {
-        out = StatusMgr::GetFolderStatus(path);
+        out = internal::FolderProgress(path);
         return true;
     }
     if (key == "is_valid") {

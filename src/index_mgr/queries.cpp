@@ -3,6 +3,7 @@
 #include "folders/folder_access.h"
 #include "names.h"
 #include "no_throw.h"
+#include "share/at_or_under.h"
 
 #include <fileindex/fileidx.h>
 #include <fileindex/folders.h>

@@ -1,0 +1,92 @@
+#include "progress/progress.h"
+
+#include "names.h"
+#include "no_throw.h"
+#include "queue/queue_file.h"
+#include "share/at_or_under.h"
+#include "share/location.h"
+#include "status/access.h"
+
+#include <fileindex/indexability.h>
+#include <fileindex/paths.h>
+
+#include <syslog.h>
+
+#include <ctime>
+#include <string_view>
+
+namespace VORK::FILEINDEX::internal {
+
+namespace {
+
+/// Does the queue file hold an event at or under the folder (a share path)?
+///
+/// A rename counts for its old place too. That place is kept for all later lines until the next rename: the
+/// daemon works the lines off in order and may still be moving entries out of it.
+bool IsPathInQueue(const std::string &path, const std::string &queueFile) {
+    if (!IsFileExist(queueFile)) {
+        return false;
+    }
+    std::string fullPath;
+    if (!GetFullPath(fullPath, path)) {
+        syslog(LOG_ERR, "%s:%d Cannot get full path: %s", kStatusMgrModule, 30, path.c_str());
+        return false;
+    }
+    bool found = false;
+    std::string oldPath;
+    const bool opened = ScanQueue(queueFile, [&](std::string_view line, const QueueEvent *event) {
+        if (event == nullptr) {
+            syslog(LOG_ERR, "%s:%d Malformed command: %s", kStatusMgrModule, 47, std::string(line).c_str());
+            return true;
+        }
+        if (event->type == kRenameEvent) {
+            oldPath = event->oldPath;
+        }
+        found = found || IsAtOrUnder(event->path, fullPath) || IsAtOrUnder(oldPath, fullPath);
+        return true;  // to the end, so that every malformed line is recorded
+    });
+    if (!opened) {
+        syslog(LOG_ERR, "%s:%d Failed to open queue=%s, reason=%m", kStatusMgrModule, 37, queueFile.c_str());
+    }
+    return found;
+}
+
+std::string Progress(const std::string &path) {
+    if (!CanPathBeIndexed(path)) {
+        return kPaused;  // for the user it is waiting, not broken
+    }
+    std::string share;
+    if (!GetShareNameByPath(share, path)) {
+        syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", kStatusMgrModule, 88, path.c_str());
+        return kFinished;
+    }
+    if (AskStatus([&](Status &status) { return status.ShareIsNoSpace(share); })) {
+        return kNoSpace;
+    }
+    char buffer[kPathSize] = {};
+    if (QueuePathOf(share, buffer) < 0) {
+        syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kStatusMgrModule, 100, share.c_str());
+        return kFinished;
+    }
+    const std::string queue = buffer;
+    long long resumeTime = -1;
+    (void)AskStatus(
+        [&](Status &status) { return status.GetPauseInfo(resumeTime); });  // unreadable reads as not paused
+    if (!IsPathInQueue(path, queue) && !IsPathInQueue(path, queue + kQueueTmpSuffix)) {
+        return kFinished;
+    }
+    return ProgressOfWork(resumeTime);
+}
+
+}  // namespace
+
+const char *ProgressOfWork(long long resumeTime) {
+    const bool paused = resumeTime == 0 || time(nullptr) < resumeTime;
+    return paused ? kPaused : kProcessing;
+}
+
+std::string FolderProgress(const std::string &path) {
+    return NoThrow([&] { return Progress(path); }, kFinished);
+}
+
+}  // namespace VORK::FILEINDEX::internal
