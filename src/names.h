@@ -7,15 +7,6 @@
 
 namespace VORK::FILEINDEX::internal {
 
-// Modules as the log records name them, also where a module is a folder of files.
-inline constexpr char kConfigModule[] = "config.cpp";
-inline constexpr char kFolderModule[] = "folder.cpp";
-inline constexpr char kFoldersModule[] = "folders.cpp";
-inline constexpr char kStatusModule[] = "status.cpp";
-inline constexpr char kStatusMgrModule[] = "status_mgr.cpp";
-inline constexpr char kIndexMgrModule[] = "index_mgr.cpp";
-inline constexpr char kUtilsModule[] = "utils.cpp";
-
 // Configuration files.
 inline constexpr char kFolderConf[] = "/usr/vork/etc/fileindex/folder.conf";
 inline constexpr char kFolderLock[] = "/tmp/fileidx_cfg_folder.lock";
@@ -66,11 +57,6 @@ inline constexpr int kMonitorMask = 0xFFCE;  // every change and move; not acces
 // Buffers of the platform's share library.
 inline constexpr int kShareNameSize = 492;
 inline constexpr int kPathSize = 4096;
-
-// Platform errors.
-inline constexpr int kPlatformBadParameter = 0x0D00;
-inline constexpr int kPlatformNoSpace = 0x2900;
-inline constexpr int kPlatformQuota = 0x2400;
 
 inline constexpr int kDebugLevel = 7;
 

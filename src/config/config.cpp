@@ -1,7 +1,7 @@
 #include "base/json/text.h"
 #include "base/unique_fd.h"
 #include "config/load_save.h"
-#include "names.h"
+#include "records.h"
 
 #include <fileindex/config.h>
 #include <fileindex/error.h>

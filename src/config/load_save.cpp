@@ -1,8 +1,8 @@
 #include "config/load_save.h"
 
 #include "config/in_place_file.h"
-#include "names.h"
 #include "no_throw.h"
+#include "records.h"
 
 #include <fileindex/error.h>
 

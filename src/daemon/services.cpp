@@ -13,7 +13,7 @@ namespace {
 
 constexpr int kServiceFlag = 1;  // the platform's
 
-bool RestartFileSharing(const RecordAt &failure) {
+bool RestartFileSharing(const Record &failure) {
     if (VLIBServiceRestart(kFileSharingService) < 0) {
         const PlatformError error;
         syslog(LOG_ERR, "%s:%d VLIBServiceRestart failed: err=[0x%04X %s:%d]", failure.module, failure.line,
@@ -25,7 +25,7 @@ bool RestartFileSharing(const RecordAt &failure) {
 
 }  // namespace
 
-bool StartDaemon(const RecordAt &failure) {
+bool StartDaemon(const Record &failure) {
     if (VLIBServiceStart(kDaemonService, kServiceFlag) < 0) {
         const PlatformError error;
         syslog(LOG_ERR, "%s:%d VLIBServiceStart failed: err=[0x%04X %s:%d]", failure.module, failure.line,
@@ -35,7 +35,7 @@ bool StartDaemon(const RecordAt &failure) {
     return true;
 }
 
-bool StopDaemon(const RecordAt &failure) {
+bool StopDaemon(const Record &failure) {
     if (VLIBServiceStop(kDaemonService, kServiceFlag) < 0) {
         const PlatformError error;
         syslog(LOG_ERR, "%s:%d VLIBServiceStop failed: err=[0x%04X %s:%d]", failure.module, failure.line,
@@ -45,7 +45,7 @@ bool StopDaemon(const RecordAt &failure) {
     return true;
 }
 
-bool SetSearch(bool on, const RecordAt &failure) {
+bool SetSearch(bool on, const Record &failure) {
     if (VORKSMBSetSpotlight(on ? 1 : 0) < 0) {
         const PlatformError error;
         syslog(LOG_ERR, "%s:%d VORKSMBSetSpotlight failed: err=[0x%04X %s:%d]", failure.module, failure.line,
@@ -55,7 +55,7 @@ bool SetSearch(bool on, const RecordAt &failure) {
     return true;
 }
 
-void EnsureSearch(bool on, const RecordAt &setFailure, const RecordAt &restartFailure) {
+void EnsureSearch(bool on, const Record &setFailure, const Record &restartFailure) {
     const bool isOn = VORKSMBIsEnableSpotlight() != 0;
     if (isOn == on) {
         return;

@@ -3,6 +3,7 @@
 #include "folders/folder_access.h"
 #include "names.h"
 #include "progress/progress.h"
+#include "records.h"
 
 #include <fileindex/error.h>
 #include <fileindex/folder.h>

@@ -2,7 +2,7 @@
 #include "config/load_save.h"
 #include "folders/folder_access.h"
 #include "json/ordinary.h"
-#include "names.h"
+#include "records.h"
 
 #include <fileindex/error.h>
 #include <fileindex/folders.h>

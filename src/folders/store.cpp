@@ -3,6 +3,7 @@
 #include "folders/folder_access.h"
 #include "names.h"
 #include "no_throw.h"
+#include "records.h"
 
 #include <fileindex/error.h>
 #include <fileindex/folders.h>

@@ -2,6 +2,7 @@
 
 #include "names.h"
 #include "no_throw.h"
+#include "records.h"
 
 #include <fileindex/error.h>
 #include <fileindex/index_mgr.h>
@@ -23,12 +24,13 @@ PendingReindexes PendingReindexesOf(const Json::Value &reports) {
 bool UpdateOne(PendingReindexes &pending, const std::string &path, const Json::Value &data) {
     std::string fullPath;
     if (!GetFullPath(fullPath, path)) {
-        syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", kIndexMgrModule, 430, path.c_str());
+        syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", records::kUpdatePath.module,
+               records::kUpdatePath.line, path.c_str());
         ErrorHandler::SetError(FILEINDEX_ERR_PATH);
         return false;
     }
     if (!AddEvent(pending, kSettingEvent, fullPath, path, data)) {
-        syslog(LOG_ERR, "%s:%d AddCustomEvent failed", kIndexMgrModule, 436);
+        syslog(LOG_ERR, "%s:%d AddCustomEvent failed", records::kUpdateEvent.module, records::kUpdateEvent.line);
         if (!CanBeQueued(data)) {
             ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);
         }

@@ -2,6 +2,7 @@
 #include "folders/folder_access.h"
 #include "names.h"
 #include "no_throw.h"
+#include "records.h"
 #include "share/location.h"
 
 #include <fileindex/folders.h>
@@ -32,7 +33,8 @@ bool WatchList(Json::Value &config, const std::vector<Folder> &folders) {
     for (const Folder &folder : folders) {
         std::string fullPath;
         if (!GetFullPath(fullPath, folder.path)) {
-            syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", kIndexMgrModule, 297, folder.path.c_str());
+            syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", records::kMonitorFolder.module,
+                   records::kMonitorFolder.line, folder.path.c_str());
             return false;
         }
         Json::Value entry(Json::objectValue);
@@ -50,7 +52,8 @@ bool IndexMgr::UpsertVorkNotifydCfg(const std::string &share) {
     return NoThrow([&] {
         char queuePath[kPathSize] = {};
         if (QueuePathOf(share, queuePath) < 0) {
-            syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kIndexMgrModule, 286, share.c_str());
+            syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", records::kMonitorQueue.module,
+                   records::kMonitorQueue.line, share.c_str());
             return false;
         }
         Folders store;
@@ -67,13 +70,14 @@ bool IndexMgr::UpsertVorkNotifydCfg(const std::string &share) {
         jsQueue["config"] = config;
         const std::unique_ptr<MonitorQueue> queue(new (std::nothrow) MonitorQueue(jsQueue));
         if (!queue) {
-            syslog(LOG_ERR, "%s:%d Failed to create MonitorQueue, jsQueue=%s", kIndexMgrModule, 317,
-                   ToString(jsQueue).c_str());
+            syslog(LOG_ERR, "%s:%d Failed to create MonitorQueue, jsQueue=%s", records::kMonitorMemory.module,
+                   records::kMonitorMemory.line, ToString(jsQueue).c_str());
             return false;
         }
         if (!MonitorQueue::Upsert(*queue, kMonitorName, kQueueType)) {
             // The words say Add although the call is an upsert; support tools know the record by them.
-            syslog(LOG_ERR, "%s:%d MonitorQueue::Add failed", kIndexMgrModule, 324);
+            syslog(LOG_ERR, "%s:%d MonitorQueue::Add failed", records::kMonitorRefused.module,
+                   records::kMonitorRefused.line);
             return false;
         }
         return true;
@@ -84,11 +88,13 @@ bool IndexMgr::DeleteVorkNotifydCfg(const std::string &share) {
     return NoThrow([&] {
         char queuePath[kPathSize] = {};
         if (QueuePathOf(share, queuePath) < 0) {
-            syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kIndexMgrModule, 344, share.c_str());
+            syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", records::kWithdrawQueue.module,
+                   records::kWithdrawQueue.line, share.c_str());
             return false;
         }
         if (!MonitorQueue::Delete(queuePath, kMonitorName, kQueueType)) {
-            syslog(LOG_ERR, "%s:%d MonitorQueue::Delete failed", kIndexMgrModule, 350);
+            syslog(LOG_ERR, "%s:%d MonitorQueue::Delete failed", records::kWithdrawRefused.module,
+                   records::kWithdrawRefused.line);
             return false;
         }
         return true;

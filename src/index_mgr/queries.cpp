@@ -1,8 +1,8 @@
 #include "config/unlocker.h"
 #include "folders/coverage.h"
 #include "folders/folder_access.h"
-#include "names.h"
 #include "no_throw.h"
+#include "records.h"
 #include "share/at_or_under.h"
 
 #include <fileindex/fileidx.h>

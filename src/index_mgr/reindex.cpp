@@ -3,6 +3,7 @@
 #include "names.h"
 #include "no_throw.h"
 #include "queue/events.h"
+#include "records.h"
 
 #include <fileindex/error.h>
 #include <fileindex/index_mgr.h>
@@ -21,8 +22,8 @@ using namespace internal;
 
 namespace {
 
-bool Malformed(const Json::Value &what, int line) {
-    syslog(LOG_ERR, "%s:%d Malformed jsArrPath: %s", kIndexMgrModule, line, ToString(what).c_str());
+bool Malformed(const Json::Value &what, const Record &record) {
+    syslog(LOG_ERR, "%s:%d Malformed jsArrPath: %s", record.module, record.line, ToString(what).c_str());
     ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);
     return false;
 }
@@ -32,12 +33,13 @@ bool Check(const Json::Value &paths, std::set<std::string> &outOfSpace) {
     std::set<std::string> indexed;  // one look at folder.conf for each share, however many paths it has
     for (const Json::Value &element : Elements(paths)) {
         if (!element.isString()) {
-            return Malformed(element, 377);
+            return Malformed(element, records::kReindexElement);
         }
         const std::string path = element.asString();
         std::string share;
         if (!GetShareNameByPath(share, path)) {
-            syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", kIndexMgrModule, 384, path.c_str());
+            syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", records::kReindexShare.module,
+                   records::kReindexShare.line, path.c_str());
             return false;
         }
         if (!indexed.contains(share) && !IndexMgr::IsShareIndexed(share)) {
@@ -65,7 +67,7 @@ std::vector<std::string> Strings(const Json::Value &array) {
 bool IndexMgr::Reindex(const Json::Value &jsArrPath) {
     return NoThrow([&] {
         if (!jsArrPath.isArray()) {
-            return Malformed(jsArrPath, 369);
+            return Malformed(jsArrPath, records::kReindexRequest);
         }
         std::set<std::string> outOfSpace;
         if (!Check(jsArrPath, outOfSpace)) {
@@ -74,7 +76,8 @@ bool IndexMgr::Reindex(const Json::Value &jsArrPath) {
         for (const std::string &share : outOfSpace) {
             if (!StatusMgr::ShareRevive(share)) {
                 // The events below are worth queuing even so: the daemon finds them when the share is revived.
-                syslog(LOG_ERR, "%s:%d ShareRevice failed, share=%s", kIndexMgrModule, 400, share.c_str());
+                syslog(LOG_ERR, "%s:%d ShareRevice failed, share=%s", records::kReindexRevive.module,
+                       records::kReindexRevive.line, share.c_str());
             }
         }
         PendingReindexes pending(Strings(jsArrPath));
@@ -82,12 +85,14 @@ bool IndexMgr::Reindex(const Json::Value &jsArrPath) {
             const std::string path = element.asString();
             std::string fullPath;
             if (!GetFullPath(fullPath, path)) {
-                syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", kIndexMgrModule, 407, path.c_str());
+                syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", records::kReindexPath.module,
+                       records::kReindexPath.line, path.c_str());
                 ErrorHandler::SetError(FILEINDEX_ERR_PATH);
                 return false;
             }
             if (!AddEvent(pending, kReindexEvent, fullPath, path, Json::Value())) {
-                syslog(LOG_ERR, "%s:%d AddCustomEvent failed, path=%s", kIndexMgrModule, 413, path.c_str());
+                syslog(LOG_ERR, "%s:%d AddCustomEvent failed, path=%s", records::kReindexEvent.module,
+                       records::kReindexEvent.line, path.c_str());
                 return false;
             }
         }

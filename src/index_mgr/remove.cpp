@@ -8,6 +8,7 @@
 #include "index_mgr/stop_indexing.h"
 #include "names.h"
 #include "no_throw.h"
+#include "records.h"
 #include "share/location.h"
 
 #include <fileindex/daemon.h>
@@ -25,10 +26,11 @@ using namespace internal;
 
 namespace {
 
-constexpr StopIndexingLines kStopLines = {89, 94, 96};
+constexpr StopRecords kStopRecords = {records::kDeleteStop, records::kDeleteSearch, records::kDeleteRestart};
 
 bool BadParam(const Json::Value &what) {
-    syslog(LOG_ERR, "%s:%d Bad param: %s", kIndexMgrModule, 61, ToString(what).c_str());
+    syslog(LOG_ERR, "%s:%d Bad param: %s", records::kDeleteRequest.module, records::kDeleteRequest.line,
+           ToString(what).c_str());
     ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);
     return false;
 }
@@ -42,13 +44,15 @@ bool DeleteAll(Folders &store, const Json::Value &paths, Changes &changes) {
         const std::string path = element.asString();
         Json::Value report;
         if (!store.Delete(report, path)) {
-            syslog(LOG_ERR, "%s:%d Delete failed, path=%s", kIndexMgrModule, 73, path.c_str());
+            syslog(LOG_ERR, "%s:%d Delete failed, path=%s", records::kDeleteElement.module,
+                   records::kDeleteElement.line, path.c_str());
             return false;
         }
         changes.reports[path] = report;
         std::string share;
         if (!GetShareNameByPath(share, path)) {
-            syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", kIndexMgrModule, 79, path.c_str());
+            syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", records::kDeleteShare.module,
+                   records::kDeleteShare.line, path.c_str());
             return false;
         }
         changes.shares.insert(share);
@@ -64,7 +68,8 @@ bool SendCommands(const Json::Value &paths) {
         }
         command[kFolderPathKey] = path.asString();
         if (!SendCammandToDaemon(kDeleteCommand, command)) {
-            syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", kIndexMgrModule, 104);
+            syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", records::kDeleteSend.module,
+                   records::kDeleteSend.line);
             return false;
         }
     }
@@ -75,7 +80,7 @@ bool QueueEvents(const Json::Value &reports) {
     PendingReindexes pending = PendingReindexesOf(reports);
     for (auto report = reports.begin(); report != reports.end(); ++report) {
         if (!UpdateOne(pending, report.name(), *report)) {
-            syslog(LOG_ERR, "%s:%d Update failed", kIndexMgrModule, 111);
+            syslog(LOG_ERR, "%s:%d Update failed", records::kDeleteEvent.module, records::kDeleteEvent.line);
             return false;
         }
     }
@@ -87,21 +92,25 @@ bool FollowShare(Folders &saved, const std::string &share) {
         if (IndexMgr::UpsertVorkNotifydCfg(share)) {
             return true;
         }
-        syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", kIndexMgrModule, 121, share.c_str());
+        syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", records::kDeleteMonitor.module,
+               records::kDeleteMonitor.line, share.c_str());
         return false;
     }
     // "No" can also mean that folder.conf could not be read again. Cleaning then would delete the index of a share
     // that is in use; what was just saved decides.
     if (!FoldersOf(saved, share).empty()) {
-        syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", kIndexMgrModule, 121, share.c_str());
+        syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", records::kDeleteMonitor.module,
+               records::kDeleteMonitor.line, share.c_str());
         return false;
     }
     if (!IndexMgr::CleanShareIndexData(share)) {
-        syslog(LOG_ERR, "%s:%d CleanShareIndexData failed, share=%s", kIndexMgrModule, 126, share.c_str());
+        syslog(LOG_ERR, "%s:%d CleanShareIndexData failed, share=%s", records::kDeleteClean.module,
+               records::kDeleteClean.line, share.c_str());
         return false;
     }
     if (!IndexMgr::DeleteVorkNotifydCfg(share)) {
-        syslog(LOG_ERR, "%s:%d DeleteVorkNtifydCfg failed, share=%s", kIndexMgrModule, 130, share.c_str());
+        syslog(LOG_ERR, "%s:%d DeleteVorkNtifydCfg failed, share=%s", records::kDeleteWithdraw.module,
+               records::kDeleteWithdraw.line, share.c_str());
         return false;
     }
     return true;
@@ -122,7 +131,7 @@ bool IndexMgr::Delete(const Json::Value &paths) {
             return false;
         }
         if (IsEmpty(store)) {
-            StopIndexing(kStopLines);  // nobody is left to hear of commands and events
+            StopIndexing(kStopRecords);  // nobody is left to hear of commands and events
         } else if (!SendCommands(paths) || !QueueEvents(changes.reports)) {
             return false;
         }

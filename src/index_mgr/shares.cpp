@@ -4,6 +4,7 @@
 #include "index_mgr/stop_indexing.h"
 #include "names.h"
 #include "no_throw.h"
+#include "records.h"
 #include "share/location.h"
 
 #include <fileindex/daemon.h>
@@ -25,7 +26,8 @@ using namespace internal;
 
 namespace {
 
-constexpr StopIndexingLines kStopLines = {535, 540, 542};
+constexpr StopRecords kStopRecords = {records::kShareRemoveStop, records::kShareRemoveSearch,
+                                      records::kShareRemoveRestart};
 
 bool SendShareCommand(const char *command, const std::string &share) {
     Json::Value data(Json::objectValue);
@@ -83,7 +85,7 @@ bool IndexMgr::ShareRemove(const std::string &share) {
             return false;
         }
         if (IsEmpty(store)) {
-            StopIndexing(kStopLines);
+            StopIndexing(kStopRecords);
         }
         return true;
     });
@@ -97,7 +99,8 @@ bool IndexMgr::SharePause(const std::string &share) {
             return false;
         }
         if (!DeleteVorkNotifydCfg(share)) {
-            syslog(LOG_ERR, "%s:%d DeleteVorkNotifydCfg failed, share=%s", kIndexMgrModule, 484, share.c_str());
+            syslog(LOG_ERR, "%s:%d DeleteVorkNotifydCfg failed, share=%s", records::kSharePauseWithdraw.module,
+                   records::kSharePauseWithdraw.line, share.c_str());
             return false;
         }
         return true;
@@ -107,7 +110,8 @@ bool IndexMgr::SharePause(const std::string &share) {
 bool IndexMgr::ShareResume(const std::string &share) {
     return NoThrow([&] {
         if (!UpsertVorkNotifydCfg(share)) {
-            syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", kIndexMgrModule, 501, share.c_str());
+            syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", records::kShareResumeMonitor.module,
+                   records::kShareResumeMonitor.line, share.c_str());
             return false;
         }
         return SendShareCommand(kReviveShareCommand, share);
@@ -118,13 +122,15 @@ bool IndexMgr::CleanShareIndexData(const std::string &share) {
     return NoThrow([&] {
         char location[kPathSize] = {};
         if (!IsWhole(QueuePathOf(share, location))) {
-            syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kIndexMgrModule, 653, share.c_str());
+            syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", records::kCleanQueue.module,
+                   records::kCleanQueue.line, share.c_str());
             return false;
         }
         Remove(location);
         Remove(std::string(location) + kQueueTmpSuffix);
         if (!IsWhole(FILEIDXDBPathGet(share.c_str(), location, sizeof(location)))) {
-            syslog(LOG_ERR, "%s:%d FILEIDXDBPathGet failed, share=%s", kIndexMgrModule, 661, share.c_str());
+            syslog(LOG_ERR, "%s:%d FILEIDXDBPathGet failed, share=%s", records::kCleanDatabase.module,
+                   records::kCleanDatabase.line, share.c_str());
             return false;
         }
         Remove(location);

@@ -2,7 +2,6 @@
 
 #include "daemon/services.h"
 #include "folders/folder_access.h"
-#include "names.h"
 
 namespace VORK::FILEINDEX::internal {
 
@@ -10,9 +9,9 @@ bool IsEmpty(const Folders &store) {
     return FolderAccess::All(store).empty();
 }
 
-void StopIndexing(const StopIndexingLines &lines) {
-    (void)StopDaemon({kIndexMgrModule, lines.stop});
-    EnsureSearch(false, {kIndexMgrModule, lines.setSearch}, {kIndexMgrModule, lines.restart});
+void StopIndexing(const StopRecords &failures) {
+    (void)StopDaemon(failures.stop);
+    EnsureSearch(false, failures.setSearch, failures.restart);
 }
 
 }  // namespace VORK::FILEINDEX::internal

@@ -2,6 +2,7 @@
 #include "folders/folder_access.h"
 #include "names.h"
 #include "no_throw.h"
+#include "records.h"
 
 #include <fileindex/folders.h>
 #include <fileindex/index_mgr.h>
@@ -29,13 +30,13 @@ bool StopIndexing() {
     }
     // The words name the start although the stop failed; support tools know the record by them.
     const PlatformError error;
-    syslog(LOG_ERR, "%s:%d VLIBServiceStart failed: err=[0x%04X %s:%d]", kUtilsModule, 641, error.code, error.file,
-           error.line);
+    syslog(LOG_ERR, "%s:%d VLIBServiceStart failed: err=[0x%04X %s:%d]", records::kUpgradeStop.module,
+           records::kUpgradeStop.line, error.code, error.file, error.line);
     return false;
 }
 
 bool StartIndexing(const std::vector<Folder> &folders) {
-    if (!StartDaemon({kUtilsModule, 650}) || !SetSearch(!folders.empty(), {kUtilsModule, 654})) {
+    if (!StartDaemon(records::kUpgradeStart) || !SetSearch(!folders.empty(), records::kUpgradeSearch)) {
         return false;
     }
     std::set<std::string> shares;
@@ -43,7 +44,8 @@ bool StartIndexing(const std::vector<Folder> &folders) {
     for (const Folder &folder : folders) {
         std::string share;
         if (!GetShareNameByPath(share, folder.path)) {
-            syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", kUtilsModule, 661, folder.path.c_str());
+            syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", records::kUpgradeShare.module,
+                   records::kUpgradeShare.line, folder.path.c_str());
             return false;
         }
         shares.insert(share);
@@ -51,12 +53,13 @@ bool StartIndexing(const std::vector<Folder> &folders) {
     }
     for (const std::string &share : shares) {
         if (!IndexMgr::UpsertVorkNotifydCfg(share)) {
-            syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", kUtilsModule, 671, share.c_str());
+            syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", records::kUpgradeMonitor.module,
+                   records::kUpgradeMonitor.line, share.c_str());
             return false;
         }
     }
     if (!IndexMgr::Reindex(paths)) {
-        syslog(LOG_ERR, "%s:%d Reindex failed", kUtilsModule, 678);
+        syslog(LOG_ERR, "%s:%d Reindex failed", records::kUpgradeReindex.module, records::kUpgradeReindex.line);
         return false;
     }
     return true;

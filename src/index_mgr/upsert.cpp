@@ -7,6 +7,7 @@
 #include "index_mgr/events.h"
 #include "names.h"
 #include "no_throw.h"
+#include "records.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/error.h>
@@ -37,13 +38,15 @@ bool UpsertAll(Folders &store, const Json::Value &folders, Changes &changes) {
         const std::string path = PathOf(element);
         Json::Value report;
         if (!store.Upsert(report, element)) {
-            syslog(LOG_ERR, "%s:%d Upsert failed, folder=%s", kIndexMgrModule, 582, ToString(element).c_str());
+            syslog(LOG_ERR, "%s:%d Upsert failed, folder=%s", records::kUpsertElement.module,
+                   records::kUpsertElement.line, ToString(element).c_str());
             return false;
         }
         changes.reports[path] = report;
         std::string share;
         if (!GetShareNameByPath(share, path)) {
-            syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", kIndexMgrModule, 588, path.c_str());
+            syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", records::kUpsertShare.module,
+                   records::kUpsertShare.line, path.c_str());
             return false;
         }
         changes.shares.insert(share);
@@ -54,7 +57,8 @@ bool UpsertAll(Folders &store, const Json::Value &folders, Changes &changes) {
 bool RegisterMonitors(const std::set<std::string> &shares) {
     for (const std::string &share : shares) {
         if (!IndexMgr::UpsertVorkNotifydCfg(share)) {
-            syslog(LOG_ERR, "%s:%d UpsertVorkNtifydCfg failed, share=%s", kIndexMgrModule, 598, share.c_str());
+            syslog(LOG_ERR, "%s:%d UpsertVorkNtifydCfg failed, share=%s", records::kUpsertMonitor.module,
+                   records::kUpsertMonitor.line, share.c_str());
             return false;
         }
     }
@@ -66,7 +70,8 @@ bool SendCommands(const Json::Value &folders) {
     for (const Json::Value &element : Elements(folders)) {
         command[kFolderPathKey] = PathOf(element);
         if (!SendCammandToDaemon(kUpsertCommand, command)) {
-            syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", kIndexMgrModule, 621);
+            syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", records::kUpsertSend.module,
+                   records::kUpsertSend.line);
             return false;
         }
     }
@@ -79,12 +84,14 @@ bool QueueEvents(const Json::Value &reports) {
         const std::string path = report.name();
         std::string fullPath;
         if (!GetFullPath(fullPath, path)) {
-            syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", kIndexMgrModule, 629, path.c_str());
+            syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", records::kUpsertPath.module,
+                   records::kUpsertPath.line, path.c_str());
             ErrorHandler::SetError(FILEINDEX_ERR_PATH);
             return false;
         }
         if (!AddEvent(pending, kSettingEvent, fullPath, path, *report)) {
-            syslog(LOG_ERR, "%s:%d AddCustomEvent failed", kIndexMgrModule, 634);
+            syslog(LOG_ERR, "%s:%d AddCustomEvent failed", records::kUpsertEvent.module,
+                   records::kUpsertEvent.line);
             return false;
         }
     }
@@ -96,7 +103,8 @@ bool QueueEvents(const Json::Value &reports) {
 bool IndexMgr::Upsert(const Json::Value &folders) {
     return NoThrow([&] {
         if (!folders.isArray() || !CanBeWritten(folders)) {
-            syslog(LOG_ERR, "%s:%d Bad param: %s", kIndexMgrModule, 569, ToString(folders).c_str());
+            syslog(LOG_ERR, "%s:%d Bad param: %s", records::kUpsertRequest.module, records::kUpsertRequest.line,
+                   ToString(folders).c_str());
             ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);
             return false;
         }
@@ -109,10 +117,10 @@ bool IndexMgr::Upsert(const Json::Value &folders) {
         }
         // Saved before anyone is told, and never taken back: the daemons read the file when they hear of it, and
         // the same call repeated tells everyone again.
-        if (!RegisterMonitors(changes.shares) || !StartDaemon({kIndexMgrModule, 605})) {
+        if (!RegisterMonitors(changes.shares) || !StartDaemon(records::kUpsertStart)) {
             return false;
         }
-        EnsureSearch(true, {kIndexMgrModule, 611}, {kIndexMgrModule, 613});
+        EnsureSearch(true, records::kUpsertSearch, records::kUpsertRestart);
         return SendCommands(folders) && QueueEvents(changes.reports);
     });
 }

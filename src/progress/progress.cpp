@@ -3,6 +3,7 @@
 #include "names.h"
 #include "no_throw.h"
 #include "queue/queue_file.h"
+#include "records.h"
 #include "share/at_or_under.h"
 #include "share/location.h"
 #include "status/access.h"
@@ -29,14 +30,16 @@ bool IsPathInQueue(const std::string &path, const std::string &queueFile) {
     }
     std::string fullPath;
     if (!GetFullPath(fullPath, path)) {
-        syslog(LOG_ERR, "%s:%d Cannot get full path: %s", kStatusMgrModule, 30, path.c_str());
+        syslog(LOG_ERR, "%s:%d Cannot get full path: %s", records::kFolderStatusPath.module,
+               records::kFolderStatusPath.line, path.c_str());
         return false;
     }
     bool found = false;
     std::string oldPath;
     const bool opened = ScanQueue(queueFile, [&](std::string_view line, const QueueEvent *event) {
         if (event == nullptr) {
-            syslog(LOG_ERR, "%s:%d Malformed command: %s", kStatusMgrModule, 47, std::string(line).c_str());
+            syslog(LOG_ERR, "%s:%d Malformed command: %s", records::kFolderStatusLine.module,
+                   records::kFolderStatusLine.line, std::string(line).c_str());
             return true;
         }
         if (event->type == kRenameEvent) {
@@ -46,7 +49,8 @@ bool IsPathInQueue(const std::string &path, const std::string &queueFile) {
         return true;  // to the end, so that every malformed line is recorded
     });
     if (!opened) {
-        syslog(LOG_ERR, "%s:%d Failed to open queue=%s, reason=%m", kStatusMgrModule, 37, queueFile.c_str());
+        syslog(LOG_ERR, "%s:%d Failed to open queue=%s, reason=%m", records::kFolderStatusOpen.module,
+               records::kFolderStatusOpen.line, queueFile.c_str());
     }
     return found;
 }
@@ -57,7 +61,8 @@ std::string Progress(const std::string &path) {
     }
     std::string share;
     if (!GetShareNameByPath(share, path)) {
-        syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", kStatusMgrModule, 88, path.c_str());
+        syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", records::kFolderStatusShare.module,
+               records::kFolderStatusShare.line, path.c_str());
         return kFinished;
     }
     if (AskStatus([&](Status &status) { return status.ShareIsNoSpace(share); })) {
@@ -65,7 +70,8 @@ std::string Progress(const std::string &path) {
     }
     char buffer[kPathSize] = {};
     if (QueuePathOf(share, buffer) < 0) {
-        syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kStatusMgrModule, 100, share.c_str());
+        syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", records::kFolderStatusQueue.module,
+               records::kFolderStatusQueue.line, share.c_str());
         return kFinished;
     }
     const std::string queue = buffer;

@@ -5,6 +5,7 @@
 #include "base/unique_fd.h"
 #include "names.h"
 #include "no_throw.h"
+#include "records.h"
 #include "share/location.h"
 #include "status/access.h"
 
@@ -44,7 +45,8 @@ constexpr unsigned kReindexType = kReindexEvent;
 using PendingCheck = std::function<bool(const std::string &queueFile)>;
 
 void RecordUnreadable(const std::string &queueFile) {
-    syslog(LOG_ERR, "%s:%d Failed to open queue=%s, reason=%m", kUtilsModule, 95, queueFile.c_str());
+    syslog(LOG_ERR, "%s:%d Failed to open queue=%s, reason=%m", records::kEventDuplicates.module,
+           records::kEventDuplicates.line, queueFile.c_str());
 }
 
 /// Is a reindex of exactly this path waiting in the file?
@@ -96,8 +98,8 @@ void WriteLine(const MetadataEntry &queue, int fd, const struct stat &opened, co
         (void)ftruncate(fd, opened.st_size);  // or else the next writer sees that the newline lacks
     }
     if (WantDebugRecords()) {
-        syslog(LOG_ERR, "%s:%d write fail, (%ld, %ld)", kUtilsModule, 502, static_cast<long>(written),
-               static_cast<long>(text.size()));
+        syslog(LOG_ERR, "%s:%d write fail, (%ld, %ld)", records::kEventCut.module, records::kEventCut.line,
+               static_cast<long>(written), static_cast<long>(text.size()));
     }
 }
 
@@ -117,7 +119,8 @@ bool Append(const std::string &queuePath, const std::string &line) {
             lockError = errno;
             if (lockError != EINTR && lockError != EAGAIN) {
                 if (WantDebugRecords()) {
-                    syslog(LOG_ERR, "%s:%d flock fail, path=%s, reason=%m", kUtilsModule, 507, queuePath.c_str());
+                    syslog(LOG_ERR, "%s:%d flock fail, path=%s, reason=%m", records::kEventLock.module,
+                           records::kEventLock.line, queuePath.c_str());
                 }
                 return false;
             }
@@ -138,7 +141,8 @@ bool Append(const std::string &queuePath, const std::string &line) {
     }
     if (WantDebugRecords()) {
         errno = lockError;
-        syslog(LOG_ERR, "%s:%d try lock too many times, path=%s, reason=%m", kUtilsModule, 516, queuePath.c_str());
+        syslog(LOG_ERR, "%s:%d try lock too many times, path=%s, reason=%m", records::kEventDropped.module,
+               records::kEventDropped.line, queuePath.c_str());
     }
     return true;
 }
@@ -150,13 +154,15 @@ bool QueueEventOf(std::string &share, int type, const std::string &fullPath, con
     char sharePath[kPathSize] = {};
     if (HasNul(fullPath) ||
         VORKShareNamePathGet(fullPath.c_str(), shareName, sizeof(shareName), sharePath, sizeof(sharePath)) < 0) {
-        syslog(LOG_ERR, "%s:%d VORKShareNamePathGet failed, path=%s", kUtilsModule, 472, fullPath.c_str());
+        syslog(LOG_ERR, "%s:%d VORKShareNamePathGet failed, path=%s", records::kEventPath.module,
+               records::kEventPath.line, fullPath.c_str());
         return false;
     }
     share = shareName;
     char buffer[kPathSize] = {};
     if (FILEIDXQueuePathGet(shareName, buffer, sizeof(buffer)) < 0) {
-        syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kUtilsModule, 478, shareName);
+        syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", records::kEventQueue.module,
+               records::kEventQueue.line, shareName);
         return false;
     }
     const std::string queuePath = buffer;
@@ -181,7 +187,8 @@ bool QueueOrMark(int type, const std::string &fullPath, const Json::Value &data,
     }
     // Outside every share the name is empty; the mark is then the only trace of the lost event.
     if (!ChangeStatus([&](Status &status) { return status.ShareSetNeedReindex(share, true); })) {
-        syslog(LOG_ERR, "%s:%d ShareSetNeedReindex failed, share=%s", kUtilsModule, 522, share.c_str());
+        syslog(LOG_ERR, "%s:%d ShareSetNeedReindex failed, share=%s", records::kEventMark.module,
+               records::kEventMark.line, share.c_str());
     }
     return false;
 }

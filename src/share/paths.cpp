@@ -1,4 +1,5 @@
 #include "names.h"
+#include "records.h"
 #include "share/location.h"
 #include "share/lookup.h"
 
@@ -15,12 +16,13 @@ namespace VORK {
 namespace FILEINDEX {
 
 using internal::HasNul;
-using internal::kUtilsModule;
+namespace records = internal::records;
 
 bool GetFullPath(std::string &out, const std::string &sharePath) {
     std::string shareName;
     if (!GetShareNameByPath(shareName, sharePath)) {
-        syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", kUtilsModule, 389, sharePath.c_str());
+        syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", records::kEmptyPath.module,
+               records::kEmptyPath.line, sharePath.c_str());
         return false;
     }
     // The platform would see the path up to a NUL only, and so another one.
@@ -52,7 +54,8 @@ bool GetShareNamePathByFullPath(std::string &outShareName, std::string &outShare
     char name[internal::kShareNameSize] = {};
     char path[internal::kPathSize] = {};
     if (HasNul(fullPath) || VORKShareNamePathGet(fullPath.c_str(), name, sizeof(name), path, sizeof(path)) < 0) {
-        syslog(LOG_ERR, "%s:%d VORKShareNamePathGet failed, path=%s", kUtilsModule, 418, fullPath.c_str());
+        syslog(LOG_ERR, "%s:%d VORKShareNamePathGet failed, path=%s", records::kOutsideShares.module,
+               records::kOutsideShares.line, fullPath.c_str());
         ErrorHandler::SetError(FILEINDEX_ERR_PATH);
         return false;
     }

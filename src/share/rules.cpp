@@ -1,5 +1,6 @@
 #include "names.h"
 #include "no_throw.h"
+#include "records.h"
 #include "share/location.h"
 #include "share/lookup.h"
 
@@ -26,7 +27,7 @@ namespace VORK {
 namespace FILEINDEX {
 
 using internal::HasNul;
-using internal::kUtilsModule;
+namespace records = internal::records;
 
 namespace {
 
@@ -117,7 +118,8 @@ bool CanPathBeIndexed(const std::string &sharePath) {
     return internal::NoThrow([&] {
         std::string fullPath;
         if (!GetFullPath(fullPath, sharePath)) {
-            syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", kUtilsModule, 191, sharePath.c_str());
+            syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", records::kRuleSharePresent.module,
+                   records::kRuleSharePresent.line, sharePath.c_str());
             ErrorHandler::SetError(FILEINDEX_ERR_PATH);
             return false;
         }
@@ -134,25 +136,27 @@ bool CanFullPathBeIndexed(const std::string &fullPath) {
         std::string shareName;
         std::string sharePath;
         if (!GetShareNamePathByFullPath(shareName, sharePath, fullPath)) {
-            syslog(LOG_ERR, "%s:%d GetShareNamePathByFullPath failed, path=%s", kUtilsModule, 239,
-                   fullPath.c_str());
+            syslog(LOG_ERR, "%s:%d GetShareNamePathByFullPath failed, path=%s", records::kRuleInShare.module,
+                   records::kRuleInShare.line, fullPath.c_str());
             return false;
         }
         const internal::Share share = internal::FindShare(shareName);
         if (!share) {
-            syslog(LOG_ERR, "%s:%d VORKShareGet failed, share=%s", kUtilsModule, 245, shareName.c_str());
+            syslog(LOG_ERR, "%s:%d VORKShareGet failed, share=%s", records::kRuleShareFound.module,
+                   records::kRuleShareFound.line, shareName.c_str());
             return false;
         }
         if (!CanShareBeIndexed(share.get())) {
             return false;
         }
         if (IsForeignMountPoint(fullPath, share.get())) {
-            syslog(LOG_ERR, "%s:%d Mount point[%s] is not allowed to be indexed", kUtilsModule, 256,
-                   fullPath.c_str());
+            syslog(LOG_ERR, "%s:%d Mount point[%s] is not allowed to be indexed", records::kRuleMountPoint.module,
+                   records::kRuleMountPoint.line, fullPath.c_str());
             return false;
         }
         if (!IsRealPath(fullPath)) {
-            syslog(LOG_ERR, "%s:%d check realpath failed, path=%s", kUtilsModule, 263, fullPath.c_str());
+            syslog(LOG_ERR, "%s:%d check realpath failed, path=%s", records::kRuleRealPath.module,
+                   records::kRuleRealPath.line, fullPath.c_str());
             return false;
         }
         return true;
@@ -177,7 +181,8 @@ bool IsShareSpaceEnough(const std::string &shareName) {
     return internal::NoThrow([&] {
         const internal::Share share = internal::FindShare(shareName);
         if (!share) {
-            syslog(LOG_ERR, "%s:%d VORKShareGet failed, share=%s", kUtilsModule, 361, shareName.c_str());
+            syslog(LOG_ERR, "%s:%d VORKShareGet failed, share=%s", records::kSpaceShare.module,
+                   records::kSpaceShare.line, shareName.c_str());
             return false;
         }
         if (VORKQuotaIsEnough(0, share->szPath, kRequiredSpace) != 0) {
@@ -185,7 +190,7 @@ bool IsShareSpaceEnough(const std::string &shareName) {
         }
         // A check that failed for another reason must not stop indexing.
         const int error = VLIBCErrGet();
-        return error != internal::kPlatformNoSpace && error != internal::kPlatformQuota;
+        return error != VORK_ERR_NO_SPACE && error != VORK_ERR_QUOTA;
     });
 }
 

@@ -1,4 +1,5 @@
 #include "names.h"
+#include "records.h"
 
 #include <fileindex/daemon.h>
 #include <fileindex/status.h>
@@ -13,7 +14,7 @@ namespace FILEINDEX {
 using internal::kNeedReindexKey;
 using internal::kNoSpaceKey;
 using internal::kResumeTimeKey;
-using internal::kStatusModule;
+namespace records = internal::records;
 
 namespace {
 
@@ -83,7 +84,7 @@ bool Status::GetPauseInfo(long long &resumeTime) {
         resumeTime = document_.get(kResumeTimeKey, kNotPaused).asInt64();
         return true;
     } catch (const Json::Exception &) {
-        syslog(LOG_ERR, "%s:%d json exception", kStatusModule, 66);
+        syslog(LOG_ERR, "%s:%d json exception", records::kPauseInfo.module, records::kPauseInfo.line);
         return false;
     }
 }
@@ -91,7 +92,8 @@ bool Status::GetPauseInfo(long long &resumeTime) {
 bool Status::ShareSetNoSpace(const std::string &share, bool noSpace) {
     SetShareFlag(document_, kNoSpaceKey, share, noSpace, [] {
         if (!NotifyNoSpace()) {
-            syslog(LOG_ERR, "%s:%d NotifyNoSpace failed", kStatusModule, 88);
+            syslog(LOG_ERR, "%s:%d NotifyNoSpace failed", records::kNotifyNoSpace.module,
+                   records::kNotifyNoSpace.line);
         }
     });
     return true;

@@ -1,5 +1,6 @@
 #include "names.h"
 #include "no_throw.h"
+#include "records.h"
 #include "share/location.h"
 #include "status/access.h"
 
@@ -21,11 +22,11 @@ using namespace internal;
 
 namespace {
 
-/// A command that announces a saved change, and the line of the record when it cannot be sent.
+/// A command that announces a saved change, and the record when it cannot be sent.
 struct Announcement {
     const char *command;
     Json::Value data;
-    int failureLine;
+    Record failure;
     bool canBeSent = true;
 
     /// A failure leaves the change saved: the daemon reads the file when it starts.
@@ -33,7 +34,7 @@ struct Announcement {
         if (canBeSent && SendCammandToDaemon(command, data)) {
             return true;
         }
-        syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", kStatusMgrModule, failureLine);
+        syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", failure.module, failure.line);
         return false;
     }
 };
@@ -64,7 +65,7 @@ bool StatusMgr::Pause(const int &hours) {
     return NoThrow([&] {
         const long long resumeTime = ResumeTimeIn(hours);
         const Announcement pause = {kPauseCommand, Object(kResumeTimeKey, static_cast<Json::Int64>(resumeTime)),
-                                    198};
+                                    records::kPauseSend};
         return ChangeStatus([&](Status &status) { return status.Pause(resumeTime); },
                             [&] { return pause.Send(); });
     });
@@ -72,7 +73,7 @@ bool StatusMgr::Pause(const int &hours) {
 
 bool StatusMgr::Resume() {
     return NoThrow([] {
-        const Announcement resume = {kResumeCommand, Json::Value(Json::objectValue), 221};
+        const Announcement resume = {kResumeCommand, Json::Value(Json::objectValue), records::kResumeSend};
         return ChangeStatus([](Status &status) { return status.Resume(); }, [&] { return resume.Send(); });
     });
 }
@@ -92,7 +93,8 @@ bool StatusMgr::ShareIsNoSpace(const std::string &share) {
 bool StatusMgr::ShareRevive(const std::string &share) {
     return NoThrow([&] {
         // The daemon may take a name with a NUL for that of another share.
-        const Announcement revive = {kReviveShareCommand, Object(kShareNameKey, share), 321, !HasNul(share)};
+        const Announcement revive = {kReviveShareCommand, Object(kShareNameKey, share), records::kReviveSend,
+                                     !HasNul(share)};
         return ChangeStatus([&](Status &status) { return status.ShareSetNoSpace(share, false); },
                             [&] { return revive.Send(); });
     });

@@ -3,6 +3,7 @@
 #include "folders/folder_access.h"
 #include "names.h"
 #include "no_throw.h"
+#include "records.h"
 #include "share/location.h"
 #include "status/access.h"
 
@@ -32,8 +33,8 @@ bool IndexableShares(std::set<std::string> &shares) {
     for (const auto &[path, folder] : FolderAccess::All(store)) {
         std::string share;
         if (!GetShareNameByPath(share, folder.path)) {
-            syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", kStatusMgrModule, 135,
-                   folder.path.c_str());
+            syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", records::kStatusShare.module,
+                   records::kStatusShare.line, folder.path.c_str());
             return false;
         }
         if (CanPathBeIndexed(folder.path)) {
@@ -51,7 +52,8 @@ bool ServiceStatus(std::string &status) {
     for (const std::string &share : shares) {
         char buffer[kPathSize] = {};
         if (QueuePathOf(share, buffer) < 0) {
-            syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", kStatusMgrModule, 146, share.c_str());
+            syslog(LOG_ERR, "%s:%d FILEIDXQueuePathGet failed, share=%s", records::kStatusQueue.module,
+                   records::kStatusQueue.line, share.c_str());
             return false;
         }
         const std::string queue = buffer;
