@@ -9,6 +9,6 @@ table=$(awk '/^### .*\.cpp$/ { module = $2 } /^## / { module = "" } module && /^
     docs/formats.md)
 [[ $(wc -l <<<"$table") -gt 50 ]]
 diff <(sort <<<"$constants") <(sort <<<"$table")
-if grep -rnE '(Module|\.cpp"|LOG_ERR.*),\s*[0-9]{2,}' src --include='*.cpp' --include='*.h' | grep -v '^src/records.h:'; then
+if grep -rnE '(Module|\.cpp"|LOG_ERR.*),\s*[0-9]{2,}' src tools --include='*.cpp' --include='*.h' | grep -v '^src/records.h:'; then
     exit 1
 fi

@@ -54,7 +54,7 @@ void RecordLog::Add(std::string record) {
 bool RecordLog::HoldBack(int priority) {
     const Record &last = records_.back();
     const bool isLock = last.place.starts_with("config.cpp:") && last.message == "Failed to lock folder";
-    if (!isLock && !last.Fits({"utils.cpp", 516})) {
+    if (!isLock && !last.Fits({records::kEventDropped})) {
         return false;
     }
     held_.emplace_back(priority, last);
@@ -70,7 +70,7 @@ void RecordLog::Clear() {
 }
 
 bool RecordLog::Record::Fits(const Mark &mark) const {
-    return place == std::string(mark.module) + ":" + std::to_string(mark.line) &&
+    return place == std::string(mark.record.module) + ":" + std::to_string(mark.record.line) &&
            std::string_view(message).ends_with(mark.ending);
 }
 

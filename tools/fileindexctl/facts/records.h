@@ -8,18 +8,20 @@
 /// for each attempt.
 #pragma once
 
+#include "src/records.h"
+
 #include <cstddef>
 #include <string>
-#include <string_view>
 #include <utility>
 #include <vector>
 
 namespace VORK::FILEINDEXCTL {
 
-/// Which record: "index_mgr.cpp", 598. Where several shares can be meant, `ending` is the end of the text.
+namespace records = VORK::FILEINDEX::internal::records;
+
+/// Which record: records::kUpsertMonitor. Where several shares can be meant, `ending` is the end of the text.
 struct Mark {
-    std::string_view module;
-    int line;
+    VORK::FILEINDEX::internal::Record record;
     std::string ending{};
 };
 

@@ -298,7 +298,8 @@ std::optional<int> Run(const Place &place, std::vector<RuleOutcome> &outcomes) {
 // The record that the library wrote with its refusal names the rule for some of them.
 int RecordedRule() {
     const auto wrote = [](const Rule &rule) {
-        return rule.record != 0 && Records().Find({"utils.cpp", rule.record}) != nullptr;
+        return rule.record != 0 &&
+               Records().Find({{VORK::FILEINDEX::internal::kUtilsModule, rule.record}}) != nullptr;
     };
     if (wrote(kSharePathRule)) {
         return kSharePathRule.record;

@@ -27,8 +27,9 @@ constexpr long long kNotPaused = -1;
 constexpr long long kWithoutEnd = 0;
 constexpr long long kSecondsPerHour = 3600;
 
-std::vector<PlannedStep> Plan(int line, const std::string &saved = "saved") {
-    return {SaveStep(saved), {"daemon told", "fileindexd cannot be reached", {{"status_mgr.cpp", line}}}};
+std::vector<PlannedStep> Plan(const VORK::FILEINDEX::internal::Record &failure,
+                              const std::string &saved = "saved") {
+    return {SaveStep(saved), {"daemon told", "fileindexd cannot be reached", {{failure}}}};
 }
 
 std::string LocalTime(long long seconds) {
@@ -145,10 +146,12 @@ ExitStatus Report(const StepReport &report, Output &output) {
 
 StepReport SetPause(long long resumeTime, const std::string &saved, Patience &patience) {
     if (resumeTime == kNotPaused) {
-        return StepReport::Perform(Plan(221, saved), Status(), patience, [] { return StatusMgr::Resume(); });
+        return StepReport::Perform(Plan(records::kResumeSend, saved), Status(), patience,
+                                   [] { return StatusMgr::Resume(); });
     }
     if (resumeTime == kWithoutEnd) {
-        return StepReport::Perform(Plan(198, saved), Status(), patience, [] { return StatusMgr::Pause(0); });
+        return StepReport::Perform(Plan(records::kPauseSend, saved), Status(), patience,
+                                   [] { return StatusMgr::Pause(0); });
     }
     return PauseUntil(resumeTime, saved, patience);
 }
@@ -197,13 +200,16 @@ ExitStatus PauseIndexing(const Arguments &arguments, Output &output) {
         return Report(PauseUntil(std::time(nullptr) + seconds, "saved", patience), output);
     }
     const int hours = static_cast<int>(seconds / kSecondsPerHour);
-    return Report(StepReport::Perform(Plan(198), Status(), patience, [&] { return StatusMgr::Pause(hours); }),
+    return Report(StepReport::Perform(Plan(records::kPauseSend), Status(), patience,
+                                      [&] { return StatusMgr::Pause(hours); }),
                   output);
 }
 
 ExitStatus ResumeIndexing(const Arguments &arguments, Output &output) {
     Patience patience(arguments);
-    return Report(StepReport::Perform(Plan(221), Status(), patience, [] { return StatusMgr::Resume(); }), output);
+    return Report(
+        StepReport::Perform(Plan(records::kResumeSend), Status(), patience, [] { return StatusMgr::Resume(); }),
+        output);
 }
 
 }  // namespace VORK::FILEINDEXCTL

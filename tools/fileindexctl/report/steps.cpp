@@ -163,10 +163,10 @@ StepReport StepReport::Perform(const std::vector<PlannedStep> &plan, const VORK:
 }
 
 void MarkDroppedEvents(StepReport &report) {
-    if (Records().Find({"utils.cpp", 516}) != nullptr) {
+    if (Records().Find({records::kEventDropped}) != nullptr) {
         report.Correct("events queued", StepResult::kFailed, "the queue stayed locked, and the event was dropped");
     }
-    if (Records().Find({"utils.cpp", 502}) != nullptr) {
+    if (Records().Find({records::kEventCut}) != nullptr) {
         report.Correct("events queued", StepResult::kFailed, "the event could not be written whole");
     }
 }

@@ -28,18 +28,19 @@ namespace {
 using VORK::FILEINDEX::Folder;
 using VORK::FILEINDEX::IndexMgr;
 
-constexpr std::string_view kIndexMgr = "index_mgr.cpp";
-
 std::vector<PlannedStep> UpsertPlan(const std::set<std::string> &shares) {
     return {
         SaveStep(),
-        {"monitor", "the file-change monitor could not be registered", {{kIndexMgr, 598}}},
-        {"service", "fileindexd could not be started", {{kIndexMgr, 605}}},
-        {"search setting", "the search setting did not take effect", {}, {{kIndexMgr, 611}, {kIndexMgr, 613}}},
-        {"daemon told", "fileindexd cannot be reached", {{kIndexMgr, 621}}},
+        {"monitor", "the file-change monitor could not be registered", {{records::kUpsertMonitor}}},
+        {"service", "fileindexd could not be started", {{records::kUpsertStart}}},
+        {"search setting",
+         "the search setting did not take effect",
+         {},
+         {{records::kUpsertSearch}, {records::kUpsertRestart}}},
+        {"daemon told", "fileindexd cannot be reached", {{records::kUpsertSend}}},
         {"events queued",
          "the event could not be queued",
-         {{kIndexMgr, 629}, {kIndexMgr, 634}},
+         {{records::kUpsertPath}, {records::kUpsertEvent}},
          {},
          Evidence::kRecord,
          shares},

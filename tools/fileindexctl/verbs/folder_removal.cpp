@@ -21,8 +21,6 @@ namespace {
 
 using VORK::FILEINDEX::IndexMgr;
 
-constexpr std::string_view kIndexMgr = "index_mgr.cpp";
-
 using Paths = std::vector<std::string>;
 
 bool Contains(const Paths &paths, const std::string &path) {
@@ -70,14 +68,16 @@ Removal Requested(const Arguments &arguments, const Folders &folders, Output &ou
 std::vector<PlannedStep> Plan(const std::string &saved, const Paths &removed, const Paths &rest) {
     std::vector<PlannedStep> plan = {SaveStep(saved)};
     if (rest.empty()) {
-        plan.push_back({"service", "fileindexd could not be stopped", {}, {{kIndexMgr, 89}}});
-        plan.push_back(
-            {"search setting", "the search setting did not take effect", {}, {{kIndexMgr, 94}, {kIndexMgr, 96}}});
+        plan.push_back({"service", "fileindexd could not be stopped", {}, {{records::kDeleteStop}}});
+        plan.push_back({"search setting",
+                        "the search setting did not take effect",
+                        {},
+                        {{records::kDeleteSearch}, {records::kDeleteRestart}}});
     } else {
-        plan.push_back({"daemon told", "fileindexd cannot be reached", {{kIndexMgr, 104}}});
+        plan.push_back({"daemon told", "fileindexd cannot be reached", {{records::kDeleteSend}}});
         plan.push_back({"events queued",
                         "the event could not be queued",
-                        {{kIndexMgr, 111}},
+                        {{records::kDeleteEvent}},
                         {},
                         Evidence::kRecord,
                         SharesOf(removed)});
@@ -87,11 +87,11 @@ std::vector<PlannedStep> Plan(const std::string &saved, const Paths &removed, co
         const std::string ending = "share=" + share;
         const std::string monitor = "monitor of " + share;
         if (left.count(share) > 0) {
-            plan.push_back({monitor, "the monitor could not be registered", {{kIndexMgr, 121, ending}}});
+            plan.push_back({monitor, "the monitor could not be registered", {{records::kDeleteMonitor, ending}}});
             continue;
         }
-        plan.push_back({"index data of " + share, "it could not be deleted", {{kIndexMgr, 126, ending}}});
-        plan.push_back({monitor, "the monitor could not be withdrawn", {{kIndexMgr, 130, ending}}});
+        plan.push_back({"index data of " + share, "it could not be deleted", {{records::kDeleteClean, ending}}});
+        plan.push_back({monitor, "the monitor could not be withdrawn", {{records::kDeleteWithdraw, ending}}});
     }
     return plan;
 }

@@ -51,12 +51,12 @@ StepReport Apply(const FlagChange &flag, Patience &patience) {
     std::vector<PlannedStep> plan = {SaveStep(flag.member + " " + flag.Text())};
     if (flag.member == "no_space" && flag.value) {
         plan.push_back(
-            {"administrators told", "the administrators could not be notified", {}, {{"status.cpp", 88}}});
+            {"administrators told", "the administrators could not be notified", {}, {{records::kNotifyNoSpace}}});
         return StepReport::Perform(plan, Status(), patience,
                                    [&] { return StatusMgr::ShareSetNoSpace(flag.name, true); });
     }
     if (flag.member == "no_space") {
-        plan.push_back({"daemon told", "fileindexd cannot be reached", {{"status_mgr.cpp", 321}}});
+        plan.push_back({"daemon told", "fileindexd cannot be reached", {{records::kReviveSend}}});
         return StepReport::Perform(plan, Status(), patience, [&] { return StatusMgr::ShareRevive(flag.name); });
     }
     return StepReport::Perform(plan, Status(), patience, [&] {

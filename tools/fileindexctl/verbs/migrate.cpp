@@ -23,19 +23,19 @@ namespace VORK::FILEINDEXCTL {
 
 namespace {
 
-constexpr std::string_view kUtils = "utils.cpp";
-
 std::vector<PlannedStep> Plan(const Folders &folders) {
     if (folders.empty()) {
-        return {{"service", "fileindexd could not be stopped", {{kUtils, 641}}, {}, Evidence::kNone}};
+        return {{"service", "fileindexd could not be stopped", {{records::kUpgradeStop}}, {}, Evidence::kNone}};
     }
     return {
-        {"service", "fileindexd could not be started", {{kUtils, 650}}, {}, Evidence::kNone},
-        {"search setting", "the search setting could not be switched on", {{kUtils, 654}}},
-        {"monitors", "a file-change monitor could not be registered", {{kUtils, 661}, {kUtils, 671}}},
+        {"service", "fileindexd could not be started", {{records::kUpgradeStart}}, {}, Evidence::kNone},
+        {"search setting", "the search setting could not be switched on", {{records::kUpgradeSearch}}},
+        {"monitors",
+         "a file-change monitor could not be registered",
+         {{records::kUpgradeShare}, {records::kUpgradeMonitor}}},
         {"events queued",
          "the reindexing could not be queued",
-         {{kUtils, 678}},
+         {{records::kUpgradeReindex}},
          {},
          Evidence::kRecord,
          SharesOf(folders)},

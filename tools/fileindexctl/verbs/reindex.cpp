@@ -27,8 +27,6 @@ namespace {
 using VORK::FILEINDEX::IndexMgr;
 using VORK::FILEINDEX::StatusMgr;
 
-constexpr std::string_view kIndexMgr = "index_mgr.cpp";
-
 std::vector<Place> Requested(const Arguments &arguments, const Folders &folders, Output &output) {
     std::vector<Place> places;
     for (const auto &given : arguments.All("PATH")) {
@@ -71,11 +69,11 @@ std::vector<PlannedStep> Plan(const std::vector<Place> &places) {
         plan.push_back({share + " revived",
                         "the share stays marked as out of space, or fileindexd cannot be reached",
                         {},
-                        {{kIndexMgr, 400, "share=" + share}}});
+                        {{records::kReindexRevive, "share=" + share}}});
     }
     plan.push_back({"events queued",
                     "an event could not be queued",
-                    {{kIndexMgr, 407}, {kIndexMgr, 413}},
+                    {{records::kReindexPath}, {records::kReindexEvent}},
                     {},
                     Evidence::kNone,
                     shares});
@@ -117,7 +115,7 @@ StepReport PerformReindex(const std::vector<Place> &places) {
 // The places whose events were dropped because a queue stayed locked. None when it cannot be told, since the
 // daemon has taken others meanwhile.
 std::vector<Place> Dropped(const std::vector<Place> &places) {
-    const std::size_t count = Records().Count({"utils.cpp", 516});
+    const std::size_t count = Records().Count({records::kEventDropped});
     if (count == 0) {
         return {};
     }
@@ -131,7 +129,7 @@ Failure WhyNotQueued(const std::vector<Place> &places, bool anyQueued) {
     if (anyQueued) {
         return {ExitStatus::kPartly, "not everything is queued; the system log says why"};
     }
-    if (Records().Find({"utils.cpp", 516}) != nullptr) {
+    if (Records().Find({records::kEventDropped}) != nullptr) {
         return {ExitStatus::kBusy, "the queue is locked by another program; try again"};
     }
     std::array<char, 4096> queue{};
@@ -165,7 +163,7 @@ Revival ReviveOne(const std::string &share, Patience &patience, StepReport &all)
     }
     const std::vector<PlannedStep> plan = {
         SaveStep("saved for " + share),
-        {"daemon told of " + share, "fileindexd cannot be reached", {{"status_mgr.cpp", 321}}},
+        {"daemon told of " + share, "fileindexd cannot be reached", {{records::kReviveSend}}},
     };
     const StepReport report = StepReport::Perform(plan, VORK::FILEINDEX::Status(), patience,
                                                   [&] { return StatusMgr::ShareRevive(share); });

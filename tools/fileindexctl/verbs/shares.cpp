@@ -27,8 +27,6 @@ namespace {
 
 using VORK::FILEINDEX::IndexMgr;
 
-constexpr std::string_view kIndexMgr = "index_mgr.cpp";
-
 std::vector<std::string> PathsOf(const std::string &share, const Folders &folders) {
     std::vector<std::string> paths;
     for (const auto &folder : folders) {
@@ -189,11 +187,11 @@ ExitStatus RemoveShare(const Arguments &arguments, Output &output) {
     AnnounceRestart(restart, output);
     std::vector<PlannedStep> plan = {SaveStep()};
     if (paths.size() == folders.size()) {
-        plan.push_back({"service", "fileindexd could not be stopped", {}, {{kIndexMgr, 535}}});
+        plan.push_back({"service", "fileindexd could not be stopped", {}, {{records::kShareRemoveStop}}});
         plan.push_back({"search setting",
                         "the search setting did not take effect",
                         {},
-                        {{kIndexMgr, 540}, {kIndexMgr, 542}}});
+                        {{records::kShareRemoveSearch}, {records::kShareRemoveRestart}}});
     }
     const bool searchWasOn = VORKSMBIsEnableSpotlight() != 0;
     StepReport report = StepReport::Perform(plan, VORK::FILEINDEX::Folders(), patience,
@@ -216,7 +214,7 @@ ExitStatus PauseShare(const Arguments &arguments, Output &output) {
     RequireShare(share);
     const std::vector<PlannedStep> plan = {
         {"worker stopped", "fileindexd cannot be reached", {}, {}, Evidence::kNone},
-        {"monitor", "it could not be withdrawn", {{kIndexMgr, 484}}},
+        {"monitor", "it could not be withdrawn", {{records::kSharePauseWithdraw}}},
     };
     const StepReport report =
         StepReport::Perform(plan, VORK::FILEINDEX::Folders(), [&] { return IndexMgr::SharePause(share); });
@@ -232,7 +230,7 @@ ExitStatus ResumeShare(const Arguments &arguments, Output &output) {
     const std::string share = arguments.One("SHARE");
     RequireShare(share);
     const std::vector<PlannedStep> plan = {
-        {"monitor", "it could not be registered", {{kIndexMgr, 501}}},
+        {"monitor", "it could not be registered", {{records::kShareResumeMonitor}}},
         {"worker started", "fileindexd cannot be reached", {}, {}, Evidence::kNone},
     };
     const StepReport report =
