@@ -6,8 +6,9 @@
 // paths for itself: run it in a private namespace.
 
 #include "data.h"
-#include "queue/queue_file.h"
+#include "queue/pending.h"
 #include "rows.h"
+#include "rows/support.h"
 
 #include <fileindex/index_mgr.h>
 
@@ -157,12 +158,11 @@ void MeasureMemory(Verdict &verdict, std::size_t scale) {
     bench::WriteFolderConf(bench::SharePaths(1, 1));
     // The code of both has to be in memory in any case.
     const long idle = PeakMemory([&] {
-        VORK::FILEINDEX::internal::ScanQueue(queue, [](auto, auto) { return true; });
+        bench::ReadEvents(queue);
         VORK::FILEINDEX::IndexMgr::IsPathIndexed("/share0/absent");
     });
     bench::WriteQueue(queue, 1000000 / scale);
-    const long scan =
-        PeakMemory([&] { VORK::FILEINDEX::internal::ScanQueue(queue, [](auto, auto) { return true; }); });
+    const long scan = PeakMemory([&] { bench::ReadEvents(queue); });
     verdict.AddMemory("memory: scan of a queue of 1000000", scan - idle, 512);
     bench::WriteFolderConf(bench::SharePaths(1000, 10));
     const long query = PeakMemory([] { VORK::FILEINDEX::IndexMgr::IsPathIndexed("/share0/absent"); });
@@ -171,8 +171,7 @@ void MeasureMemory(Verdict &verdict, std::size_t scale) {
 
 /// The pending check as a process of its own, to be compared with grep.
 int Find(const char *queue, const char *path) {
-    bool found = false;
-    return VORK::FILEINDEX::internal::FindInQueue(queue, 0x10000, path, found) && found ? 0 : 1;
+    return VORK::FILEINDEX::internal::IsReindexQueued(path, queue) ? 0 : 1;
 }
 
 Options Parse(int argc, char **argv) {

@@ -1,16 +1,20 @@
 #include "base/json/text.h"
+#include "base/metadata_entry.h"
+#include "base/queue/event.h"
 #include "checks.h"
 #include "folders/folder_access.h"
-#include "json/ordinary.h"
-#include "names.h"
-#include "queue/queue_file.h"
+#include "queue/pending.h"
+
+#include <fileindex/folders.h>
 
 #include <json/json.h>
 
+#include <fcntl.h>
+
 #include <algorithm>
-#include <iterator>
 #include <optional>
 #include <sstream>
+#include <utility>
 #include <vector>
 
 namespace fileindex_fuzz {
@@ -18,6 +22,7 @@ namespace fileindex_fuzz {
 namespace {
 
 using namespace VORK;
+using namespace VORK::FILEINDEX;
 using namespace VORK::FILEINDEX::internal;  // NOLINT(google-build-using-namespace): the subject of every check
 
 constexpr char kFile[] = "/tmp/queue";
@@ -38,62 +43,27 @@ std::optional<Event> ReferenceEvent(std::string_view line) {
     if (!JsonReader().Parse(line, record) || !record.isObject()) {
         return {};
     }
-    const Json::Value &path = record[kPathKey];
-    if (!path.isString() || !record.isMember(kEventKey) || !record[kEventKey].isConvertibleTo(Json::uintValue)) {
+    const Json::Value &path = record["path"];
+    if (!path.isString() || !record.isMember("event") || !record["event"].isConvertibleTo(Json::uintValue)) {
         return {};
     }
-    const Json::Value &oldPath = record[kOldPathKey];
-    return Event{record[kEventKey].asUInt(), path.asString(), oldPath.isString() ? oldPath.asString() : ""};
+    const Json::Value &oldPath = record["path_old"];
+    return Event{record["event"].asUInt(), path.asString(), oldPath.isString() ? oldPath.asString() : ""};
 }
 
-bool EventAgrees(OrdinaryReader &reader, std::string_view line) {
-    OrdinaryEvent fast;
-    fast.oldPath = "left over";
-    if (!reader.ReadEvent(line, fast)) {
-        return false;
-    }
-    const Event event = {fast.type, std::string(fast.path), std::string(fast.oldPath)};
-    Require(ReferenceEvent(line) == event, "the fast reader reads another event", line);
-    return true;
+Event Copy(const QueueEvent &event) {
+    return {event.type, std::string(event.path), std::string(event.oldPath)};
 }
 
-bool FoldersAgree(OrdinaryReader &reader, std::string_view text) {
-    std::vector<FolderRecord> records;
-    if (!reader.ReadFolders(text, records)) {
-        return false;
-    }
-    Json::Value document;
-    Require(JsonReader().Parse(text, document) && document.isObject(), "the fast reader accepts no object", text);
-    Require(records.size() == document.size(), "the number of records differs", text);
-    auto member = document.begin();
-    for (const FolderRecord &record : records) {
-        Require(member.name() == record.path, "the path differs", text);
-        VORK::FILEINDEX::Folder folder;
-        folder.Load(std::string(record.path), *member++);
-        Require(folder.name == (record.hasName ? record.name : ""), "the name differs", text);
-        for (std::size_t kind = 0; kind < std::size(record.flag); ++kind) {
-            Require(folder.*kMediaFlags[kind] == (record.hasFlag[kind] && record.flag[kind]), "a flag differs",
-                    text);
-        }
-    }
-    return true;
-}
+/// Gives the text with nothing after it that could be read unnoticed.
+class Alone {
+public:
+    explicit Alone(std::string_view text) : bytes_(text.begin(), text.end()) { bytes_.shrink_to_fit(); }
+    std::string_view Text() const { return {bytes_.data(), bytes_.size()}; }
 
-/// Gives the text with nothing behind it but the promised bytes, which are of the worst kind: they continue it.
-/// What an earlier text left in a reader must not matter.
-bool Compare(bool (*agrees)(OrdinaryReader &, std::string_view), std::string_view text) {
-    constexpr std::string_view kMore = "\"}]0e1,";
-    std::vector<char> bytes(text.size() + OrdinaryReader::kPadding);
-    for (std::size_t i = 0; i < bytes.size(); ++i) {
-        bytes[i] = i < text.size() ? text[i] : kMore[i % kMore.size()];
-    }
-    const std::string_view padded(bytes.data(), text.size());
-    static OrdinaryReader kept;
-    OrdinaryReader fresh;
-    const bool decided = agrees(fresh, padded);
-    Require(agrees(kept, padded) == decided, "an earlier text matters", text);
-    return decided;
-}
+private:
+    std::vector<char> bytes_;
+};
 
 struct Line {
     std::string shown;
@@ -118,56 +88,91 @@ std::vector<Line> ReferenceLines(const std::string &text) {
     return lines;
 }
 
-/// Compares what a scan visits with the lines that begin at `from` or later.
-template <typename Scan>
-void CheckScan(const std::vector<Line> &lines, off_t from, Scan scan) {
+/// Compares the lines of the file from `from` on with those that begin there or later.
+void CheckLines(const std::vector<Line> &lines, off_t from, QueueLines read) {
     auto next = std::find_if(lines.begin(), lines.end(), [&](const Line &line) { return line.offset >= from; });
-    const QueueVisitor visit = [&](std::string_view line, const QueueEvent *event) {
-        Require(next != lines.end(), "a line too many", line);
-        Require(line == next->shown, "the line differs", line);
-        Require((event != nullptr) == next->event.has_value(), "the verdict differs", line);
-        if (event != nullptr) {
-            const Event read = {event->type, std::string(event->path), std::string(event->oldPath)};
-            Require(read == next->event, "the event differs", line);
-            Require(event->whole == next->whole && event->offset == next->offset, "the place differs", line);
-        }
-        ++next;
-        return true;
-    };
-    Require(scan(visit), "cannot scan");
+    QueueEventReader reader;
+    for (QueueLine line; read.Next(line); ++next) {
+        Require(next != lines.end(), "a line too many", line.text);
+        Require(line.text == next->shown, "the line differs", line.text);
+        Require(line.offset == next->offset, "the place differs", line.text);
+        Require(line.passed || line.whole == next->whole, "the end differs", line.text);
+        const QueueEvent *event = reader.Read(line);
+        Require((event != nullptr) == next->event.has_value(), "the verdict differs", line.text);
+        Require(event == nullptr || Copy(*event) == next->event, "the event differs", line.text);
+    }
     Require(next == lines.end(), "a line is missing");
 }
 
-/// Writes the text and scans on from `position`, which has to end up behind the last newline.
+UniqueFd OpenFile(struct stat &status) {
+    UniqueFd file = MetadataEntry(kFile).OpenFile(O_RDONLY, status);
+    Require(static_cast<bool>(file), "cannot open");
+    return file;
+}
+
+/// Writes the text and reads on from `position`, which has to end up after the last newline.
 void CheckStep(QueuePosition &position, const std::string &text, bool first) {
     WriteWhole(kFile, text);
-    bool restarted = false;
-    CheckScan(ReferenceLines(text), position.offset, [&](const QueueVisitor &visit) {
-        return ScanQueueFrom(
-            kFile, position, [&] { restarted = true; }, visit);
-    });
-    Require(restarted == first, "began at the wrong place");
+    struct stat status = {};
+    UniqueFd file = OpenFile(status);
+    Require(position.IsIn(status) != first, "another file");
+    position = {status.st_dev, status.st_ino, position.offset};
+    CheckLines(ReferenceLines(text), position.offset, QueueLines(std::move(file), position.offset));
+    QueueLines lines(OpenFile(status), position.offset);
+    for (QueueLine line; lines.Next(line);) {
+    }
+    position.offset = lines.AfterWhole();
     const auto behind = static_cast<off_t>(text.rfind('\n') + 1);  // 0 when there is none
     Require(position.offset == behind, "the place to go on from is wrong");
 }
 
-void CheckFind(const std::vector<Line> &lines, unsigned type, const std::string &path) {
+/// What begins at `end` or later is left out.
+void CheckEnd(std::vector<Line> lines, off_t end) {
+    std::erase_if(lines, [end](const Line &line) { return line.offset >= end; });
+    struct stat status = {};
+    CheckLines(lines, 0, QueueLines(OpenFile(status), 0, end));
+}
+
+void CheckFind(const std::vector<Line> &lines, const std::string &path) {
     const bool expected = std::any_of(lines.begin(), lines.end(), [&](const Line &line) {
-        return line.event && line.event->type == type && line.event->path == path;
+        return line.event && line.event->type == kReindexEvent && line.event->path == path;
     });
-    bool found = false;
-    Require(FindInQueue(kFile, type, path, found), "cannot search");
-    Require(found == expected, "the search answers otherwise", path);
+    Require(IsReindexQueued(path, kFile) == expected, "the search answers otherwise", path);
 }
 
 }  // namespace
 
 bool CheckEvent(std::string_view line) {
-    return Compare(EventAgrees, line);
+    const Alone alone(line);
+    static QueueEventReader kept;  // what an earlier line left in it must not matter
+    QueueEvent event = {0, "left", "over"};
+    if (!kept.ReadUsual(alone.Text(), event)) {
+        return false;
+    }
+    Require(ReferenceEvent(line) == Copy(event), "the fast reader reads another event", line);
+    return true;
 }
 
 bool CheckFolders(std::string_view text) {
-    return Compare(FoldersAgree, text);
+    const Alone alone(text);
+    Folders fast;
+    if (!FolderAccess::TakeText(fast, alone.Text())) {
+        Require(FolderAccess::All(fast).empty(), "something was taken", text);
+        return false;
+    }
+    Json::Value document;
+    Require(JsonReader().Parse(text, document) && document.isObject(), "the fast reader accepts no object", text);
+    Require(FolderAccess::All(fast).size() == document.size(), "the number of records differs", text);
+    auto member = document.begin();
+    for (const auto &[path, folder] : FolderAccess::All(fast)) {
+        Require(member.name() == path, "the path differs", text);
+        Folder exact;
+        exact.Load(path, *member++);
+        Require(folder.asJson() == exact.asJson(), "the record differs", text);
+        Require(FolderAccess::StoredFullPath(folder) == FolderAccess::StoredFullPath(exact), "the place differs",
+                text);
+    }
+    return true;
 }
 
 bool CheckWriter(std::string_view text) {
@@ -188,18 +193,16 @@ void CheckQueue(const std::string &text, std::size_t cut) {
     CheckStep(position, text.substr(0, cut), true);
     CheckStep(position, text, false);
     const std::vector<Line> lines = ReferenceLines(text);
-    CheckScan(lines, 0, [](const QueueVisitor &visit) { return ScanQueue(kFile, visit); });
+    CheckEnd(lines, QueueLines::kNoEnd);
+    CheckEnd(lines, static_cast<off_t>(cut));
     constexpr std::size_t kSearches = 8;
     for (std::size_t i = 0; i < lines.size() && i < kSearches; ++i) {
         const Line &line = lines[i];
-        const Event event = line.event.value_or(Event{kReindexEvent, "", ""});
-        CheckFind(lines, kReindexEvent, line.shown);
-        CheckFind(lines, event.type, event.path);
-        CheckFind(lines, kReindexEvent, event.path + "x");
-        Require(IsInQueueAt(kFile, line.offset, event.type, event.path) == line.event.has_value(), "at its place",
-                line.shown);
+        CheckFind(lines, line.shown);
+        CheckFind(lines, line.event ? line.event->path : "");
+        CheckFind(lines, line.event ? line.event->path + "x" : "x");
     }
-    CheckFind(lines, kReindexEvent, "");
+    CheckFind(lines, "");
 }
 
 }  // namespace fileindex_fuzz

@@ -30,13 +30,6 @@ inline constexpr char kQueueFile[] = "VORK@file_index_queue";
 inline constexpr char kDatabaseDir[] = "VORK@.fileindexdb";
 inline constexpr char kQueueTmpSuffix[] = ".tmp";
 
-// Queue records.
-inline constexpr char kEventKey[] = "event";
-inline constexpr char kOldPathKey[] = "path_old";
-inline constexpr unsigned kRenameEvent = 256;
-inline constexpr int kReindexEvent = 0x10000;
-inline constexpr int kSettingEvent = 0x20000;
-
 // The daemon, its socket and its commands.
 inline constexpr char kDaemonSocket[] = "/var/run/fileindexd.sock";
 inline constexpr char kDaemonService[] = "fileindexd";

@@ -1,6 +1,7 @@
 #include "base/json/text.h"
 
 #include "base/json/elements.h"
+#include "base/json/number.h"
 
 #include <json/writer.h>
 
@@ -32,10 +33,10 @@ bool IsDigit(char c) {
     return c >= '0' && c <= '9';
 }
 
-/// Sees to what the parser is lenient about: comments, which it skips in places even where they are not allowed; a
-/// comma that trails a member without a name; numbers like "-", "007" and "1."; a NUL, which ends its text
-/// whatever follows. Counts arrays and objects, which the parser cannot tell from other values. Everything else is
-/// left to it.
+/// Refuses what the JSON library's parser lets pass: comments, which it skips in some places even if told not to;
+/// a comma after the last member; numbers like "-", "007" and "1."; a NUL, at which it stops whatever follows;
+/// arrays and objects nested too deeply, which it counts together with other values. All other faults are left to
+/// it.
 class DialectCheck {
 public:
     explicit DialectCheck(std::string_view text) : rest_(text) {}
@@ -77,29 +78,9 @@ private:
     }
 
     bool SkipNumber() {
-        Take("-");
-        const bool zero = rest_.starts_with('0');
-        const std::size_t digits = SkipDigits();
-        if (digits == 0 || (zero && digits > 1)) {
-            return false;
-        }
-        if (Take(".") && SkipDigits() == 0) {
-            return false;
-        }
-        if (Take("e") || Take("E")) {
-            if (!Take("+")) {
-                Take("-");
-            }
-            return SkipDigits() > 0;
-        }
-        return true;
-    }
-
-    std::size_t SkipDigits() {
-        const auto end = std::find_if_not(rest_.begin(), rest_.end(), IsDigit);
-        const auto count = static_cast<std::size_t>(end - rest_.begin());
-        rest_.remove_prefix(count);
-        return count;
+        const std::size_t length = NumberLength(rest_);
+        rest_.remove_prefix(length);
+        return length > 0;
     }
 
     bool TakeOther(char c, char last) {
@@ -119,12 +100,6 @@ private:
             default:
                 return true;
         }
-    }
-
-    bool Take(std::string_view literal) {
-        const bool there = rest_.starts_with(literal);
-        rest_.remove_prefix(there ? literal.size() : 0);
-        return there;
     }
 
     std::string_view rest_;

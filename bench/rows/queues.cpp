@@ -1,5 +1,5 @@
 #include "baseline.h"
-#include "queue/queue_file.h"
+#include "queue/pending.h"
 #include "rows/support.h"
 
 #include <fileindex/daemon.h>
@@ -35,8 +35,6 @@ std::string EventLine(const std::string &fullPath) {
     return "{\"data\":null,\"event\":65536,\"path\":\"" + fullPath + "\"}\n";
 }
 
-/// Appends to a queue of 10 lines, which is cut back so that it stays that long.
-
 struct Ratios {
     double ofFloor;
     double ofBaseline;
@@ -67,9 +65,7 @@ Row Scan(std::string name, const std::function<void()> &prepare, const std::func
 Row PendingCheck(std::size_t lines, Escapes escapes, const char *name, Ratios most) {
     const std::string queue = QueuePath("share0");
     const auto library = [queue] {
-        bool found = false;
-        Require(VORK::FILEINDEX::internal::FindInQueue(queue, 0x10000, FullPath(kAbsent), found) && !found,
-                "find");
+        Require(!VORK::FILEINDEX::internal::IsReindexQueued(FullPath(kAbsent), queue), "find");
     };
     const auto baseline = [queue] { Require(!baseline::IsReindexQueued(FullPath(kAbsent), queue), "find"); };
     return Scan(
@@ -160,7 +156,7 @@ Row Reindex(std::size_t paths, std::size_t lines) {
     // One scan that reads every line, and the appends.
     row.floor = [=] {
         return [=, size = prepare()] {
-            VORK::FILEINDEX::internal::ScanQueue(queue, [](auto, auto) { return true; });
+            ReadEvents(queue);
             for (const std::string &path : sharePaths) {
                 AppendBare(queue, EventLine(FullPath(path)));
             }

@@ -1,5 +1,8 @@
 #include "rows/support.h"
 
+#include "base/metadata_entry.h"
+#include "base/queue/event.h"
+
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -23,6 +26,15 @@ void ReadBytes(const std::string &path) {
     while (read(fd, block.data(), block.size()) > 0) {
     }
     close(fd);
+}
+
+void ReadEvents(const std::string &queue) {
+    struct stat status = {};
+    VORK::QueueLines lines(VORK::MetadataEntry(queue).OpenFile(O_RDONLY, status));
+    VORK::QueueEventReader reader;
+    for (VORK::QueueLine line; lines.Next(line);) {
+        (void)reader.Read(line);
+    }
 }
 
 }  // namespace bench

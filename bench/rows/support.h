@@ -19,6 +19,9 @@ std::string FullPath(const std::string &sharePath);
 /// Reads a file as the library does, and does nothing with it.
 void ReadBytes(const std::string &path);
 
+/// Reads every event of a queue.
+void ReadEvents(const std::string &queue);
+
 std::vector<Row> FolderRows();
 std::vector<Row> QueueRows(std::size_t scale);
 std::vector<Row> ServiceRows();

@@ -7,6 +7,7 @@
 
 #include <map>
 #include <string>
+#include <string_view>
 
 namespace VORK::FILEINDEX::internal {
 
@@ -24,6 +25,10 @@ struct FolderAccess {
 
     /// As Folders::Save, likewise.
     static bool Save(const Folders &store);
+
+    /// Fills the list from the text of a folder.conf in its usual form, without making the document. False, with
+    /// nothing taken, when it is not quite that.
+    static bool TakeText(Folders &store, std::string_view text);
 
     /// Fills the list from the document. Not an object: one record, FILEINDEX_ERR_MALFORMED_CONFIG, false.
     static bool TakeDocument(Folders &store);

@@ -1,7 +1,8 @@
+#include "base/json/scanner.h"
 #include "base/json/text.h"
 #include "config/load_save.h"
 #include "folders/folder_access.h"
-#include "json/ordinary.h"
+#include "names.h"
 #include "records.h"
 
 #include <fileindex/error.h>
@@ -28,31 +29,37 @@ int CountUnresolved(const std::map<std::string, Folder> &folders) {
     return static_cast<int>(std::count_if(folders.begin(), folders.end(), unresolved));
 }
 
-/// Takes over a folder.conf in its usual form. False, with nothing taken, when it is not quite that.
-bool LoadOrdinary(std::map<std::string, Folder> &folders, std::string &text) {
-    const std::size_t size = text.size();
-    text.append(internal::OrdinaryReader::kPadding, '\0');
-    internal::OrdinaryReader reader;
-    std::vector<internal::FolderRecord> records;
-    const bool ordinary = reader.ReadFolders(std::string_view(text).substr(0, size), records);
-    text.resize(size);
-    if (!ordinary) {
-        return false;
-    }
-    for (const internal::FolderRecord &record : records) {
-        Folder folder;
-        folder.path = record.path;
-        if (record.hasName) {
-            folder.name = record.name;
+/// A member of folder.conf. The views live as long as the text and the home of its decoded strings.
+struct StoredFolder {
+    std::string_view path;
+    std::string_view name{};
+    bool flags[std::size(internal::kMediaKeys)] = {};  ///< in the order of kMediaKeys
+};
+
+bool *FlagOf(StoredFolder &record, std::string_view key) {
+    const auto kind = std::find(std::begin(internal::kMediaKeys), std::end(internal::kMediaKeys), key);
+    return kind == std::end(internal::kMediaKeys) ? nullptr
+                                                  : &record.flags[kind - std::begin(internal::kMediaKeys)];
+}
+
+/// All records of a folder.conf in its usual form: in ascending order of their paths. False when it is not quite
+/// that; then only the document tells what it says.
+bool ReadRecords(std::string_view text, std::string &decoded, std::vector<StoredFolder> &records) {
+    JsonScanner json(text, decoded);
+    const auto takeRecord = [&](std::string_view path) {
+        if (!records.empty() && path <= records.back().path) {
+            return false;
         }
-        for (std::size_t kind = 0; kind < std::size(record.flag); ++kind) {
-            folder.*internal::kMediaFlags[kind] = record.hasFlag[kind] && record.flag[kind];
-        }
-        internal::FolderAccess::Resolve(folder);  // a folder whose share is away stays in the list
-        std::string key = folder.path;
-        folders.emplace_hint(folders.end(), std::move(key), std::move(folder));
-    }
-    return true;
+        StoredFolder &record = records.emplace_back(StoredFolder{path});
+        return json.TakeObject([&](std::string_view key) {
+            if (key == internal::kNameKey) {
+                return json.TakeString(record.name);
+            }
+            bool *const flag = FlagOf(record, key);
+            return flag != nullptr ? json.TakeBool(*flag) : json.Skip();
+        });
+    };
+    return json.TakeObject(takeRecord) && json.AtEnd();
 }
 
 void AppendMember(std::string &out, const char *key, bool value) {
@@ -110,14 +117,28 @@ namespace internal {
 bool FolderAccess::Load(Folders &store) {
     bool done = false;
     const bool loaded = LoadConfig(store.GetPath(), [&](std::string &text) {
-        done = LoadOrdinary(store.folders_, text);
+        done = TakeText(store, text);
         return done || JsonReader().Parse(text, store.document_);
     });
-    if (!loaded) {
+    return loaded && (done || TakeDocument(store));
+}
+
+bool FolderAccess::TakeText(Folders &store, std::string_view text) {
+    std::string decoded;
+    std::vector<StoredFolder> records;
+    if (!ReadRecords(text, decoded, records)) {
         return false;
     }
-    if (!done) {
-        return TakeDocument(store);
+    for (const StoredFolder &record : records) {
+        Folder folder;
+        folder.path = record.path;
+        folder.name = record.name;
+        for (std::size_t kind = 0; kind < std::size(record.flags); ++kind) {
+            folder.*kMediaFlags[kind] = record.flags[kind];
+        }
+        Resolve(folder);  // a folder whose share is away stays in the list
+        std::string key = folder.path;
+        store.folders_.emplace_hint(store.folders_.end(), std::move(key), std::move(folder));
     }
     store.unresolved_ = CountUnresolved(store.folders_);
     return true;

@@ -1,8 +1,9 @@
 #include "progress/progress.h"
 
+#include "base/metadata_entry.h"
+#include "base/queue/event.h"
 #include "names.h"
 #include "no_throw.h"
-#include "queue/queue_file.h"
 #include "records.h"
 #include "share/at_or_under.h"
 #include "share/location.h"
@@ -11,10 +12,11 @@
 #include <fileindex/indexability.h>
 #include <fileindex/paths.h>
 
+#include <fcntl.h>
 #include <syslog.h>
 
 #include <ctime>
-#include <string_view>
+#include <utility>
 
 namespace VORK::FILEINDEX::internal {
 
@@ -34,23 +36,28 @@ bool IsPathInQueue(const std::string &path, const std::string &queueFile) {
                records::kFolderStatusPath.line, path.c_str());
         return false;
     }
+    struct stat status = {};
+    UniqueFd file = MetadataEntry(queueFile).OpenFile(O_RDONLY, status);
+    if (!file) {
+        syslog(LOG_ERR, "%s:%d Failed to open queue=%s, reason=%m", records::kFolderStatusOpen.module,
+               records::kFolderStatusOpen.line, queueFile.c_str());
+        return false;
+    }
     bool found = false;
     std::string oldPath;
-    const bool opened = ScanQueue(queueFile, [&](std::string_view line, const QueueEvent *event) {
+    QueueLines lines(std::move(file));
+    QueueEventReader reader;
+    for (QueueLine line; lines.Next(line);) {  // to the end, so that every malformed line is recorded
+        const QueueEvent *event = reader.Read(line);
         if (event == nullptr) {
             syslog(LOG_ERR, "%s:%d Malformed command: %s", records::kFolderStatusLine.module,
-                   records::kFolderStatusLine.line, std::string(line).c_str());
-            return true;
+                   records::kFolderStatusLine.line, std::string(line.text).c_str());
+            continue;
         }
         if (event->type == kRenameEvent) {
             oldPath = event->oldPath;
         }
         found = found || IsAtOrUnder(event->path, fullPath) || IsAtOrUnder(oldPath, fullPath);
-        return true;  // to the end, so that every malformed line is recorded
-    });
-    if (!opened) {
-        syslog(LOG_ERR, "%s:%d Failed to open queue=%s, reason=%m", records::kFolderStatusOpen.module,
-               records::kFolderStatusOpen.line, queueFile.c_str());
     }
     return found;
 }

@@ -12,7 +12,6 @@
 #include <fileindex/daemon.h>
 #include <fileindex/error.h>
 #include <fileindex/fileidx.h>
-#include <fileindex/paths.h>
 
 #include <vork/share.h>
 
@@ -24,6 +23,7 @@
 
 #include <cerrno>
 #include <cstdlib>
+#include <functional>
 
 namespace VORK {
 namespace FILEINDEX {
@@ -39,27 +39,8 @@ bool WantDebugRecords() {
     return LOG_LEVEL == kDebugLevel;
 }
 
-constexpr unsigned kReindexType = kReindexEvent;
-
 /// Asks about one queue file whether a reindex of the event's path is waiting in it.
 using PendingCheck = std::function<bool(const std::string &queueFile)>;
-
-void RecordUnreadable(const std::string &queueFile) {
-    syslog(LOG_ERR, "%s:%d Failed to open queue=%s, reason=%m", records::kEventDuplicates.module,
-           records::kEventDuplicates.line, queueFile.c_str());
-}
-
-/// Is a reindex of exactly this path waiting in the file?
-bool IsReindexQueued(const std::string &fullPath, const std::string &queueFile) {
-    if (!IsFileExist(queueFile)) {
-        return false;
-    }
-    bool queued = false;
-    if (!FindInQueue(queueFile, kReindexType, fullPath, queued)) {
-        RecordUnreadable(queueFile);
-    }
-    return queued;
-}
 
 /// The daemon takes a queue by renaming it; a line written to the file it has taken might never be read. `opened`
 /// is what the descriptor's file is now.
@@ -199,58 +180,6 @@ namespace internal {
 
 bool CanBeQueued(const Json::Value &data) {
     return CanBeWritten(data, 1);
-}
-
-PendingReindexes::PendingReindexes(std::vector<std::string> sharePaths) : sharePaths_(std::move(sharePaths)) {}
-
-PendingReindexes::KnownQueue &PendingReindexes::Queue(const std::string &queueFile, std::string_view volume) {
-    KnownQueue &queue = queues_[queueFile];
-    if (queue.wanted.empty() || queue.volume != volume) {
-        queue = KnownQueue();
-        queue.volume = volume;
-        for (const std::string &sharePath : sharePaths_) {
-            queue.wanted.insert(queue.volume + sharePath);
-        }
-    }
-    return queue;
-}
-
-bool PendingReindexes::IsQueued(const std::string &fullPath, const std::string &sharePath,
-                                const std::string &queueFile) {
-    if (sharePaths_.size() < 2) {
-        return IsReindexQueued(fullPath, queueFile);
-    }
-    if (!IsFileExist(queueFile)) {
-        queues_.erase(queueFile);  // consumed: a new file may get the number of the old one
-        return false;
-    }
-    KnownQueue &queue = Queue(queueFile, std::string_view(fullPath).substr(0, fullPath.size() - sharePath.size()));
-    bool inLastLine = false;
-    const auto restarted = [&] { queue.pending.clear(); };
-    const auto visit = [&](std::string_view, const QueueEvent *event) {
-        if (event == nullptr || event->type != kReindexType) {
-            return true;
-        }
-        if (!event->whole) {
-            inLastLine = event->path == fullPath;
-        } else if (queue.wanted.contains(event->path)) {
-            queue.pending.emplace(event->path, event->offset);
-        }
-        return true;
-    };
-    if (!ScanQueueFrom(queueFile, queue.position, restarted, visit)) {
-        RecordUnreadable(queueFile);
-        return false;
-    }
-    const auto found = queue.pending.find(fullPath);
-    if (found == queue.pending.end()) {
-        return inLastLine;
-    }
-    if (IsInQueueAt(queueFile, found->second, kReindexType, fullPath)) {
-        return true;
-    }
-    queues_.erase(queueFile);  // consumed in place, or replaced by a file that looks the same
-    return IsReindexQueued(fullPath, queueFile);
 }
 
 bool AddEvent(PendingReindexes &pending, int type, const std::string &fullPath, const std::string &sharePath,
