@@ -3,6 +3,7 @@
 #include "records.h"
 #include "share/location.h"
 #include "share/lookup.h"
+#include "share/rule_keys.h"
 
 #include <fileindex/error.h>
 #include <fileindex/indexability.h>
@@ -27,6 +28,7 @@ namespace VORK {
 namespace FILEINDEX {
 
 using internal::HasNul;
+using internal::Rule;
 namespace records = internal::records;
 
 namespace {
@@ -36,12 +38,9 @@ constexpr std::string_view kSystemPreservedNames[] = {
     ".TemporaryItems", internal::kDatabaseDir, internal::kQueueFile, ".VORKPPSDB", ".DS_Store",
 };
 
-constexpr std::string_view kSkippedShares[] = {"surveillance", "NetBackup"};
-
 constexpr unsigned long long kRequiredSpace = 10485760;  // 10 MiB
 
 constexpr int kUnknownFileSystem = -1;
-constexpr int kPseudoFileSystem = 12;
 
 template <typename Table>
 bool Contains(const Table &table, std::string_view entry) {
@@ -64,16 +63,7 @@ bool IsInSnapshot(const std::string &fullPath) {
 }
 
 bool IsForeignFileSystem(int type) {
-    return VORKFSIsRemoteFS(type) != 0 || VORKFSIsImageFS(type) != 0 || type == kPseudoFileSystem;
-}
-
-/// Anything that is no part of the share's own data, or may not be.
-bool IsExcludedPlace(const std::string &fullPath) {
-    if (IsInRecycleBin(fullPath) || IsInSnapshot(fullPath)) {
-        return true;
-    }
-    const int type = VORKGetFSType(fullPath.c_str(), 0);
-    return type == kUnknownFileSystem || IsForeignFileSystem(type);
+    return VORKFSIsRemoteFS(type) != 0 || VORKFSIsImageFS(type) != 0 || type == VORK_FS_TYPE_PSEUDO;
 }
 
 /// A mount point is a volume of its own, except that an encrypted share is mounted in its place.
@@ -89,6 +79,107 @@ bool IsForeignMountPoint(const std::string &fullPath, const _tag_VORKSHARE *shar
 bool IsRealPath(const std::string &fullPath) {
     char resolved[PATH_MAX] = {};
     return realpath(fullPath.c_str(), resolved) != nullptr && fullPath == resolved;
+}
+
+/// What is known of a place; each rule adds to it for those after it.
+struct Place {
+    std::string sharePath{};
+    std::string fullPath{};
+    int type = kUnknownFileSystem;
+    std::string shareName{};
+    internal::Share found{};
+    const _tag_VORKSHARE *share = nullptr;
+    int encrypted = 0;
+    int readOnly = 0;
+};
+
+bool IsSharePresent(Place &place) {
+    if (!GetFullPath(place.fullPath, place.sharePath)) {
+        syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", records::kRuleSharePresent.module,
+               records::kRuleSharePresent.line, place.sharePath.c_str());
+        ErrorHandler::SetError(FILEINDEX_ERR_PATH);
+        return false;
+    }
+    return true;
+}
+
+bool IsOnKnownFileSystem(Place &place) {
+    place.type = VORKGetFSType(place.fullPath.c_str(), 0);
+    return place.type != kUnknownFileSystem;
+}
+
+bool IsInShare(Place &place) {
+    std::string sharePath;
+    if (!GetShareNamePathByFullPath(place.shareName, sharePath, place.fullPath)) {
+        syslog(LOG_ERR, "%s:%d GetShareNamePathByFullPath failed, path=%s", records::kRuleInShare.module,
+               records::kRuleInShare.line, place.fullPath.c_str());
+        return false;
+    }
+    return true;
+}
+
+bool IsShareFound(Place &place) {
+    place.found = internal::FindShare(place.shareName);
+    place.share = place.found.get();
+    if (place.share == nullptr) {
+        syslog(LOG_ERR, "%s:%d VORKShareGet failed, share=%s", records::kRuleShareFound.module,
+               records::kRuleShareFound.line, place.shareName.c_str());
+        return false;
+    }
+    return true;
+}
+
+bool IsNoMountPoint(Place &place) {
+    if (IsForeignMountPoint(place.fullPath, place.share)) {
+        syslog(LOG_ERR, "%s:%d Mount point[%s] is not allowed to be indexed", records::kRuleMountPoint.module,
+               records::kRuleMountPoint.line, place.fullPath.c_str());
+        return false;
+    }
+    return true;
+}
+
+bool HasRealPath(Place &place) {
+    if (!IsRealPath(place.fullPath)) {
+        syslog(LOG_ERR, "%s:%d check realpath failed, path=%s", records::kRuleRealPath.module,
+               records::kRuleRealPath.line, place.fullPath.c_str());
+        return false;
+    }
+    return true;
+}
+
+struct Step {
+    Rule rule;
+    bool (*passes)(Place &place);
+};
+
+constexpr Step kSteps[] = {
+    {Rule::kSharePresent, IsSharePresent},
+    {Rule::kRecycleBin, [](Place &place) { return !IsInRecycleBin(place.fullPath); }},
+    {Rule::kSnapshot, [](Place &place) { return !IsInSnapshot(place.fullPath); }},
+    {Rule::kKnownFileSystem, IsOnKnownFileSystem},
+    {Rule::kLocalFileSystem, [](Place &place) { return VORKFSIsRemoteFS(place.type) == 0; }},
+    {Rule::kImage, [](Place &place) { return VORKFSIsImageFS(place.type) == 0; }},
+    {Rule::kPseudoFileSystem, [](Place &place) { return place.type != VORK_FS_TYPE_PSEUDO; }},
+    {Rule::kInShare, IsInShare},
+    {Rule::kShareFound, IsShareFound},
+    {Rule::kShareName,
+     [](Place &place) {
+         return place.share->szName != nullptr && !Contains(internal::kSkippedShares, place.share->szName);
+     }},
+    {Rule::kEncryptionTold,
+     [](Place &place) { return VLIBShareIsEncryptedGet(place.share, &place.encrypted) >= 0; }},
+    {Rule::kReadOnlyTold, [](Place &place) { return VLIBShareIsReadOnlyGet(place.share, &place.readOnly) >= 0; }},
+    {Rule::kShareUnlocked, [](Place &place) { return place.encrypted == 0; }},
+    {Rule::kShareWritable, [](Place &place) { return place.readOnly == 0; }},
+    {Rule::kMountPoint, IsNoMountPoint},
+    {Rule::kRealPath, HasRealPath},
+};
+static_assert(internal::FollowsRules(kSteps));
+
+bool Passes(Place &place, Rule first, Rule last = Rule::kRealPath) {
+    return std::all_of(std::begin(kSteps), std::end(kSteps), [&](const Step &step) {
+        return step.rule < first || step.rule > last || step.passes(place);
+    });
 }
 
 }  // namespace
@@ -116,64 +207,23 @@ bool IsSkipIndex(const std::string &fullPath) {
 
 bool CanPathBeIndexed(const std::string &sharePath) {
     return internal::NoThrow([&] {
-        std::string fullPath;
-        if (!GetFullPath(fullPath, sharePath)) {
-            syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", records::kRuleSharePresent.module,
-                   records::kRuleSharePresent.line, sharePath.c_str());
-            ErrorHandler::SetError(FILEINDEX_ERR_PATH);
-            return false;
-        }
-        return CanFullPathBeIndexed(fullPath);
+        Place place = {.sharePath = sharePath};
+        return Passes(place, Rule::kSharePresent);
     });
 }
 
 bool CanFullPathBeIndexed(const std::string &fullPath) {
     return internal::NoThrow([&] {
+        Place place = {.fullPath = fullPath};
         // The platform is not asked about a path with a NUL: it would answer for another one.
-        if (!HasNul(fullPath) && IsExcludedPlace(fullPath)) {
-            return false;
-        }
-        std::string shareName;
-        std::string sharePath;
-        if (!GetShareNamePathByFullPath(shareName, sharePath, fullPath)) {
-            syslog(LOG_ERR, "%s:%d GetShareNamePathByFullPath failed, path=%s", records::kRuleInShare.module,
-                   records::kRuleInShare.line, fullPath.c_str());
-            return false;
-        }
-        const internal::Share share = internal::FindShare(shareName);
-        if (!share) {
-            syslog(LOG_ERR, "%s:%d VORKShareGet failed, share=%s", records::kRuleShareFound.module,
-                   records::kRuleShareFound.line, shareName.c_str());
-            return false;
-        }
-        if (!CanShareBeIndexed(share.get())) {
-            return false;
-        }
-        if (IsForeignMountPoint(fullPath, share.get())) {
-            syslog(LOG_ERR, "%s:%d Mount point[%s] is not allowed to be indexed", records::kRuleMountPoint.module,
-                   records::kRuleMountPoint.line, fullPath.c_str());
-            return false;
-        }
-        if (!IsRealPath(fullPath)) {
-            syslog(LOG_ERR, "%s:%d check realpath failed, path=%s", records::kRuleRealPath.module,
-                   records::kRuleRealPath.line, fullPath.c_str());
-            return false;
-        }
-        return true;
+        return Passes(place, HasNul(fullPath) ? Rule::kInShare : Rule::kRecycleBin);
     });
 }
 
 bool CanShareBeIndexed(_tag_VORKSHARE *share) {
     return internal::NoThrow([&] {
-        if (share == nullptr || share->szName == nullptr || Contains(kSkippedShares, share->szName)) {
-            return false;
-        }
-        int encrypted = 0;
-        int readOnly = 0;
-        if (VLIBShareIsEncryptedGet(share, &encrypted) < 0 || VLIBShareIsReadOnlyGet(share, &readOnly) < 0) {
-            return false;
-        }
-        return encrypted == 0 && readOnly == 0;
+        Place place = {.share = share};
+        return share != nullptr && Passes(place, Rule::kShareName, Rule::kShareWritable);
     });
 }
 

@@ -12,7 +12,7 @@ grep -rHE '^#include ("|<(fileindex|vork|vorknotifyd)/)' base include src platfo
         if (name ~ /^<fileindex/) return rank[substr(name, 12, length(name) - 12)] + 0
         if (name ~ /^</) return rank["platform/include/"]
         gsub(/"/, "", name)
-        if (name ~ /^src\//) return rank[name] + 0
+        if (name ~ /^src\//) return own ~ /^tools/ ? rank[name] + 0 : Room(substr(name, 5))
         return name !~ /^base\// && own ~ /^(platform|tools)/ ? Room(own) : Room(name)
     }
     FILENAME != "-" && /^```/ { drawn = !drawn }

@@ -5,6 +5,7 @@
 #include "facts/share_record.h"
 #include "report/failure.h"
 #include "report/text.h"
+#include "src/share/rule_keys.h"
 
 #include <fileindex/indexability.h>
 
@@ -24,6 +25,12 @@
 #include <optional>
 
 namespace VORK::FILEINDEXCTL {
+
+using VORK::FILEINDEX::internal::FollowsRules;
+using VORK::FILEINDEX::internal::kRuleKeys;
+using VORK::FILEINDEX::internal::kSkippedShares;
+using VORK::FILEINDEX::internal::Rule;
+using VORK::FILEINDEX::internal::RuleKey;
 
 namespace {
 
@@ -167,9 +174,8 @@ Finding ShareFound(Probe &probe) {
 }
 
 Finding ShareNotExcluded(Probe &probe) {
-    static constexpr const char *kExcluded[] = {"surveillance", "NetBackup"};
     const std::string name = probe.share->szName;
-    if (std::find(std::begin(kExcluded), std::end(kExcluded), name) == std::end(kExcluded)) {
+    if (std::find(std::begin(kSkippedShares), std::end(kSkippedShares), name) == std::end(kSkippedShares)) {
         return Pass(Quoted(name) + " is no such name");
     }
     return {false, "shares with the name " + Quoted(name) + " are never indexed",
@@ -245,67 +251,65 @@ Finding RealPath(Probe &probe) {
     return {false, "\".\", \"..\", a doubled \"/\" or one at the end is in the path", remedy};
 }
 
-struct Rule {
-    std::string_view key;
+struct Explanation {
+    Rule rule;
     std::string_view label;
-    int record;  // the line of the library's record when it refuses for this rule; 0: it writes none
     Finding (*check)(Probe &);
 };
 
-constexpr Rule kSharePathRule = {"share_present", "the path's share is there", 191, SharePresent};
-
-constexpr Rule kRules[] = {
-    {"recycle_bin", "not in a recycle bin", 0, OutsideRecycleBin},
-    {"snapshot", "not in a snapshot", 0, OutsideSnapshot},
-    {"known_file_system", "on a known file system", 0, KnownFileSystem},
-    {"local_file_system", "not on a network file system", 0, LocalFileSystem},
-    {"image", "not in an image", 0, NoImage},
-    {"pseudo_file_system", "not on a kernel file system", 0, NoPseudoFileSystem},
-    {"in_share", "in a share", 239, InShare},
-    {"share_found", "the share can be looked up", 245, ShareFound},
-    {"share_name", "the share is not left out by name", 0, ShareNotExcluded},
-    {"encryption_told", "known whether the share is locked", 0, EncryptionTold},
-    {"read_only_told", "known whether the share is read-only", 0, ReadOnlyTold},
-    {"share_unlocked", "the share is not locked", 0, ShareUnlocked},
-    {"share_writable", "the share is not read-only", 0, ShareWritable},
-    {"mount_point", "not a mount point", 256, NoMountPoint},
-    {"real_path", "a path without links", 263, RealPath},
+constexpr Explanation kExplanations[] = {
+    {Rule::kSharePresent, "the path's share is there", SharePresent},
+    {Rule::kRecycleBin, "not in a recycle bin", OutsideRecycleBin},
+    {Rule::kSnapshot, "not in a snapshot", OutsideSnapshot},
+    {Rule::kKnownFileSystem, "on a known file system", KnownFileSystem},
+    {Rule::kLocalFileSystem, "not on a network file system", LocalFileSystem},
+    {Rule::kImage, "not in an image", NoImage},
+    {Rule::kPseudoFileSystem, "not on a kernel file system", NoPseudoFileSystem},
+    {Rule::kInShare, "in a share", InShare},
+    {Rule::kShareFound, "the share can be looked up", ShareFound},
+    {Rule::kShareName, "the share is not left out by name", ShareNotExcluded},
+    {Rule::kEncryptionTold, "known whether the share is locked", EncryptionTold},
+    {Rule::kReadOnlyTold, "known whether the share is read-only", ReadOnlyTold},
+    {Rule::kShareUnlocked, "the share is not locked", ShareUnlocked},
+    {Rule::kShareWritable, "the share is not read-only", ShareWritable},
+    {Rule::kMountPoint, "not a mount point", NoMountPoint},
+    {Rule::kRealPath, "a path without links", RealPath},
 };
+static_assert(FollowsRules(kExplanations));
 
-// The line of the rule that fails, 0 for one without a record; nothing when all pass.
+const RuleKey &KeyOf(Rule rule) {
+    return kRuleKeys[static_cast<std::size_t>(rule)];
+}
+
+// The line of the record of the rule that fails, 0 for one without a record; nothing when all pass.
 std::optional<int> Run(const Place &place, std::vector<RuleOutcome> &outcomes) {
     Probe probe{place.isFull ? std::string() : place.path, place.fullPath};
     std::optional<int> failed;
-    const auto run = [&](const Rule &rule) {
-        if (failed) {
-            outcomes.push_back({rule.key, rule.label, RuleResult::kNotReached, {}, {}});
-            return;
+    for (const auto &[rule, label, check] : kExplanations) {
+        const RuleKey &key = KeyOf(rule);
+        if (place.isFull && rule == Rule::kSharePresent) {
+            continue;
         }
-        const Finding finding = rule.check(probe);
-        outcomes.push_back({rule.key, rule.label, finding.passed ? RuleResult::kPassed : RuleResult::kFailed,
+        if (failed) {
+            outcomes.push_back({key.key, label, RuleResult::kNotReached, {}, {}});
+            continue;
+        }
+        const Finding finding = check(probe);
+        outcomes.push_back({key.key, label, finding.passed ? RuleResult::kPassed : RuleResult::kFailed,
                             finding.fact, finding.remedy});
         if (!finding.passed) {
-            failed = rule.record;
+            failed = key.record.line;
         }
-    };
-    if (!place.isFull) {
-        run(kSharePathRule);
     }
-    std::for_each(std::begin(kRules), std::end(kRules), run);
     return failed;
 }
 
 // The record that the library wrote with its refusal names the rule for some of them.
 int RecordedRule() {
-    const auto wrote = [](const Rule &rule) {
-        return rule.record != 0 &&
-               Records().Find({{VORK::FILEINDEX::internal::kUtilsModule, rule.record}}) != nullptr;
-    };
-    if (wrote(kSharePathRule)) {
-        return kSharePathRule.record;
-    }
-    const auto *found = std::find_if(std::begin(kRules), std::end(kRules), wrote);
-    return found == std::end(kRules) ? 0 : found->record;
+    const auto *found = std::find_if(std::begin(kRuleKeys), std::end(kRuleKeys), [](const RuleKey &key) {
+        return key.record.line != 0 && Records().Find({key.record}) != nullptr;
+    });
+    return found == std::end(kRuleKeys) ? 0 : found->record.line;
 }
 
 bool Ask(const Place &place) {
