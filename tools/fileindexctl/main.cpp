@@ -8,9 +8,9 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <exception>
-#include <string_view>
 
 namespace {
 
@@ -31,12 +31,7 @@ void OpenStandardStreams() {
 
 // A command line that does not parse is reported as JSON too, when it asks for that anywhere.
 bool AsksForJson(int argc, const char *const argv[]) {
-    for (int i = 1; i < argc; ++i) {
-        if (std::string_view(argv[i]) == "--json") {
-            return true;
-        }
-    }
-    return false;
+    return std::find(argv, argv + argc, kJson.name) != argv + argc;
 }
 
 ExitStatus Run(const Invocation &invocation, Output &output) {

@@ -11,7 +11,6 @@ namespace VORK::FILEINDEXCTL {
 
 class Arguments {
 public:
-    /// `values` is empty for a flag that was given.
     void Set(std::string_view name, std::vector<std::string> values);
 
     bool Has(std::string_view name) const;

@@ -3,11 +3,10 @@
 /// made.
 #pragma once
 
-#include "command_line/arguments.h"
-#include "report/exit_status.h"
-#include "report/output.h"
+#include "command_line/handlers.h"
 
 #include <span>
+#include <string>
 #include <string_view>
 
 namespace VORK::FILEINDEXCTL {
@@ -36,17 +35,27 @@ struct Parameter {
     constexpr bool IsRequired() const { return !IsOption() && (takes == Takes::kOne || takes == Takes::kMany); }
 };
 
+/// \name What every command takes, and what is taken without one
+/// @{
+inline constexpr Parameter kJson = {"--json", Takes::kNothing, "", "one JSON document on the standard output"};
+inline constexpr Parameter kHelp = {"--help", Takes::kNothing, "", "show help"};
+inline constexpr Parameter kVersion = {"--version", Takes::kNothing, "", "show the version"};
+/// @}
+
 struct Command {
     std::string_view group;  ///< "share" for "share rename"; empty for a verb that stands alone
     std::string_view name;
     std::string_view help;
     std::span<const Parameter> parameters;
-    ExitStatus (*run)(const Arguments &, Output &);
+    Handler *run;
     bool hidden = false;  ///< for the build and the completions, not for users
 };
 
 /// All commands, in the order in which help shows them.
 std::span<const Command> Commands();
+
+/// "share rename"; "list".
+std::string FullName(const Command &command);
 
 /// What the commands of a group are about.
 std::string_view HelpOfGroup(std::string_view group);

@@ -85,11 +85,12 @@ constexpr Parameter kQueueShow[] = {kOneShare, {"--limit", Takes::kNumber, "N", 
 constexpr Parameter kQueueCount[] = {kOneShare};
 constexpr std::string_view kShells[] = {"bash", "zsh", "fish"};
 constexpr Parameter kCompletion[] = {{"SHELL", Takes::kOne, "", "the shell that reads it", kShells}};
-constexpr Parameter kHelp[] = {
+constexpr Parameter kHelpWords[] = {
     {"COMMAND", Takes::kOptional, "", "the command, or the first word of one that has two"},
     {"WORD", Takes::kOptional, "", "its second word"},
 };
-constexpr Parameter kPlaces[] = {{"WORD", Takes::kOptional, "", "the word so far"}};
+constexpr Parameter kOffer[] = {
+    {"--line", Takes::kRest, "WORD ...", "the words so far; the last is the one to complete"}};
 constexpr Parameter kExport[] = {
     {"--output", Takes::kOne, "FILE", "write this file, whole or not at all", {}, "-o"},
 };
@@ -148,9 +149,9 @@ constexpr Command kCommands[] = {
     {"", "export", "Write folders and status as one JSON document", kExport, ExportConfiguration},
     {"", "import", "Bring folders and status into the state that a document holds", kImport, ImportConfiguration},
     {"", "completion", "Write what completes command lines in a shell", kCompletion, WriteCompletion},
-    {"", "help", "Show what there is, or what a command takes", kHelp, ShowHelp},
+    {"", "help", "Show what there is, or what a command takes", kHelpWords, ShowHelp},
     {"", "manual", "Write the manual page", {}, WriteManual, true},
-    {"", "places", "Write what a share path can go on with", kPlaces, WritePlaces, true},
+    {"", "offer", "Write the words that may follow on a command line", kOffer, OfferWords, true},
     {"", "migrate",
      "Bring everything into line with the folders after an upgrade; switches search on; the file-sharing service "
      "learns of it at its next start",
@@ -161,6 +162,10 @@ constexpr Command kCommands[] = {
 
 std::span<const Command> Commands() {
     return kCommands;
+}
+
+std::string FullName(const Command &command) {
+    return (command.group.empty() ? "" : std::string(command.group) + " ") + std::string(command.name);
 }
 
 std::string_view HelpOfGroup(std::string_view group) {

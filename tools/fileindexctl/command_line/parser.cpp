@@ -6,7 +6,7 @@
 #include <CLI/CLI.hpp>
 
 #include <algorithm>
-#include <map>
+#include <iterator>
 #include <numeric>
 #include <utility>
 
@@ -15,16 +15,15 @@ namespace VORK::FILEINDEXCTL {
 namespace {
 
 constexpr const char *kAbout = "fileindexctl - which folders are indexed, and how far indexing is";
-constexpr const char *kSeeHelp = "; see \"fileindexctl --help\"";
 constexpr std::size_t kHelpWidth = 104;
 
 std::string Footer() {
     std::string text = "Exit status:";
     std::size_t width = text.size();
-    for (const auto &meaning : ExitMeanings()) {
+    for (const auto &meaning : kExitMeanings) {
         const std::string item =
             std::to_string(static_cast<int>(meaning.status)) + " " + std::string(meaning.words);
-        const bool last = &meaning == &ExitMeanings().back();
+        const bool last = &meaning == &std::end(kExitMeanings)[-1];
         const bool breaks = width + item.size() + 2 > kHelpWidth;
         text += (breaks ? "\n" : " ") + item + (last ? "." : ",");
         width = (breaks ? 0 : width + 1) + item.size() + 1;
@@ -84,13 +83,17 @@ std::string UnknownCommand(const std::vector<std::string> &words) {
     return {};
 }
 
+Failure UsageFailure(const std::string &text) {
+    return {ExitStatus::kUsage, text + (text.ends_with("?") ? "" : "; see \"fileindexctl --help\"")};
+}
+
 class Parser {
 public:
     Parser() : app_(kAbout, "fileindexctl") {
         app_.footer(Footer());
         app_.require_subcommand(1);
         AddJson(app_);
-        app_.set_version_flag("--version", FILEINDEXCTL_VERSION, "show the version");
+        app_.set_version_flag(std::string(kVersion.name), FILEINDEXCTL_VERSION, std::string(kVersion.help));
         for (const auto &command : Commands()) {
             AddCommand(command);
         }
@@ -108,8 +111,7 @@ public:
             invocation.help = std::string(FILEINDEXCTL_VERSION) + "\n";
             return invocation;
         } catch (const CLI::ParseError &error) {
-            const std::string text = Explain(error, own);
-            throw Failure(ExitStatus::kUsage, text + (text.ends_with("?") ? "" : kSeeHelp));
+            throw UsageFailure(Explain(error, own));
         }
         invocation.json = json_;
         for (const auto &[command, app] : commands_) {
@@ -174,7 +176,7 @@ private:
 
     // Those of the command that was named.
     std::vector<std::string_view> OptionsThere() const {
-        std::vector<std::string_view> options = {"--json", "--help"};
+        std::vector<std::string_view> options = {kJson.name, kHelp.name};
         for (const auto &[command, app] : commands_) {
             for (const auto &parameter : command->parameters) {
                 if (app->parsed() && parameter.IsOption()) {
@@ -189,15 +191,14 @@ private:
         if (command.group.empty()) {
             return app_;
         }
-        CLI::App *&group = groups_[command.group];
-        if (group == nullptr) {
-            group = app_.add_subcommand(std::string(command.group), std::string(HelpOfGroup(command.group)));
-            group->require_subcommand(1)->fallthrough();
+        if (commands_.back().first->group == command.group) {
+            return *commands_.back().second->get_parent();
         }
-        return *group;
+        CLI::App *group = app_.add_subcommand(std::string(command.group), std::string(HelpOfGroup(command.group)));
+        return *group->require_subcommand(1)->fallthrough();
     }
 
-    void AddJson(CLI::App &app) { app.add_flag("--json", json_, "one JSON document on the standard output"); }
+    void AddJson(CLI::App &app) { app.add_flag(std::string(kJson.name), json_, std::string(kJson.help)); }
 
     void AddCommand(const Command &command) {
         CLI::App &parent = ParentOf(command);
@@ -218,11 +219,10 @@ private:
         const std::string name = (letter.empty() ? letter : letter + ",") + std::string(parameter.name);
         const std::string help(parameter.help);
         if (parameter.takes == Takes::kNothing) {
-            app.add_flag_callback(
-                name, [] {}, help);
+            app.add_flag(name)->description(help);
             return;
         }
-        CLI::Option *option = app.add_option(name, CLI::callback_t([](const auto &) { return true; }), help);
+        CLI::Option *option = app.add_option(name)->description(help);
         option->type_name(std::string(parameter.IsOption() ? parameter.value : ""))
             ->required(parameter.IsRequired());
         option->expected(1, parameter.takes == Takes::kMany ? CLI::detail::expected_max_vector_size : 1);
@@ -240,12 +240,10 @@ private:
         Arguments arguments;
         for (const auto &parameter : command.parameters) {
             const CLI::Option *option = app.get_option(std::string(parameter.name));
-            if (option->count() == 0) {
-                continue;
+            if (option->count() > 0) {
+                const bool rest = parameter.takes == Takes::kRest && !rest_.empty();
+                arguments.Set(parameter.name, rest ? rest_ : option->results());
             }
-            const bool flag = parameter.takes == Takes::kNothing;
-            const bool rest = parameter.takes == Takes::kRest && !rest_.empty();
-            arguments.Set(parameter.name, flag ? std::vector<std::string>() : rest ? rest_ : option->results());
         }
         return arguments;
     }
@@ -253,7 +251,6 @@ private:
     CLI::App app_;
     bool json_ = false;
     std::vector<std::string> rest_;
-    std::map<std::string_view, CLI::App *> groups_;
     std::vector<std::pair<const Command *, CLI::App *>> commands_;
 };
 
@@ -269,7 +266,7 @@ ExitStatus ShowHelp(const Arguments &arguments, Output &output) {
     given.insert(given.end(), arguments.All("WORD").begin(), arguments.All("WORD").end());
     const std::string unknown = UnknownCommand(given);
     if (!unknown.empty()) {
-        throw Failure(ExitStatus::kUsage, unknown + (unknown.ends_with("?") ? "" : kSeeHelp));
+        throw UsageFailure(unknown);
     }
     std::vector<const char *> words = {"fileindexctl"};
     for (const auto &word : given) {
