@@ -1,7 +1,7 @@
 // Any paths: the path functions and the rule of coverage against their definitions.
 
+#include "base/path_cover.h"
 #include "checks.h"
-#include "share/at_or_under.h"
 
 #include <fileindex/folder.h>
 #include <fileindex/index_mgr.h>
@@ -45,7 +45,7 @@ void CheckBoth(const std::string &path, const std::string &above) {
     Require(ReplaceShareName(path, above) == replaced, "replaced otherwise", path);
     Require(StringStartWith(path, above) == path.starts_with(above), "prefix", path);
     const bool covered = (path + "/").starts_with(above + "/");
-    Require(internal::IsAtOrUnder(path, above) == covered, "coverage", path);
+    Require(VORK::IsAtOrUnder(path, above) == covered, "coverage", path);
     Folder folder;
     const bool resolved = folder.SetPath(above);
     Require(IndexMgr::IsPathIndexed(path, {folder}) == covered, "path indexed", path);

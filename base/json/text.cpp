@@ -13,9 +13,6 @@ namespace VORK {
 
 namespace {
 
-// Deeper documents have no use here, and a hostile one must not exhaust the stack.
-constexpr int kMaxDepth = 256;
-
 std::unique_ptr<Json::CharReader> NewReader() {
     Json::CharReaderBuilder builder;
     builder["collectComments"] = false;
@@ -24,8 +21,8 @@ std::unique_ptr<Json::CharReader> NewReader() {
     builder["strictRoot"] = false;  // a lone number or string is valid JSON
     builder["failIfExtra"] = true;
     builder["rejectDupKeys"] = false;
-    builder["skipBom"] = false;             // a byte-order mark is no part of JSON
-    builder["stackLimit"] = kMaxDepth + 1;  // a number or string counts as a level to the parser
+    builder["skipBom"] = false;                 // a byte-order mark is no part of JSON
+    builder["stackLimit"] = kMaxJsonDepth + 1;  // a number or string counts as a level to the parser
     return std::unique_ptr<Json::CharReader>(builder.newCharReader());
 }
 
@@ -92,7 +89,7 @@ private:
                 return false;
             case '[':
             case '{':
-                return ++depth_ <= kMaxDepth;
+                return ++depth_ <= kMaxJsonDepth;
             case ']':
             case '}':
                 --depth_;
@@ -228,7 +225,7 @@ bool JsonReader::Parse(std::string_view text, Json::Value &out) const {
 // Not the JSON library's writer: setting one up costs as much as sending the text it makes.
 std::string ToString(const Json::Value &value) {
     std::string out;
-    Append(out, value, kMaxDepth);
+    Append(out, value, kMaxJsonDepth);
     return out;
 }
 
@@ -237,8 +234,9 @@ bool CanBeWritten(const Json::Value &value, int levels) {
         return std::isfinite(value.asDouble());
     }
     return !IsNest(value) ||
-           (levels < kMaxDepth && std::all_of(value.begin(), value.end(),
-                                              [&](const auto &inner) { return CanBeWritten(inner, levels + 1); }));
+           (levels < kMaxJsonDepth && std::all_of(value.begin(), value.end(), [&](const auto &inner) {
+                return CanBeWritten(inner, levels + 1);
+            }));
 }
 
 void AppendQuoted(std::string &out, std::string_view content) {

@@ -11,6 +11,9 @@
 
 namespace VORK {
 
+/// Deeper documents have no use here, and a hostile one must not exhaust the stack.
+inline constexpr int kMaxJsonDepth = 256;
+
 /// A parser that can be kept for many texts: building one costs more than parsing a short line.
 class JsonReader {
 public:

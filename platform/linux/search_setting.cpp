@@ -1,7 +1,9 @@
 // The search setting: the member "search" of the platform's file.
-#include "common/document.h"
+#include "base/json/document.h"
+#include "base/platform_files.h"
+#include "base/whole_file.h"
 #include "common/failure.h"
-#include "shares/platform_file.h"
+#include "common/file_lock.h"
 
 #include <vork/error.h>
 #include <vork/search.h>
@@ -17,7 +19,7 @@ using namespace VORK::PLATFORM;
 namespace {
 
 constexpr const char *kMember = "search";
-constexpr unsigned int kModeOfNewFile = 0644;
+constexpr mode_t kModeOfNewFile = 0644;
 
 // The whole document, empty when the file was never written. Nothing, with the platform error set, on failure.
 std::optional<Json::Value> ReadDocument() {
@@ -65,7 +67,8 @@ int VORKSMBSetSpotlight(int enable) try {
         return 0;
     }
     (*document)[kMember] = wanted;
-    return ReplaceFile(kPlatformFile, FormatDocument(*document), kModeOfNewFile) ? 0 : FailErrno(errno);
+    const std::string text = FormatDocument(*document);
+    return ReplaceFile(kPlatformFile, text, kModeOfNewFile, Replacing::kSettings) ? 0 : FailErrno(errno);
 } catch (const std::exception &) {
     return Fail(VORK_ERR_IO);
 }

@@ -2,8 +2,8 @@
 /// Which folder covers which full path, and which of several governs it.
 #pragma once
 
+#include "base/path_cover.h"
 #include "folders/folder_access.h"
-#include "share/at_or_under.h"
 
 #include <fileindex/folder.h>
 

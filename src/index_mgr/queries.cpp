@@ -1,9 +1,9 @@
+#include "base/path_cover.h"
 #include "config/unlocker.h"
 #include "folders/coverage.h"
 #include "folders/folder_access.h"
 #include "no_throw.h"
 #include "records.h"
-#include "share/at_or_under.h"
 
 #include <fileindex/fileidx.h>
 #include <fileindex/folders.h>

@@ -1,11 +1,11 @@
 #include "progress/progress.h"
 
 #include "base/metadata_entry.h"
+#include "base/path_cover.h"
 #include "base/queue/event.h"
 #include "names.h"
 #include "no_throw.h"
 #include "records.h"
-#include "share/at_or_under.h"
 #include "share/location.h"
 #include "status/access.h"
 

@@ -1,6 +1,6 @@
 #include "filesystem/loop_device.h"
 
-#include "common/document.h"
+#include "base/whole_file.h"
 
 #include <sys/stat.h>
 #include <sys/sysmacros.h>

@@ -1,4 +1,5 @@
 // Whether a path shows the present or a snapshot.
+#include "base/path_cover.h"
 #include "common/failure.h"
 #include "filesystem/btrfs.h"
 #include "filesystem/path_mount.h"
@@ -25,14 +26,14 @@ constexpr std::string_view kZfsSnapshots = "/.zfs/snapshot";
 bool IsInSnapshotsOfShare(const ShareTable &shares, std::string_view path) {
     const auto holding = shares.AllHolding(path);
     return std::any_of(holding.begin(), holding.end(), [path](const Share *share) {
-        return !share->snapshot.empty() && IsAtOrBelow(path, share->path + "/" + share->snapshot);
+        return !share->snapshot.empty() && IsAtOrUnder(path, share->path + "/" + share->snapshot);
     });
 }
 
 // Told by the name: looking below it would mount the snapshot.
 bool IsInZfsSnapshotDirectory(const std::string &path) {
     const size_t start = path.find(kZfsSnapshots);
-    if (start == std::string::npos || !IsAtOrBelow(path, path.substr(0, start + kZfsSnapshots.size()))) {
+    if (start == std::string::npos || !IsAtOrUnder(path, path.substr(0, start + kZfsSnapshots.size()))) {
         return false;
     }
     const std::optional<PathMount> dataSet = FindMount(start == 0 ? "/" : path.substr(0, start));

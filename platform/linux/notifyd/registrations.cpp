@@ -1,7 +1,10 @@
 #include "notifyd/registrations.h"
 
-#include "common/document.h"
+#include "base/json/document.h"
+#include "base/platform_files.h"
+#include "base/whole_file.h"
 #include "common/failure.h"
+#include "common/file_lock.h"
 
 #include <vork/error.h>
 
@@ -17,11 +20,9 @@ namespace VORK::PLATFORM {
 namespace {
 
 constexpr const char *kDirectory = "/usr/vork/etc/vorknotifyd";
-constexpr const char *kFile = "/usr/vork/etc/vorknotifyd/registrations.json";
 constexpr const char *kLockFile = "/usr/vork/etc/vorknotifyd/registrations.lock";
 constexpr mode_t kDirectoryMode = 0755;
-constexpr unsigned int kFileMode = 0644;
-constexpr const char *kList = "registrations";
+constexpr mode_t kFileMode = 0644;
 
 bool IsAbsolutePath(const Json::Value &value) {
     return value.isString() && value.asString().rfind('/', 0) == 0 &&
@@ -37,10 +38,6 @@ bool IsWatch(const Json::Value &watch) {
     return std::all_of(ignore.begin(), ignore.end(), [](const Json::Value &name) { return name.isString(); });
 }
 
-bool IsRegistration(const Json::Value &entry) {
-    return entry.isObject() && entry["queue"].isString() && entry["name"].isString();
-}
-
 bool IsOf(const Json::Value &entry, const std::string &queuePath, const std::string &name) {
     return entry["queue"].asString() == queuePath && entry["name"].asString() == name;
 }
@@ -52,10 +49,10 @@ struct Stored {
 };
 
 std::optional<Stored> ReadStored() {
-    std::optional<std::string> text = ReadFile(kFile);
+    std::optional<std::string> text = ReadFile(kRegistrationsFile);
     if (!text && errno == ENOENT) {
         Stored fresh;
-        fresh.document[kList] = Json::Value(Json::arrayValue);
+        fresh.document[kRegistrationsKey] = Json::Value(Json::arrayValue);
         return fresh;
     }
     if (!text) {
@@ -63,8 +60,7 @@ std::optional<Stored> ReadStored() {
         return std::nullopt;
     }
     std::optional<Json::Value> document = ParseObject(*text);
-    if (!document || !(*document)[kList].isArray() ||
-        !std::all_of((*document)[kList].begin(), (*document)[kList].end(), IsRegistration)) {
+    if (!document || !HoldsRegistrations(*document)) {
         Fail(VORK_ERR_REGISTRATIONS);
         return std::nullopt;
     }
@@ -77,7 +73,7 @@ bool Write(const Stored &before, const Json::Value &after) {
     if (text == before.text) {
         return true;
     }
-    if (!ReplaceFile(kFile, text, kFileMode)) {
+    if (!ReplaceFile(kRegistrationsFile, text, kFileMode, Replacing::kSettings)) {
         FailErrno(errno);
         return false;
     }
@@ -145,10 +141,11 @@ bool StoreRegistration(const Json::Value &description, const std::string &name, 
     Json::Value registration = description;
     registration["name"] = name;
     registration["type"] = type;
-    std::vector<Json::Value> entries = AllBut(stored->document[kList], description["queue"].asString(), name);
+    std::vector<Json::Value> entries =
+        AllBut(stored->document[kRegistrationsKey], description["queue"].asString(), name);
     entries.push_back(std::move(registration));
     Json::Value document = stored->document;
-    document[kList] = ListOf(std::move(entries));
+    document[kRegistrationsKey] = ListOf(std::move(entries));
     return Write(*stored, document);
 }
 
@@ -165,12 +162,12 @@ bool RemoveRegistration(const std::string &queuePath, const std::string &name) {
     if (!stored) {
         return false;
     }
-    std::vector<Json::Value> entries = AllBut(stored->document[kList], queuePath, name);
-    if (entries.size() == stored->document[kList].size()) {
+    std::vector<Json::Value> entries = AllBut(stored->document[kRegistrationsKey], queuePath, name);
+    if (entries.size() == stored->document[kRegistrationsKey].size()) {
         return true;
     }
     Json::Value document = stored->document;
-    document[kList] = ListOf(std::move(entries));
+    document[kRegistrationsKey] = ListOf(std::move(entries));
     return Write(*stored, document);
 }
 

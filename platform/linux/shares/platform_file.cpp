@@ -1,7 +1,9 @@
 #include "shares/platform_file.h"
 
+#include "base/json/document.h"
+#include "base/platform_files.h"
 #include "base/unique_fd.h"
-#include "common/document.h"
+#include "base/whole_file.h"
 #include "common/failure.h"
 
 #include <vork/error.h>

@@ -11,8 +11,6 @@
 
 namespace VORK::PLATFORM {
 
-inline constexpr const char *kPlatformFile = "/usr/vork/etc/platform.conf";
-
 /// Keeps the parsed table for as long as the file's identity stays the same. A missing file means no shares.
 class PlatformFileShares final : public ShareSource {
 public:

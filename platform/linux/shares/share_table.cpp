@@ -44,11 +44,6 @@ bool IsComponent(std::string_view text) {
            text.find('\0') == text.npos;
 }
 
-bool IsAtOrBelow(std::string_view path, std::string_view directory) {
-    return path.substr(0, directory.size()) == directory &&
-           (path.size() == directory.size() || path[directory.size()] == '/');
-}
-
 void ShareTable::Add(Share share) {
     while (share.path.size() > 1 && share.path.back() == '/') {
         share.path.pop_back();

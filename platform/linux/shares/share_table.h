@@ -45,7 +45,4 @@ private:
 /// Whether the text can be one component of a path.
 bool IsComponent(std::string_view text);
 
-/// Whether the text is `directory` or lies below it, compared byte for byte on component boundaries.
-bool IsAtOrBelow(std::string_view path, std::string_view directory);
-
 }  // namespace VORK::PLATFORM

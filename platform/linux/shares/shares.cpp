@@ -1,4 +1,5 @@
 // Lookups of shares and of their recycle bins.
+#include "base/path_cover.h"
 #include "common/failure.h"
 #include "shares/share_source.h"
 
@@ -11,8 +12,8 @@
 #include <string>
 #include <string_view>
 
+using VORK::IsAtOrUnder;
 using VORK::PLATFORM::Fail;
-using VORK::PLATFORM::IsAtOrBelow;
 using VORK::PLATFORM::IsComponent;
 using VORK::PLATFORM::Share;
 using VORK::PLATFORM::Shares;
@@ -49,7 +50,7 @@ bool CopyOut(const std::string &text, char *buffer, int size) {
 }
 
 bool IsInBinOf(const Share *share, std::string_view fullPath) {
-    return !share->recycle.empty() && IsAtOrBelow(fullPath, share->path + "/" + share->recycle);
+    return !share->recycle.empty() && IsAtOrUnder(fullPath, share->path + "/" + share->recycle);
 }
 
 }  // namespace

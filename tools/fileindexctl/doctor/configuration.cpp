@@ -1,4 +1,5 @@
 // Do the configuration files parse, and can they be changed, by root alone?
+#include "base/path_cover.h"
 #include "doctor/finding.h"
 #include "doctor/ownership.h"
 #include "facts/platform_file.h"
@@ -52,7 +53,7 @@ Findings CheckWay(const std::string &path) {
             CheckOwnership(place, kNotForOthersToWrite,
                            "others than root can exchange the configuration, and so what root does with it");
         for (auto &finding : found) {
-            if (!LiesIn(place, kOwnDirectory)) {
+            if (!IsAtOrUnder(place.native(), kOwnDirectory)) {
                 finding.repairs.clear();
             }
         }

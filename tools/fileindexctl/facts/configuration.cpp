@@ -1,5 +1,7 @@
 #include "facts/configuration.h"
 
+#include "base/json/document.h"
+#include "base/json/text.h"
 #include "facts/paths.h"
 #include "report/failure.h"
 #include "report/folder_text.h"
@@ -7,19 +9,15 @@
 
 #include <fileindex/status.h>
 
-#include <json/reader.h>
-
 #include <algorithm>
 #include <ctime>
 #include <iterator>
-#include <memory>
 
 namespace VORK::FILEINDEXCTL {
 
 namespace {
 
 constexpr int kVersion = 1;
-constexpr int kDeepest = 256;  // as in the configuration files
 constexpr long long kNotPaused = -1;
 
 // Shares and markers are members with names of their own, which the library's questions cannot list.
@@ -83,21 +81,16 @@ public:
     }
 
     Json::Value Parse(const std::string &text) const {
-        Json::CharReaderBuilder builder;
-        Json::CharReaderBuilder::strictMode(&builder.settings_);
-        builder.settings_["stackLimit"] = kDeepest;
-        const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
-        Json::Value document;
-        std::string errors;
-        try {
-            if (reader->parse(text.data(), text.data() + text.size(), &document, &errors)) {
-                return document;
-            }
-        } catch (const Json::Exception &) {
-            Fault({}, "it is nested more deeply than " + std::to_string(kDeepest) + " levels");
+        std::string problems;
+        auto document = ParseStrictly(text, &problems);
+        if (!document && problems.empty()) {
+            Fault({}, "it is nested more deeply than " + std::to_string(kMaxJsonDepth) + " levels");
         }
-        std::replace(errors.begin(), errors.end(), '\n', ' ');
-        Fault({}, "this is no JSON: " + errors.substr(0, errors.find_last_not_of(' ') + 1));
+        if (!document) {
+            std::replace(problems.begin(), problems.end(), '\n', ' ');
+            Fault({}, "this is no JSON: " + problems.substr(0, problems.find_last_not_of(' ') + 1));
+        }
+        return std::move(*document);
     }
 
     FolderRecords Folders(const Json::Value &folders) const {

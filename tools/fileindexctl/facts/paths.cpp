@@ -1,5 +1,6 @@
 #include "facts/paths.h"
 
+#include "base/path_cover.h"
 #include "facts/platform_file.h"
 #include "facts/share_record.h"
 #include "report/failure.h"
@@ -183,15 +184,11 @@ Place RequirePlain(const std::string &given, const Folders &folders) {
     return place;
 }
 
-bool LiesIn(const std::string &path, const std::string &top) {
-    return VORK::FILEINDEX::StringStartWith(path + "/", top + "/");
-}
-
 std::vector<std::string> DownFrom(const std::string &top, const std::string &path) {
     std::vector<std::string> result{path};
     for (std::string outer = path; outer.size() > top.size();) {
         outer.erase(outer.rfind('/'));
-        if (!LiesIn(outer, top)) {
+        if (!IsAtOrUnder(outer, top)) {
             break;
         }
         result.insert(result.begin(), outer);
@@ -222,12 +219,12 @@ std::vector<std::string> Select(const Place &place, const Folders &folders, Test
 
 std::vector<std::string> Covering(const Place &place, const Folders &folders) {
     return Select(place, folders,
-                  [](const std::string &path, const std::string &folder) { return LiesIn(path, folder); });
+                  [](const std::string &path, const std::string &folder) { return IsAtOrUnder(path, folder); });
 }
 
 std::vector<std::string> Contained(const Place &place, const Folders &folders) {
     return Select(place, folders,
-                  [](const std::string &path, const std::string &folder) { return LiesIn(folder, path); });
+                  [](const std::string &path, const std::string &folder) { return IsAtOrUnder(folder, path); });
 }
 
 }  // namespace VORK::FILEINDEXCTL

@@ -57,9 +57,6 @@ std::set<std::string> SharesOf(const Folders &folders);
 
 bool IsSharePresent(const std::string &share);
 
-/// Does `path` lie at or under `top`? Both of one form.
-bool LiesIn(const std::string &path, const std::string &top);
-
 /// `path` and what it lies in, the outermost first, as far as `top`.
 std::vector<std::string> DownFrom(const std::string &top, const std::string &path);
 

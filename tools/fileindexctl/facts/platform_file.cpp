@@ -1,35 +1,27 @@
 #include "facts/platform_file.h"
 
+#include "base/json/document.h"
+#include "base/whole_file.h"
 #include "report/failure.h"
-
-#include <json/reader.h>
 
 #include <cerrno>
 #include <cstring>
-#include <fstream>
 #include <set>
 
 namespace VORK::FILEINDEXCTL {
 
 Json::Value ReadPlatformFile() {
     const std::string path = kPlatformFile;
-    std::ifstream file(path);
-    if (!file) {
+    const auto text = ReadFile(path);
+    if (!text) {
         throw Failure(errno == EACCES ? ExitStatus::kPermission : ExitStatus::kNotConfigured,
                       path + ": " + std::strerror(errno));
     }
-    Json::CharReaderBuilder builder;
-    Json::CharReaderBuilder::strictMode(&builder.settings_);
-    Json::Value document;
-    std::string errors;
-    try {
-        if (!Json::parseFromStream(builder, file, &document, &errors) || !document.isObject()) {
-            throw Failure(ExitStatus::kMalformed, path + " is not a JSON object");
-        }
-    } catch (const Json::Exception &) {  // nested too deeply
+    auto document = ParseObject(*text);
+    if (!document) {
         throw Failure(ExitStatus::kMalformed, path + " is not a JSON object");
     }
-    return document;
+    return std::move(*document);
 }
 
 std::vector<std::string> UnknownMembers(const Json::Value &document) {

@@ -3,14 +3,14 @@
 /// name only.
 #pragma once
 
+#include "base/platform_files.h"
+
 #include <json/value.h>
 
 #include <string>
 #include <vector>
 
 namespace VORK::FILEINDEXCTL {
-
-inline constexpr const char *kPlatformFile = "/usr/vork/etc/platform.conf";
 
 /// The document. Throws Failure when it is missing or malformed.
 Json::Value ReadPlatformFile();

@@ -1,17 +1,17 @@
 #include "facts/registrations.h"
 
+#include "base/json/document.h"
+#include "base/json/text.h"
+#include "base/whole_file.h"
 #include "facts/queue_files.h"
 #include "report/failure.h"
 
-#include <json/reader.h>
 #include <json/value.h>
-#include <json/writer.h>
 
 #include <algorithm>
 #include <cerrno>
 #include <chrono>
 #include <cstring>
-#include <fstream>
 #include <iterator>
 #include <thread>
 
@@ -22,61 +22,44 @@ namespace {
 constexpr unsigned kMask = 0xFFCE;
 constexpr const char *kIgnored = "@eaDir";
 
-std::string Text(const Json::Value &value) {
-    Json::StreamWriterBuilder builder;
-    builder["indentation"] = "";
-    return Json::writeString(builder, value);
-}
-
 Watches::value_type WatchOf(Json::Value entry) {
     const std::string path = entry["path"].asString();
     entry.removeMember("path");
-    return {path, Text(entry)};
-}
-
-bool IsRegistration(const Json::Value &entry) {
-    return entry.isObject() && entry["queue"].isString() && entry["name"].isString();
-}
-
-Json::Value ReadDocument() {
-    errno = 0;
-    std::ifstream file(kRegistrationsFile);
-    if (!file && errno == ENOENT) {
-        return {};
-    }
-    if (!file && errno == EACCES) {
-        throw Denied(kRegistrationsFile);
-    }
-    if (!file) {
-        throw Failure(ExitStatus::kCannotSave, std::string(kRegistrationsFile) + ": " + std::strerror(errno));
-    }
-    // As strictly as the platform, which changes nothing in a file that it refuses.
-    Json::CharReaderBuilder builder;
-    Json::CharReaderBuilder::strictMode(&builder.settings_);
-    Json::Value document;
-    std::string errors;
-    if (!Json::parseFromStream(builder, file, &document, &errors)) {
-        throw Failure(ExitStatus::kMalformed, std::string(kRegistrationsFile) + " cannot be read as JSON");
-    }
-    const Json::Value &list = document["registrations"];
-    if (!list.isArray() || !std::all_of(list.begin(), list.end(), IsRegistration)) {
-        throw Json::LogicError("no registrations");
-    }
-    return document;
-}
-
-bool IsOwn(const Json::Value &entry) {
-    return entry["name"].asString() == kRegistration;
+    return {path, ToString(entry)};
 }
 
 Failure Malformed() {
     return {ExitStatus::kMalformed, std::string(kRegistrationsFile) + " does not hold registrations"};
 }
 
+Json::Value ReadDocument() {
+    const std::string path = kRegistrationsFile;
+    const auto text = ReadFile(path);
+    if (!text && errno == ENOENT) {
+        return {};
+    }
+    if (!text) {
+        throw errno == EACCES ? Denied(path)
+                              : Failure(ExitStatus::kCannotSave, path + ": " + std::strerror(errno));
+    }
+    const auto document = ParseStrictly(*text);
+    if (!document) {
+        throw Failure(ExitStatus::kMalformed, path + " cannot be read as JSON");
+    }
+    if (!HoldsRegistrations(*document)) {
+        throw Malformed();
+    }
+    return *document;
+}
+
+bool IsOwn(const Json::Value &entry) {
+    return entry["name"].asString() == kRegistration;
+}
+
 // The first registration makes the file, and withdrawing the last leaves an empty list. Where only other programs
 // have registered, the system may still be being set up.
 bool TellsPauses(const Json::Value &document) {
-    const Json::Value &list = document["registrations"];
+    const Json::Value &list = document[kRegistrationsKey];
     return list.isArray() && (list.empty() || std::any_of(list.begin(), list.end(), IsOwn));
 }
 
@@ -85,7 +68,7 @@ bool TellsPauses(const Json::Value &document) {
 std::map<std::string, Watches> ReadRegistrations() try {
     std::map<std::string, Watches> registrations;
     const Json::Value document = ReadDocument();
-    for (const auto &entry : document["registrations"]) {
+    for (const auto &entry : document[kRegistrationsKey]) {
         if (!IsOwn(entry)) {
             continue;
         }
@@ -101,7 +84,7 @@ std::map<std::string, Watches> ReadRegistrations() try {
 
 bool IsQueuePaused(const std::string &queue) try {
     const Json::Value document = ReadDocument();
-    const Json::Value &list = document["registrations"];
+    const Json::Value &list = document[kRegistrationsKey];
     return TellsPauses(document) && std::none_of(list.begin(), list.end(), [&](const Json::Value &entry) {
                return IsOwn(entry) && entry["queue"].asString() == queue;
            });

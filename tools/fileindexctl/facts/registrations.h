@@ -3,6 +3,7 @@
 /// change registrations, not tell them.
 #pragma once
 
+#include "base/platform_files.h"
 #include "facts/paths.h"
 #include "report/output.h"
 
@@ -14,8 +15,6 @@ namespace VORK::FILEINDEXCTL {
 
 /// The name under which the library registers.
 inline constexpr const char *kRegistration = "fileindex";
-
-inline constexpr const char *kRegistrationsFile = "/usr/vork/etc/vorknotifyd/registrations.json";
 
 /// By full path, how it is watched: the rest of its entry, as text.
 using Watches = std::map<std::string, std::string>;

@@ -83,9 +83,9 @@ Failure Denied(const std::string &path) {
     return {ExitStatus::kPermission, "no permission for " + path + "; run this as the administrator"};
 }
 
-Failure ErrnoFailure(const std::string &path, const char *what) {
+Failure ErrnoFailure(const std::string &path, const char *what, ExitStatus status) {
     const int error = errno;
-    return {IsDenied(error) ? ExitStatus::kPermission : ExitStatus::kCannotSave,
+    return {IsDenied(error) ? ExitStatus::kPermission : status,
             path + " cannot be " + what + ": " + std::strerror(error)};
 }
 

@@ -38,8 +38,8 @@ void RequireMayChange();
 /// What to say when a file may not be read or written.
 Failure Denied(const std::string &path);
 
-/// "PATH cannot be WHAT", for the reason in errno.
-Failure ErrnoFailure(const std::string &path, const char *what);
+/// "PATH cannot be WHAT", for the reason in errno; with that status unless it is for lack of permission.
+Failure ErrnoFailure(const std::string &path, const char *what, ExitStatus status = ExitStatus::kCannotSave);
 
 /// The library's last error code in words and as an exit status, for an operation on the file of `config`.
 Failure FailureOf(const VORK::FILEINDEX::Config &config);

@@ -1,9 +1,8 @@
 #include "report/output.h"
 
+#include "base/json/document.h"
 #include "report/screen.h"
 #include "report/text.h"
-
-#include <json/writer.h>
 
 #include <sys/ioctl.h>
 #include <unistd.h>
@@ -35,13 +34,6 @@ void Print(std::FILE *stream, std::string_view text) {
 void Complain(std::string_view kind, const std::string &text) {
     std::fflush(stdout);  // so that a log that takes both streams keeps their order
     Print(stderr, "fileindexctl: " + std::string(kind) + Printable(text) + "\n");
-}
-
-std::string Serialise(const Json::Value &document) {
-    Json::StreamWriterBuilder builder;
-    builder["indentation"] = "";
-    builder["emitUTF8"] = true;  // names are bytes and stay what they are
-    return Json::writeString(builder, document) + "\n";
 }
 
 }  // namespace
@@ -88,7 +80,7 @@ void Output::PrintDocument(ExitStatus status) {
     document["ok"] = status == ExitStatus::kDone || (status == ExitStatus::kNo && !data_.isMember("error"));
     document["data"] = data_;
     document["warnings"] = ToArray(warnings_);
-    Print(stdout, Serialise(document));
+    Print(stdout, FormatDocument(document, ""));
 }
 
 void Output::Warn(const std::string &text) {
