@@ -3,6 +3,7 @@
 
 #include "base/json/text.h"
 #include "checks.h"
+#include "folders/media_kinds.h"
 #include "names.h"
 
 #include <fileindex/index_mgr.h>
@@ -41,7 +42,7 @@ Json::Value Governing(const Json::Value &folders, const std::string &path) {
 
 Json::Value Report(const Json::Value &before, const Json::Value &after) {
     Json::Value report;
-    for (const char *flag : names::kMediaKeys) {
+    for (const auto &[flag, member] : names::kMediaKinds) {
         report[flag] = before.isNull() || after.isNull() || before[flag] != after[flag];
     }
     return report;
@@ -54,7 +55,7 @@ Json::Value Put(Json::Value &folders, const Json::Value &element) {
     Json::Value &record = folders[path];
     record["path"] = path;
     record["name"] = element.get("name", record.get("name", ""));
-    for (const char *flag : names::kMediaKeys) {
+    for (const auto &[flag, member] : names::kMediaKinds) {
         record[flag] = element.get(flag, record.get(flag, false));
     }
     const bool known = std::count(std::begin(kShares), std::end(kShares), ShareOf(path)) > 0;
@@ -196,7 +197,7 @@ Json::Value SomeRecords(FuzzedDataProvider &input, int most) {
     for (auto left = input.ConsumeIntegralInRange(0, most); left > 0; --left) {
         Json::Value &record = records.append(Json::objectValue);
         record["path"] = input.PickValueInArray(kPaths);
-        for (const char *flag : names::kMediaKeys) {
+        for (const auto &[flag, member] : names::kMediaKinds) {
             if (input.ConsumeBool()) {
                 record[flag] = input.ConsumeBool();
             }

@@ -14,10 +14,9 @@ inline constexpr char kStatusConf[] = "/usr/vork/etc/fileindex/status.conf";
 inline constexpr char kStatusLock[] = "/tmp/fileidx_cfg_status.lock";
 inline constexpr std::size_t kMaxFolders = 1000;
 
-// Members of a folder record and of a change report.
+// Members of a folder record.
 inline constexpr char kPathKey[] = "path";
 inline constexpr char kNameKey[] = "name";
-inline constexpr const char *kMediaKeys[] = {"document", "audio", "video", "photo"};
 
 // Members of status.conf.
 inline constexpr char kResumeTimeKey[] = "resume_time";

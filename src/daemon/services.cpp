@@ -2,6 +2,7 @@
 
 #include "names.h"
 
+#include <vork/error.h>
 #include <vork/search.h>
 #include <vork/service.h>
 
@@ -12,6 +13,13 @@ namespace VORK::FILEINDEX::internal {
 namespace {
 
 constexpr int kServiceFlag = 1;  // the platform's
+
+/// The platform's last error, read in one order everywhere.
+struct PlatformError {
+    int code = VLIBCErrGet();
+    const char *file = VLIBCErrorGetFile();
+    int line = VLIBCErrorGetLine();
+};
 
 bool RestartFileSharing(const Record &failure) {
     if (VLIBServiceRestart(kFileSharingService) < 0) {
@@ -39,6 +47,18 @@ bool StopDaemon(const Record &failure) {
     if (VLIBServiceStop(kDaemonService, kServiceFlag) < 0) {
         const PlatformError error;
         syslog(LOG_ERR, "%s:%d VLIBServiceStop failed: err=[0x%04X %s:%d]", failure.module, failure.line,
+               error.code, error.file, error.line);
+        return false;
+    }
+    return true;
+}
+
+bool StopDaemonAfterUpgrade() {
+    if (VLIBServiceStop(kDaemonService, kServiceFlag) < 0) {
+        const PlatformError error;
+        const Record &failure = records::kUpgradeStop;
+        // The words name the start although the stop failed; support tools know the record by them.
+        syslog(LOG_ERR, "%s:%d VLIBServiceStart failed: err=[0x%04X %s:%d]", failure.module, failure.line,
                error.code, error.file, error.line);
         return false;
     }

@@ -1,6 +1,7 @@
 #include "base/json/elements.h"
 #include "base/json/text.h"
 #include "folders/folder_access.h"
+#include "folders/media_kinds.h"
 #include "names.h"
 #include "progress/progress.h"
 #include "records.h"
@@ -23,10 +24,9 @@ using internal::kPathKey;
 bool Folder::Load(const std::string &sharePath, const Json::Value &record) {
     path = sharePath;
     RetrieveStringFromJsonObj(name, kNameKey, record);
-    RetrieveBoolFromJsonObj(document, "document", record);
-    RetrieveBoolFromJsonObj(audio, "audio", record);
-    RetrieveBoolFromJsonObj(video, "video", record);
-    RetrieveBoolFromJsonObj(photo, "photo", record);
+    for (const auto &[key, flag] : internal::kMediaKinds) {
+        RetrieveBoolFromJsonObj(this->*flag, key, record);
+    }
     return internal::FolderAccess::Resolve(*this);
 }
 
@@ -59,10 +59,9 @@ Json::Value Folder::asJson() const {
     Json::Value record(Json::objectValue);
     record[kPathKey] = path;
     record[kNameKey] = name;
-    record["document"] = document;
-    record["audio"] = audio;
-    record["video"] = video;
-    record["photo"] = photo;
+    for (const auto &[key, flag] : internal::kMediaKinds) {
+        record[key] = this->*flag;
+    }
     return record;
 }
 

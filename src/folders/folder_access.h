@@ -11,9 +11,6 @@
 
 namespace VORK::FILEINDEX::internal {
 
-/// In the order of kMediaKeys.
-inline constexpr bool Folder::*kMediaFlags[] = {&Folder::document, &Folder::audio, &Folder::video, &Folder::photo};
-
 struct FolderAccess {
     /// The full path as found when the path was set, without asking again; empty when it could not be resolved.
     static const std::string &StoredFullPath(const Folder &folder) { return folder.full_path_; }

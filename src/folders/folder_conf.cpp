@@ -2,6 +2,7 @@
 #include "base/json/text.h"
 #include "config/load_save.h"
 #include "folders/folder_access.h"
+#include "folders/media_kinds.h"
 #include "names.h"
 #include "records.h"
 
@@ -22,24 +23,18 @@ namespace FILEINDEX {
 
 namespace {
 
-int CountUnresolved(const std::map<std::string, Folder> &folders) {
-    const auto unresolved = [](const auto &entry) {
-        return internal::FolderAccess::StoredFullPath(entry.second).empty();
-    };
-    return static_cast<int>(std::count_if(folders.begin(), folders.end(), unresolved));
-}
-
 /// A member of folder.conf. The views live as long as the text and the home of its decoded strings.
 struct StoredFolder {
     std::string_view path;
     std::string_view name{};
-    bool flags[std::size(internal::kMediaKeys)] = {};  ///< in the order of kMediaKeys
+    bool flags[std::size(internal::kMediaKinds)] = {};  ///< in the order of kMediaKinds
 };
 
 bool *FlagOf(StoredFolder &record, std::string_view key) {
-    const auto kind = std::find(std::begin(internal::kMediaKeys), std::end(internal::kMediaKeys), key);
-    return kind == std::end(internal::kMediaKeys) ? nullptr
-                                                  : &record.flags[kind - std::begin(internal::kMediaKeys)];
+    const auto *kind = std::find_if(std::begin(internal::kMediaKinds), std::end(internal::kMediaKinds),
+                                    [&](const internal::MediaKind &known) { return known.key == key; });
+    return kind == std::end(internal::kMediaKinds) ? nullptr
+                                                   : &record.flags[kind - std::begin(internal::kMediaKinds)];
 }
 
 /// All records of a folder.conf in its usual form: in ascending order of their paths. False when it is not quite
@@ -134,13 +129,12 @@ bool FolderAccess::TakeText(Folders &store, std::string_view text) {
         folder.path = record.path;
         folder.name = record.name;
         for (std::size_t kind = 0; kind < std::size(record.flags); ++kind) {
-            folder.*kMediaFlags[kind] = record.flags[kind];
+            folder.*kMediaKinds[kind].flag = record.flags[kind];
         }
         Resolve(folder);  // a folder whose share is away stays in the list
         std::string key = folder.path;
         store.folders_.emplace_hint(store.folders_.end(), std::move(key), std::move(folder));
     }
-    store.unresolved_ = CountUnresolved(store.folders_);
     return true;
 }
 
@@ -164,7 +158,6 @@ bool FolderAccess::TakeDocument(Folders &store) {
         folder.Load(path, *it);  // a folder whose share is away stays in the list
         store.folders_.emplace(path, std::move(folder));
     }
-    store.unresolved_ = CountUnresolved(store.folders_);
     return true;
 }
 

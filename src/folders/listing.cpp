@@ -1,4 +1,4 @@
-#include "folders/folder_access.h"
+#include "folders/media_kinds.h"
 #include "names.h"
 #include "no_throw.h"
 
@@ -7,8 +7,6 @@
 #include <vork/text.h>
 
 #include <algorithm>
-#include <cstddef>
-#include <iterator>
 #include <string>
 #include <vector>
 
@@ -33,9 +31,9 @@ void SortByFlag(Sorted &folders, bool Folder::*field) {
 }
 
 void Sort(Sorted &folders, const std::string &sortBy) {
-    for (std::size_t kind = 0; kind < std::size(internal::kMediaKeys); ++kind) {
-        if (sortBy == internal::kMediaKeys[kind]) {
-            SortByFlag(folders, internal::kMediaFlags[kind]);
+    for (const auto &[key, flag] : internal::kMediaKinds) {
+        if (sortBy == key) {
+            SortByFlag(folders, flag);
             return;
         }
     }

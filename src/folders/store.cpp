@@ -1,6 +1,6 @@
 #include "base/json/text.h"
 #include "folders/coverage.h"
-#include "folders/folder_access.h"
+#include "folders/media_kinds.h"
 #include "names.h"
 #include "no_throw.h"
 #include "records.h"
@@ -12,9 +12,6 @@
 
 #include <syslog.h>
 
-#include <algorithm>
-#include <cstddef>
-#include <iterator>
 #include <utility>
 
 namespace VORK {
@@ -26,67 +23,24 @@ namespace {
 
 using FolderMap = std::map<std::string, Folder>;
 
-template <typename Iterator>
-const Folder *FirstCovering(Iterator it, Iterator end, const std::string &fullPath) {
-    const auto found =
-        std::find_if(it, end, [&](const auto &entry) { return internal::Covers(entry.second, fullPath); });
-    return found == end ? nullptr : &found->second;
-}
-
-/// The store as it was or will be, without a copy of it: the record stored under `path` is `own` (null: none is).
-class StoreWith {
-public:
-    StoreWith(const FolderMap &folders, const std::string &path, const Folder *own)
-        : folders_(folders), own_(own), before_(folders.lower_bound(path)), after_(folders.upper_bound(path)) {}
-
-    /// Null when no folder governs the full path. Where some have no full path each folder is asked in the list's
-    /// order, because each of those leaves a record; otherwise from the end, as the last one that covers governs.
-    const Folder *Governing(const std::string &fullPath, bool allResolved) const {
-        return allResolved ? LastCovering(fullPath) : AskAll(fullPath);
+/// The folder that governs the full path, null when there is none; `leftOut` counts as not stored. Folders without
+/// a full path are all tried again, and each leaves its record.
+const Folder *GoverningIn(const FolderMap &folders, const std::string &fullPath, const Folder *leftOut = nullptr) {
+    internal::Governing governing(fullPath);
+    for (const auto &[path, folder] : folders) {
+        if (&folder != leftOut) {
+            governing.Consider(folder);
+        }
     }
-
-private:
-    const Folder *AskAll(const std::string &fullPath) const {
-        internal::Governing governing(fullPath);
-        for (auto it = folders_.begin(); it != before_; ++it) {
-            governing.Consider(it->second);
-        }
-        if (own_ != nullptr) {
-            governing.Consider(*own_);
-        }
-        for (auto it = after_; it != folders_.end(); ++it) {
-            governing.Consider(it->second);
-        }
-        return governing.Get();
-    }
-
-    const Folder *LastCovering(const std::string &fullPath) const {
-        const Folder *found = FirstCovering(folders_.rbegin(), std::make_reverse_iterator(after_), fullPath);
-        if (found == nullptr && own_ != nullptr && internal::Covers(*own_, fullPath)) {
-            found = own_;
-        }
-        return found != nullptr ? found
-                                : FirstCovering(std::make_reverse_iterator(before_), folders_.rend(), fullPath);
-    }
-
-    const FolderMap &folders_;
-    const Folder *own_;
-    FolderMap::const_iterator before_;
-    FolderMap::const_iterator after_;
-};
-
-bool IsUnresolved(const Folder &folder) {
-    return internal::FolderAccess::StoredFullPath(folder).empty();
+    return governing.Get();
 }
 
 /// True for each media kind that is indexed differently after the change. A side that no folder governs always
 /// counts as a difference.
 Json::Value ChangeReport(const Folder *before, const Folder *after) {
     Json::Value report(Json::objectValue);
-    for (std::size_t kind = 0; kind < std::size(internal::kMediaKeys); ++kind) {
-        const bool Folder::*flag = internal::kMediaFlags[kind];
-        report[internal::kMediaKeys[kind]] =
-            before == nullptr || after == nullptr || before->*flag != after->*flag;
+    for (const auto &[key, flag] : internal::kMediaKinds) {
+        report[key] = before == nullptr || after == nullptr || before->*flag != after->*flag;
     }
     return report;
 }
@@ -146,27 +100,22 @@ bool Folders::Upsert(Json::Value &out, const Json::Value &folder) {
             ErrorHandler::SetError(FILEINDEX_ERR_BAD_PARAM);  // over the path error: the request is what is wrong
             return false;
         }
-        const bool allResolved = unresolved_ == 0;
         const auto found = folders_.find(path);
         const bool known = found != folders_.end();
         Folder updated = known ? found->second : Folder();
-        if (known) {
-            updated.Load(path, folder);
-        } else {
-            updated.Reload(path, folder);
-            folders_.emplace(path, updated);
-            unresolved_ += IsUnresolved(updated) ? 1 : 0;
+        updated.Load(path, folder);
+        const Folder *added = nullptr;
+        if (!known) {
+            added = &folders_.emplace(path, updated).first->second;
             if (folders_.size() > internal::kMaxFolders) {
                 syslog(LOG_ERR, "%s:%d Exceed max folder size", kFoldersModule, __LINE__);
                 ErrorHandler::SetError(FILEINDEX_ERR_EXCEED_MAX_FOLDER);
                 return false;
             }
         }
-        const StoreWith asItWas(folders_, path, known ? &found->second : nullptr);
         // After the change the record itself counts, even where a folder later in the list governs the path.
-        out = ChangeReport(asItWas.Governing(fullPath, allResolved), &updated);
+        out = ChangeReport(GoverningIn(folders_, fullPath, added), &updated);
         if (known) {
-            unresolved_ += (IsUnresolved(updated) ? 1 : 0) - (IsUnresolved(found->second) ? 1 : 0);
             found->second = std::move(updated);
         }
         return true;
@@ -175,18 +124,18 @@ bool Folders::Upsert(Json::Value &out, const Json::Value &folder) {
 
 bool Folders::Delete(Json::Value &out, const std::string &path) {
     return internal::NoThrow([&] {
-        const bool allResolved = unresolved_ == 0;
-        const auto removed = folders_.extract(path);
-        const Folder *own = removed ? &removed.mapped() : nullptr;
-        unresolved_ -= own != nullptr && IsUnresolved(*own) ? 1 : 0;
+        const auto found = folders_.find(path);
+        const bool known = found != folders_.end();
         std::string fullPath;
-        if (!GetFullPath(fullPath, path)) {
-            return true;  // a folder of a share that is gone can still be removed
+        if (GetFullPath(fullPath, path)) {  // a folder of a share that is gone can be removed all the same
+            const Folder *before = GoverningIn(folders_, fullPath);
+            const Folder *after = GoverningIn(folders_, fullPath, known ? &found->second : nullptr);
+            out = Json::Value(Json::objectValue);
+            out[path] = ChangeReport(before, after);
         }
-        const Folder *before = StoreWith(folders_, path, own).Governing(fullPath, allResolved);
-        const Folder *after = StoreWith(folders_, path, nullptr).Governing(fullPath, unresolved_ == 0);
-        out = Json::Value(Json::objectValue);
-        out[path] = ChangeReport(before, after);
+        if (known) {
+            folders_.erase(found);
+        }
         return true;
     });
 }

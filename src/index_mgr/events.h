@@ -1,8 +1,8 @@
 /// \file
-/// The events that follow a saved change, each queued for one of several paths of a request.
+/// The events that tell of a saved change.
 #pragma once
 
-#include "queue/events.h"
+#include "records.h"
 
 #include <json/value.h>
 
@@ -10,10 +10,16 @@
 
 namespace VORK::FILEINDEX::internal {
 
-/// The share paths of a change map: its member names.
-PendingReindexes PendingReindexesOf(const Json::Value &reports);
+/// The records of one operation for an event that cannot be queued.
+struct EventRecords {
+    Record path;   ///< its share is unknown
+    Record event;  ///< its queue refuses it
+};
 
-/// IndexMgr::Update for one of several paths.
-bool UpdateOne(PendingReindexes &pending, const std::string &path, const Json::Value &data);
+/// GetFullPath for an event; when the share is unknown, the record and FILEINDEX_ERR_PATH.
+bool ResolveForEvent(std::string &fullPath, const std::string &path, const Record &failure);
+
+/// Queues a settings event for each share path of the reports, its member names; stops at the first that fails.
+bool QueueReports(const Json::Value &reports, const EventRecords &failures);
 
 }  // namespace VORK::FILEINDEX::internal

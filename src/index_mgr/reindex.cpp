@@ -1,6 +1,6 @@
 #include "base/json/elements.h"
 #include "base/json/text.h"
-#include "names.h"
+#include "index_mgr/events.h"
 #include "no_throw.h"
 #include "queue/events.h"
 #include "records.h"
@@ -84,10 +84,7 @@ bool IndexMgr::Reindex(const Json::Value &jsArrPath) {
         for (const Json::Value &element : Elements(jsArrPath)) {
             const std::string path = element.asString();
             std::string fullPath;
-            if (!GetFullPath(fullPath, path)) {
-                syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", records::kReindexPath.module,
-                       records::kReindexPath.line, path.c_str());
-                ErrorHandler::SetError(FILEINDEX_ERR_PATH);
+            if (!ResolveForEvent(fullPath, path, records::kReindexPath)) {
                 return false;
             }
             if (!AddEvent(pending, kReindexEvent, fullPath, path, Json::Value())) {

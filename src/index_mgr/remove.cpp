@@ -15,7 +15,6 @@
 #include <fileindex/error.h>
 #include <fileindex/folders.h>
 #include <fileindex/index_mgr.h>
-#include <fileindex/paths.h>
 
 #include <syslog.h>
 
@@ -48,14 +47,9 @@ bool DeleteAll(Folders &store, const Json::Value &paths, Changes &changes) {
                    records::kDeleteElement.line, path.c_str());
             return false;
         }
-        changes.reports[path] = report;
-        std::string share;
-        if (!GetShareNameByPath(share, path)) {
-            syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", records::kDeleteShare.module,
-                   records::kDeleteShare.line, path.c_str());
+        if (!changes.Add(path, report, records::kDeleteShare)) {
             return false;
         }
-        changes.shares.insert(share);
     }
     return true;
 }
@@ -77,17 +71,14 @@ bool SendCommands(const Json::Value &paths) {
 }
 
 bool QueueEvents(const Json::Value &reports) {
-    PendingReindexes pending = PendingReindexesOf(reports);
-    for (auto report = reports.begin(); report != reports.end(); ++report) {
-        if (!UpdateOne(pending, report.name(), *report)) {
-            syslog(LOG_ERR, "%s:%d Update failed", records::kDeleteEvent.module, records::kDeleteEvent.line);
-            return false;
-        }
+    if (QueueReports(reports, {records::kUpdatePath, records::kUpdateEvent})) {
+        return true;
     }
-    return true;
+    syslog(LOG_ERR, "%s:%d Update failed", records::kDeleteEvent.module, records::kDeleteEvent.line);
+    return false;
 }
 
-bool FollowShare(Folders &saved, const std::string &share) {
+bool FollowShare(const Folders &saved, const std::string &share) {
     if (IndexMgr::IsShareIndexed(share)) {
         if (IndexMgr::UpsertVorkNotifydCfg(share)) {
             return true;

@@ -1,6 +1,5 @@
 #include "daemon/services.h"
 #include "folders/folder_access.h"
-#include "names.h"
 #include "no_throw.h"
 #include "records.h"
 
@@ -8,8 +7,6 @@
 #include <fileindex/index_mgr.h>
 #include <fileindex/paths.h>
 #include <fileindex/updater.h>
-
-#include <vork/service.h>
 
 #include <syslog.h>
 
@@ -23,17 +20,6 @@ namespace FILEINDEX {
 using namespace internal;
 
 namespace {
-
-bool StopIndexing() {
-    if (VLIBServiceStop(kDaemonService, 1) >= 0) {
-        return true;
-    }
-    // The words name the start although the stop failed; support tools know the record by them.
-    const PlatformError error;
-    syslog(LOG_ERR, "%s:%d VLIBServiceStart failed: err=[0x%04X %s:%d]", records::kUpgradeStop.module,
-           records::kUpgradeStop.line, error.code, error.file, error.line);
-    return false;
-}
 
 bool StartIndexing(const std::vector<Folder> &folders) {
     if (!StartDaemon(records::kUpgradeStart) || !SetSearch(!folders.empty(), records::kUpgradeSearch)) {
@@ -74,7 +60,7 @@ bool Updater_zol60_beta2() {
         if (!FolderAccess::Load(store) || !store.List(folders)) {
             return false;
         }
-        return folders.empty() ? StopIndexing() : StartIndexing(folders);
+        return folders.empty() ? StopDaemonAfterUpgrade() : StartIndexing(folders);
     });
 }
 

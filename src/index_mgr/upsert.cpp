@@ -14,7 +14,6 @@
 #include <fileindex/folders.h>
 #include <fileindex/index_mgr.h>
 #include <fileindex/json_access.h>
-#include <fileindex/paths.h>
 
 #include <syslog.h>
 
@@ -42,14 +41,9 @@ bool UpsertAll(Folders &store, const Json::Value &folders, Changes &changes) {
                    records::kUpsertElement.line, ToString(element).c_str());
             return false;
         }
-        changes.reports[path] = report;
-        std::string share;
-        if (!GetShareNameByPath(share, path)) {
-            syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", records::kUpsertShare.module,
-                   records::kUpsertShare.line, path.c_str());
+        if (!changes.Add(path, report, records::kUpsertShare)) {
             return false;
         }
-        changes.shares.insert(share);
     }
     return true;
 }
@@ -72,26 +66,6 @@ bool SendCommands(const Json::Value &folders) {
         if (!SendCammandToDaemon(kUpsertCommand, command)) {
             syslog(LOG_ERR, "%s:%d SendCammandToDaemon failed", records::kUpsertSend.module,
                    records::kUpsertSend.line);
-            return false;
-        }
-    }
-    return true;
-}
-
-bool QueueEvents(const Json::Value &reports) {
-    PendingReindexes pending = PendingReindexesOf(reports);
-    for (auto report = reports.begin(); report != reports.end(); ++report) {
-        const std::string path = report.name();
-        std::string fullPath;
-        if (!GetFullPath(fullPath, path)) {
-            syslog(LOG_ERR, "%s:%d GetFullPath failed, path=%s", records::kUpsertPath.module,
-                   records::kUpsertPath.line, path.c_str());
-            ErrorHandler::SetError(FILEINDEX_ERR_PATH);
-            return false;
-        }
-        if (!AddEvent(pending, kSettingEvent, fullPath, path, *report)) {
-            syslog(LOG_ERR, "%s:%d AddCustomEvent failed", records::kUpsertEvent.module,
-                   records::kUpsertEvent.line);
             return false;
         }
     }
@@ -121,7 +95,8 @@ bool IndexMgr::Upsert(const Json::Value &folders) {
             return false;
         }
         EnsureSearch(true, records::kUpsertSearch, records::kUpsertRestart);
-        return SendCommands(folders) && QueueEvents(changes.reports);
+        return SendCommands(folders) &&
+               QueueReports(changes.reports, {records::kUpsertPath, records::kUpsertEvent});
     });
 }
 
