@@ -4,28 +4,34 @@
 
 #include "facts/paths.h"
 #include "facts/patience.h"
-
-#include <vork/share.h>
+#include "facts/status_file.h"
+#include "report/failure.h"
+#include "report/output.h"
 
 #include <json/value.h>
 
+#include <sys/stat.h>
+
 #include <functional>
-#include <map>
+#include <optional>
+#include <set>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace VORK::FILEINDEXCTL::DOCTOR {
+
+/// Mends something, and sets the name under which the former state is kept, if it is. Throws Failure.
+using Action = std::function<void(Patience &patience, std::string &copy)>;
 
 struct Repair {
     std::string target;                   ///< the file that changes, or the service
     std::string does;                     ///< what it does with the target: "gives it mode 0600"
     std::vector<std::string> difference;  ///< "- ..." what is, "+ ..." what will be
+    Action act{};
 
-    /// Mends it; answers the name under which the former state is kept, if it is. Throws Failure. Not there:
-    /// `edit` is.
-    std::function<std::string(Patience &)> act{};
-
-    /// A change to the document of status.conf, if it still has that fault. All of these are made in one go.
+    /// Instead of `act`: changes the document of status.conf, if it still has that fault. All of these are made in
+    /// one go.
     std::function<void(Json::Value &)> edit{};
 
     bool replaces = false;  ///< does `edit` do without the former document, which may not even parse?
@@ -38,65 +44,105 @@ enum class Level {
     kNote,        ///< may be as somebody wants it, or does not matter on this machine
     kUnexamined,  ///< could not be looked at, mostly for want of rights
 };
+using enum Level;
+
+using Items = std::vector<std::string>;
 
 struct Finding {
+    const char *check;
+    Level level;
     std::string what;    ///< without the items
+    Items items;         ///< the files, folders or shares it is about
     std::string why;     ///< why it matters
-    std::string remedy;  ///< "%" stands for the item, as a word of a shell command
-    Repairs repairs{};
-    Level level = Level::kWrong;
-
-    /// The files, folders or shares it is about. Findings that differ in nothing else become one.
-    std::vector<std::string> items{};
+    std::string remedy;  ///< "%" stands for the first item, as a word of a shell command
+    Repairs repairs;
 };
 
-using Findings = std::vector<Finding>;
+class Findings {
+public:
+    /// What is added from now on was found by this check.
+    void Begin(const char *check) { check_ = check; }
 
-void Append(Findings &findings, const Findings &more);
+    /// Findings of a check that differ in nothing but their items become one. A repair that does nothing is none.
+    void Add(Level level, const std::string &what, const Items &items, const std::string &why,
+             const std::string &remedy, const Repair &repair = {});
 
-/// What this user may not look at.
-Finding NotAllowed(const std::string &what, const std::vector<std::string> &items = {});
+    /// What this user may not look at.
+    void AddNotAllowed(const std::string &what, const Items &items = {});
+
+    const std::vector<Finding> &All() const { return all_; }
+
+    Repairs AllRepairs() const;
+
+    /// By one check or, without a name, by all.
+    std::size_t Count(Level level, std::string_view check) const;
+
+private:
+    const char *check_ = "";
+    std::vector<Finding> all_;
+};
 
 /// What several checks look at. A configuration that cannot be read leaves it empty; its own check reports that.
 struct Facts {
+    Facts();
+
     Folders folders{};
-    bool areFoldersKnown = false;
-    Json::Value status{Json::objectValue};          ///< the document of status.conf
-    std::vector<std::string> configuredShares{};    ///< by the platform's configuration
-    bool areSharesKnown = false;                    ///< all of them: its every entry is understood and usable
-    std::map<std::string, unsigned> folderCount{};  ///< by share
+    bool areFoldersKnown = true;
+    std::set<std::string> indexedShares{};  ///< those with folders
+    StatusFile status{};
+
+    Json::Value platform{Json::objectValue};      ///< the platform's configuration
+    std::optional<Failure> platformFailure{};     ///< why it could not be read
+    std::vector<std::string> configuredShares{};  ///< by it
+    bool areSharesKnown = false;                  ///< all of them: its every entry is understood and usable
 };
 
-struct Check {
-    const char *name;
-    Findings (*run)(const Facts &);
-    bool needsFolders;  ///< it looks at nothing when the folders are not known
-};
+// repairs.cpp
 
-Facts Look();
+/// Gives the file another name, with the time in it, and answers that. Throws Failure.
+std::string SetAside(const std::string &path);
+
+/// The same, for a copy; empty when there is nothing to copy.
+std::string KeepCopy(const std::string &path);
+
+/// Makes the changes, keeping a copy beside each file whose content changes. A repair that fails is reported as a
+/// warning, and the others go on.
+void CarryOut(const Repairs &repairs, Patience &patience, Output &output);
+
+// ownership.cpp
+
+inline constexpr mode_t kNotForOthersToWrite = 0;  ///< and otherwise as it is
+
+/// Sets owner and mode.
+Action Correcting(const std::string &path, mode_t mode);
+
+/// Findings about a regular file or a directory that is to belong to root. Nothing for one that is not there, nor
+/// for a link. A file with further names is left to people: its owner may have meant another one of them.
+/// `mend` may be empty.
+void CheckOwnership(const std::string &path, mode_t mode, const std::string &why, const Action &mend,
+                    Findings &findings);
+
+/// Why a file may be somebody else's, for a `kind` like "a queue"; empty when it is root's alone.
+std::string ForeignText(const struct stat &status, const std::string &kind);
 
 // configuration.cpp
-Findings CheckConfiguration(const Facts &facts);
+void CheckConfiguration(Facts &facts, Findings &findings);
 
 // locks.cpp
-Findings CheckLocks(const Facts &facts);
+void CheckLocks(Facts &facts, Findings &findings);
+void CheckHolders(const std::string &path, const std::string &why, const std::string &remedy, Findings &findings);
 
 // services.cpp
-Findings CheckDaemon(const Facts &facts);
-Findings CheckServices(const Facts &facts);
-Findings CheckSearch(const Facts &facts);
+void CheckDaemon(Facts &facts, Findings &findings);
+void CheckServices(Facts &facts, Findings &findings);
+void CheckSearch(Facts &facts, Findings &findings);
+void CheckMonitor(Facts &facts, Findings &findings);
 
 // shares.cpp
-Findings CheckShares(const Facts &facts);
-Findings CheckFlags(const Facts &facts);
+void CheckShares(Facts &facts, Findings &findings);
+void CheckFlags(Facts &facts, Findings &findings);
 
 // queues.cpp
-Findings CheckQueues(const Facts &facts);
-
-/// The path of the share's queue. Asking the library for it would make or take over the directory.
-std::string QueueOf(const VORKSHARE &share);
-
-// monitor.cpp
-Findings CheckMonitor(const Facts &facts);
+void CheckQueues(Facts &facts, Findings &findings);
 
 }  // namespace VORK::FILEINDEXCTL::DOCTOR

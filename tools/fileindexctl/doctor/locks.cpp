@@ -1,10 +1,7 @@
 // The two lock files: are they root's alone, so that nobody else can hold them, and does somebody keep one?
 #include "base/unique_fd.h"
 #include "doctor/finding.h"
-#include "doctor/ownership.h"
 #include "facts/file_locks.h"
-#include "facts/status_file.h"
-#include "report/failure.h"
 
 #include <fileindex/folders.h>
 
@@ -14,13 +11,18 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <filesystem>
+#include <system_error>
 
 namespace VORK::FILEINDEXCTL::DOCTOR {
 
 namespace {
 
+constexpr mode_t kMode = 0600;
+constexpr const char *kMade = "+ owner 0:0, mode 0600";
+
 void Make(const std::string &path) {
-    if (!UniqueFd(open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0600))) {
+    if (!UniqueFd(open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, kMode))) {
         throw ErrnoFailure(path, "made");
     }
 }
@@ -35,10 +37,7 @@ std::string Defect(const struct stat &status) {
     if (!S_ISREG(status.st_mode)) {
         return S_ISLNK(status.st_mode) ? "a link in the place of a lock file" : "no regular file for a lock";
     }
-    if (status.st_nlink > 1) {
-        return "a lock file that has further names (hard links)";
-    }
-    return status.st_uid == 0 ? "" : "a lock file that user " + std::to_string(status.st_uid) + " owns";
+    return ForeignText(status, "a lock file");
 }
 
 // While nobody holds it: the lock is taken, and the name goes before the lock does, so that nobody takes the one
@@ -61,84 +60,71 @@ void Remove(const std::string &path) {
     }
 }
 
-Finding Missing(const std::string &path) {
-    const auto act = [path](Patience &) {
+void ReportMissing(const std::string &path, Findings &findings) {
+    findings.Add(kNote, "lock file not made yet", {path},
+                 "the library makes it with mode 0644; then everybody may hold it", "install -m 600 /dev/null %",
+                 {path, "makes it, with mode 0600", {kMade}, [path](Patience &, std::string &) { Make(path); }});
+}
+
+void ReportDefect(const std::string &path, const struct stat &status, const std::string &meanwhile,
+                  Findings &findings) {
+    const auto replace = [path](Patience &, std::string &) {
+        Remove(path);
         Make(path);
-        return std::string();
     };
-    return {"lock file not made yet",
-            "the library makes it with mode 0644; then everybody may hold it",
-            "install -m 600 /dev/null %",
-            {{path, "makes it, with mode 0600", {"+ owner 0:0, mode 0600"}, act}},
-            Level::kNote,
-            {path}};
+    findings.Add(kWrong, Defect(status), {path}, "the lock cannot be relied on, so " + meanwhile,
+                 std::string(S_ISDIR(status.st_mode) ? "rm -r" : "rm") + " %; the next change makes it anew",
+                 {path,
+                  "removes this name if nobody holds the file, and makes a new one, with mode 0600",
+                  {"- " + Defect(status), kMade},
+                  LosesNothing(status) ? replace : Action()});
 }
 
-Finding Unusable(const std::string &path, const struct stat &status, const std::string &meanwhile) {
-    Finding finding{
-        Defect(status),
-        "the lock cannot be relied on, so " + meanwhile,
-        S_ISDIR(status.st_mode) ? "rm -r %; the next change makes it anew" : "rm %; the next change makes it anew",
-        {},
-        Level::kWrong,
-        {path}};
-    if (LosesNothing(status)) {
-        const auto act = [path](Patience &) {
-            Remove(path);
-            Make(path);
-            return std::string();
-        };
-        finding.repairs = {{path,
-                            "removes this name if nobody holds the file, and makes a new one, with mode 0600",
-                            {"- " + Defect(status), "+ owner 0:0, mode 0600"},
-                            act}};
-    }
-    return finding;
-}
-
-Findings CheckLock(const std::string &path, const std::string &meanwhile) {
+void CheckLock(const std::string &path, const std::string &meanwhile, Findings &findings) {
     struct stat status {};
     if (lstat(path.c_str(), &status) != 0) {
-        return {Missing(path)};
+        ReportMissing(path, findings);
+        return;
     }
-    Findings findings =
-        Defect(status).empty()
-            ? CheckOwnership(path, kClosed, "everybody who may read it can hold it, and stop all changes")
-            : Findings{Unusable(path, status, meanwhile)};
-    const auto holders = LastingLockHolders(path);
-    if (!holders.empty()) {
-        findings.push_back({path + " is held by " + HolderText(holders), meanwhile + " meanwhile",
-                            "wait for that program, or end it"});
+    if (Defect(status).empty()) {
+        CheckOwnership(path, kMode, "everybody who may read it can hold it, and stop all changes",
+                       Correcting(path, kMode), findings);
+    } else {
+        ReportDefect(path, status, meanwhile, findings);
     }
-    return findings;
+    CheckHolders(path, meanwhile + " meanwhile", "wait for that program, or end it", findings);
 }
 
 // Locks in a /tmp of our own keep nobody out, and nobody's locks keep us out.
-Findings CheckDirectoryOfLocks() {
+void CheckDirectoryOfLocks(Findings &findings) {
     constexpr const char *kHosts = "/proc/1/root/tmp";
-    struct stat ours {};
-    struct stat hosts {};
-    if (stat(kHosts, &hosts) != 0) {
-        return errno == EACCES || errno == EPERM
-                   ? Findings{NotAllowed("whether /tmp is everybody's, by " + std::string(kHosts))}
-                   : Findings();
+    if (faccessat(AT_FDCWD, kHosts, F_OK, AT_EACCESS) != 0) {
+        if (errno == EACCES || errno == EPERM) {
+            findings.AddNotAllowed("whether /tmp is everybody's, by " + std::string(kHosts));
+        }
+        return;
     }
-    if (stat("/tmp", &ours) == 0 && ours.st_dev == hosts.st_dev && ours.st_ino == hosts.st_ino) {
-        return {};
+    std::error_code error;
+    if (!std::filesystem::equivalent("/tmp", kHosts, error)) {
+        findings.Add(kWrong, "this program sees another /tmp than the machine's first process", {},
+                     "the locks of other programs are not seen: two may change the configuration at once",
+                     "run this outside; a service that changes the configuration must have PrivateTmp=no");
     }
-    return {{"this program sees another /tmp than the machine's first process",
-             "the locks of other programs are not seen: two may change the configuration at once",
-             "run this outside; a service that changes the configuration must have PrivateTmp=no"}};
 }
 
 }  // namespace
 
-Findings CheckLocks(const Facts & /*facts*/) {
-    Findings findings = CheckDirectoryOfLocks();
-    Append(findings,
-           CheckLock(VORK::FILEINDEX::Folders().GetLockPath(), "no folder can be added, changed or removed"));
-    Append(findings, CheckLock(StatusFile().GetLockPath(), "indexing can be neither paused nor resumed"));
-    return findings;
+void CheckHolders(const std::string &path, const std::string &why, const std::string &remedy, Findings &findings) {
+    const auto holders = LastingLockHolders(path);
+    if (!holders.empty()) {
+        findings.Add(kWrong, path + " is held by " + HolderText(holders), {}, why, remedy);
+    }
+}
+
+void CheckLocks(Facts &facts, Findings &findings) {
+    CheckDirectoryOfLocks(findings);
+    CheckLock(VORK::FILEINDEX::Folders().GetLockPath(), "no folder can be added, changed or removed", findings);
+    CheckLock(facts.status.GetLockPath(), "indexing can be neither paused nor resumed", findings);
 }
 
 }  // namespace VORK::FILEINDEXCTL::DOCTOR

@@ -1,9 +1,9 @@
-#include "doctor/ownership.h"
-
+// Owner and mode of files and directories.
 #include "base/unique_fd.h"
-#include "report/failure.h"
+#include "doctor/finding.h"
 
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <array>
@@ -12,10 +12,6 @@
 namespace VORK::FILEINDEXCTL::DOCTOR {
 
 namespace {
-
-mode_t Mended(mode_t mode, Modes modes) {
-    return ((mode | modes.required) & ~modes.forbidden) & 07777U;
-}
 
 std::string OctalText(mode_t mode) {
     std::array<char, 16> text{};
@@ -32,24 +28,24 @@ bool MayBeMended(const struct stat &status) {
     return S_ISDIR(status.st_mode) || (S_ISREG(status.st_mode) && status.st_nlink == 1);
 }
 
-struct stat AfterMending(struct stat status, Modes modes) {
+struct stat AfterMending(struct stat status, mode_t mode) {
     if (status.st_uid != 0) {
         status.st_uid = 0;
         status.st_gid = 0;
     }
-    status.st_mode = Mended(status.st_mode, modes);
+    status.st_mode = mode != kNotForOthersToWrite ? mode : status.st_mode & 07755U;
     return status;
 }
 
 // On the file that was opened, whatever stands under its name by now.
-void Correct(const std::string &path, Modes modes) {
+void Correct(const std::string &path, mode_t mode) {
     const UniqueFd file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
     struct stat status {};
     const bool opened = file && fstat(file.Get(), &status) == 0;
     if (opened && !MayBeMended(status)) {
         throw Failure(ExitStatus::kCannotSave, path + " has been replaced meanwhile, or has further names");
     }
-    const struct stat after = AfterMending(status, modes);
+    const struct stat after = AfterMending(status, mode);
     if (!opened || (status.st_uid != 0 && fchown(file.Get(), after.st_uid, after.st_gid) != 0) ||
         fchmod(file.Get(), after.st_mode) != 0) {
         throw ErrnoFailure(path, "changed");
@@ -58,35 +54,36 @@ void Correct(const std::string &path, Modes modes) {
 
 }  // namespace
 
-Findings CheckOwnership(const std::string &path, Modes modes, const std::string &why) {
+Action Correcting(const std::string &path, mode_t mode) {
+    return [path, mode](Patience &, std::string &) { Correct(path, mode); };
+}
+
+void CheckOwnership(const std::string &path, mode_t mode, const std::string &why, const Action &mend,
+                    Findings &findings) {
     struct stat status {};
     if (lstat(path.c_str(), &status) != 0 || (!S_ISREG(status.st_mode) && !S_ISDIR(status.st_mode))) {
-        return {};
+        return;
     }
-    const mode_t mended = Mended(status.st_mode, modes);
-    if (status.st_uid == 0 && (status.st_mode & 07777U) == mended) {
-        return {};
+    const struct stat after = AfterMending(status, mode);
+    const std::string is = OwnershipText(status);
+    const std::string becomes = OwnershipText(after);
+    if (is == becomes) {
+        return;
     }
-    const std::string now = OwnershipText(status);
     if (!MayBeMended(status)) {
-        return {{now + ", and further names (hard links)",
-                 why,
-                 "put a copy of % into its place, which is root's",
-                 {},
-                 Level::kWrong,
-                 {path}}};
+        return findings.Add(kWrong, is + ", and further names (hard links)", {path}, why,
+                            "put a copy of % into its place, which is root's");
     }
-    const auto act = [path, modes](Patience &) {
-        Correct(path, modes);
-        return std::string();
-    };
-    const std::string does = "gives it to root, with mode " + OctalText(mended);
-    return {{now,
-             why,
-             "chown root %; chmod " + OctalText(mended) + " %",
-             {{path, does, {"- " + now, "+ " + OwnershipText(AfterMending(status, modes))}, act}},
-             Level::kWrong,
-             {path}}};
+    const std::string modeText = OctalText(after.st_mode);
+    findings.Add(kWrong, is, {path}, why, "chown root %; chmod " + modeText + " %",
+                 {path, "gives it to root, with mode " + modeText, {"- " + is, "+ " + becomes}, mend});
+}
+
+std::string ForeignText(const struct stat &status, const std::string &kind) {
+    if (status.st_nlink > 1) {
+        return kind + " that has further names (hard links)";
+    }
+    return status.st_uid == 0 ? "" : kind + " that user " + std::to_string(status.st_uid) + " owns";
 }
 
 }  // namespace VORK::FILEINDEXCTL::DOCTOR

@@ -1,10 +1,8 @@
 // The queues: can events get in, can only root write them, and is everything in them legible?
 #include "doctor/finding.h"
-#include "doctor/ownership.h"
-#include "facts/file_locks.h"
 #include "facts/queue_files.h"
 #include "facts/share_record.h"
-#include "report/failure.h"
+#include "report/text.h"
 
 #include <vork/metadata.h>
 
@@ -19,46 +17,42 @@ namespace VORK::FILEINDEXCTL::DOCTOR {
 
 namespace {
 
-constexpr const char *kMetadata = "/@eaDir";
-constexpr const char *kQueue = "/VORK@file_index_queue";
 constexpr const char *kWhyNotWritable = "changes are not indexed until a reindex: their events cannot be queued";
 constexpr const char *kWhyNotRoots =
     "others than root can write events, take them away, or have root write somewhere else";
 
+std::string Reindex(const std::string &share) {
+    return "\"fileindexctl reindex " + ShellWord("/" + share) + "\"";
+}
+
 // By the administrator; what others may not write to, he may.
-Findings CheckWritable(const std::string &path) {
+void CheckWritable(const std::string &path, Findings &findings) {
     if (faccessat(AT_FDCWD, path.c_str(), W_OK, AT_EACCESS) == 0) {
-        return {};
+        return;
     }
     if (errno != EROFS && geteuid() != 0) {
-        return {NotAllowed("whether events can be queued", {path})};
+        findings.AddNotAllowed("whether events can be queued", {path});
+    } else {
+        findings.Add(kWrong, path + " is not writable: " + std::strerror(errno), {}, kWhyNotWritable,
+                     "make it writable");
     }
-    return {{path + " is not writable: " + std::strerror(errno), kWhyNotWritable, "make it writable"}};
 }
 
-Finding Planted(const std::string &what, const std::string &path, const std::string &share) {
-    return {what, kWhyNotRoots,  "rm %, then \"fileindexctl reindex " + ShellWord("/" + share) + "\"",
-            {},   Level::kWrong, {path}};
-}
-
-Findings CheckFile(const std::string &path, const std::string &share) {
+void CheckFile(const std::string &path, const std::string &share, Findings &findings) {
     struct stat status {};
     if (lstat(path.c_str(), &status) != 0) {
-        return {};
+        return;
     }
-    if (!S_ISREG(status.st_mode)) {
-        return {Planted("a queue that is no regular file", path, share)};
+    const std::string defect =
+        S_ISREG(status.st_mode) ? ForeignText(status, "a queue") : "a queue that is no regular file";
+    if (defect.empty()) {
+        CheckOwnership(path, kNotForOthersToWrite, kWhyNotRoots, Correcting(path, kNotForOthersToWrite), findings);
+    } else {  // what is in it may be made up, so it is not taken over
+        findings.Add(kWrong, defect, {path}, kWhyNotRoots, "rm %, then " + Reindex(share));
     }
-    if (status.st_nlink != 1) {
-        return {Planted("a queue that has further names (hard links)", path, share)};
-    }
-    // What is in it may be made up, so it is not taken over.
-    return status.st_uid != 0
-               ? Findings{Planted("a queue that user " + std::to_string(status.st_uid) + " owns", path, share)}
-               : CheckOwnership(path, kNotForOthersToWrite, kWhyNotRoots);
 }
 
-Findings CheckLines(const std::string &queue, const std::string &share) {
+void CheckLines(const std::string &queue, const std::string &share, Findings &findings) {
     unsigned long count = 0;
     std::string first;
     try {
@@ -70,75 +64,63 @@ Findings CheckLines(const std::string &queue, const std::string &share) {
             }
         });
     } catch (const Failure &) {
-        return {NotAllowed("what is in a queue", {queue})};
+        return findings.AddNotAllowed("what is in a queue", {queue});
     }
-    if (count == 0) {
-        return {};
+    if (count > 0) {
+        findings.Add(kWrong,
+                     "the queue of the share " + Quoted(share) + " has " + std::to_string(count) +
+                         (count == 1 ? " malformed line: " : " malformed lines; the first is ") + first,
+                     {}, "what they told is lost, and not indexed", Reindex(share));
     }
-    return {{"the queue of the share " + Quoted(share) + " has " + std::to_string(count) +
-                 (count == 1 ? " malformed line: " : " malformed lines; the first is ") + first,
-             "what they told is lost, and not indexed",
-             "\"fileindexctl reindex " + ShellWord("/" + share) + "\""}};
 }
 
 // The platform also sets aside what is not root's in it.
-void LeaveToPlatform(Finding &finding, const std::string &directory) {
-    for (Repair &repair : finding.repairs) {
-        repair.act = [directory](Patience &) {
-            if (VORKEAMKDir(0, directory.c_str()) < 0) {
-                throw Failure(ExitStatus::kCannotSave, directory + " cannot be given to root");
-            }
-            return std::string();
-        };
-    }
+Action LeavingToPlatform(const std::string &directory) {
+    return [directory](Patience &, std::string &) {
+        if (VORKEAMKDir(0, directory.c_str()) < 0) {
+            throw Failure(ExitStatus::kCannotSave, directory + " cannot be given to root");
+        }
+    };
 }
 
-Findings CheckQueue(const std::string &share, const VORKSHARE &record) {
-    const std::string queue = QueueOf(record);
-    const std::string directory = std::string(record.szPath) + kMetadata;
+void CheckQueue(const std::string &share, const std::string &shareDirectory, Findings &findings) {
+    const std::string queue = QueuePathOf(share);
+    const std::string directory = queue.substr(0, queue.rfind('/'));
     struct stat status {};
     if (lstat(directory.c_str(), &status) != 0) {
-        return errno == ENOENT   ? CheckWritable(record.szPath)
-               : errno == EACCES ? Findings{NotAllowed("a queue", {queue})}
-                                 : Findings{{directory + ": " + std::strerror(errno), kWhyNotWritable, "mend it"}};
+        switch (errno) {
+            case ENOENT:
+                return CheckWritable(shareDirectory, findings);
+            case EACCES:
+                return findings.AddNotAllowed("a queue", {queue});
+            default:
+                return findings.Add(kWrong, directory + ": " + std::strerror(errno), {}, kWhyNotWritable,
+                                    "mend it");
+        }
     }
     if (!S_ISDIR(status.st_mode)) {
-        return {
-            {"a link, or no directory", kWhyNotWritable, "rm %; it is made anew", {}, Level::kWrong, {directory}}};
+        return findings.Add(kWrong, "a link, or no directory", {directory}, kWhyNotWritable,
+                            "rm %; it is made anew");
     }
-    Findings findings = CheckOwnership(directory, kNotForOthersToWrite, kWhyNotRoots);
-    for (Finding &finding : findings) {
-        LeaveToPlatform(finding, directory);
-    }
-    Append(findings, CheckFile(queue, share));
-    Append(findings, CheckFile(queue + ".tmp", share));
-    Append(findings, CheckWritable(directory));
-    Append(findings, CheckLines(queue, share));
-    const auto holders = LastingLockHolders(queue);
-    if (!holders.empty()) {
-        findings.push_back(
-            {queue + " is held by " + HolderText(holders), "events that come meanwhile are dropped",
-             "wait for that program or end it, then \"fileindexctl reindex " + ShellWord("/" + share) + "\""});
-    }
-    return findings;
+    CheckOwnership(directory, kNotForOthersToWrite, kWhyNotRoots, LeavingToPlatform(directory), findings);
+    CheckFile(queue, share, findings);
+    CheckFile(queue + ".tmp", share, findings);
+    CheckWritable(directory, findings);
+    CheckLines(queue, share, findings);
+    CheckHolders(queue, "events that come meanwhile are dropped",
+                 "wait for that program or end it, then " + Reindex(share), findings);
 }
 
 }  // namespace
 
-std::string QueueOf(const VORKSHARE &share) {
-    return std::string(share.szPath) + kMetadata + kQueue;
-}
-
-Findings CheckQueues(const Facts &facts) {
-    Findings findings;
-    for (const auto &[share, count] : facts.folderCount) {
+void CheckQueues(Facts &facts, Findings &findings) {
+    for (const auto &share : facts.indexedShares) {
         const SharePointer record = FindShare(share);
         struct stat status {};
         if (record && stat(record->szPath, &status) == 0) {
-            Append(findings, CheckQueue(share, *record));
+            CheckQueue(share, record->szPath, findings);
         }
     }
-    return findings;
 }
 
 }  // namespace VORK::FILEINDEXCTL::DOCTOR

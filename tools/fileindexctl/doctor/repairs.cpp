@@ -1,9 +1,6 @@
-#include "doctor/repairs.h"
-
+// Mending what was found.
+#include "doctor/finding.h"
 #include "facts/config_lock.h"
-#include "facts/status_file.h"
-#include "report/failure.h"
-#include "report/text.h"
 
 #include <algorithm>
 #include <array>
@@ -43,7 +40,7 @@ void Report(const std::string &target, const std::string &copy, Output &output) 
     entry["target"] = target;
     entry["copy"] = copy.empty() ? Json::Value() : Json::Value(copy);
     output.Data()["changed"].append(entry);
-    output.Line(Printable("changed " + target + (copy.empty() ? "" : "; as it was: " + copy)));
+    output.Line("changed " + target + (copy.empty() ? "" : "; as it was: " + copy));
 }
 
 // All edits of status.conf, on what it holds now.
@@ -51,12 +48,8 @@ void Edit(const Repairs &repairs, Patience &patience, Output &output) {
     StatusFile file;
     ForgetErrors();
     const ConfigLock lock(file, patience);
-    if (!lock.IsHeld()) {
-        throw FailureOf(file);
-    }
-    const bool replaces =
-        std::any_of(repairs.begin(), repairs.end(), [](const Repair &repair) { return repair.replaces; });
-    if (!file.Load() && !replaces) {
+    const bool replaces = std::any_of(repairs.begin(), repairs.end(), std::mem_fn(&Repair::replaces));
+    if (!lock.IsHeld() || (!file.Load() && !replaces)) {
         throw FailureOf(file);
     }
     bool any = false;
@@ -108,20 +101,17 @@ std::string KeepCopy(const std::string &path) {
     return copy;
 }
 
-void ShowDifference(const Repairs &repairs, Output &output) {
-    for (const auto &repair : repairs) {
-        output.Line(Printable("to change: " + repair.target));
-        for (const auto &line : repair.difference) {
-            output.Line("  " + line, line.front() == '-' ? Colour::kBad : Colour::kGood);
-        }
-    }
-}
-
 void CarryOut(const Repairs &repairs, Patience &patience, Output &output) {
     // Directories, owners and modes come first: saving needs them.
     for (const auto &repair : repairs) {
         if (repair.act) {
-            Try([&] { Report(repair.target, repair.act(patience), output); }, output);
+            Try(
+                [&] {
+                    std::string copy;
+                    repair.act(patience, copy);
+                    Report(repair.target, copy, output);
+                },
+                output);
         }
     }
     Try([&] { Edit(repairs, patience, output); }, output);

@@ -1,21 +1,19 @@
-// The programs on the other side: the daemon, the services, the search setting. While no folder is indexed, none
-// of them has to be there.
+// The programs on the other side: the daemon, the services, the search setting, the file-change monitor. While no
+// folder is indexed, none of them has to be there.
 #include "doctor/finding.h"
-#include "doctor/repairs.h"
+#include "facts/config_lock.h"
 #include "facts/daemon.h"
-#include "facts/patience.h"
 #include "facts/platform_file.h"
+#include "facts/queue_files.h"
+#include "facts/registrations.h"
 #include "facts/system_services.h"
-#include "report/failure.h"
 
-#include <vork/process.h>
+#include <fileindex/folders.h>
+#include <fileindex/index_mgr.h>
+
 #include <vork/search.h>
 #include <vork/service.h>
 
-#include <unistd.h>
-
-#include <algorithm>
-#include <array>
 #include <chrono>
 
 namespace VORK::FILEINDEXCTL::DOCTOR {
@@ -26,58 +24,32 @@ constexpr const char *kDaemon = "fileindexd";
 constexpr const char *kFileSharing = "samba";  // the platform's name for it
 constexpr std::chrono::seconds kLongestStart(3);
 
-// Without systemd it cannot be told.
-bool IsLeftOutAtBoot(const std::string &name) {
-    return RunsSystemd() && !Systemctl("is-enabled", name);
-}
-
-std::string StartCommand(const std::string &name) {
-    return RunsSystemd() ? "systemctl start " + name : "service " + name + " start";
-}
-
-bool IsDaemonThere() {
-    const DaemonCondition condition = ProbeDaemon().condition;
-    return condition != DaemonCondition::kAbsent && condition != DaemonCondition::kStale;
-}
-
 // The service may report success before the daemon listens, or while it fails.
-std::string Start(Patience & /*patience*/) {
+void Start(Patience & /*patience*/, std::string & /*copy*/) {
     if (VLIBServiceStart(kDaemon, 1) < 0) {
-        throw Failure(ExitStatus::kUnreachable, std::string(kDaemon) + " could not be started");
+        throw Failure(ExitStatus::kUnreachable, "fileindexd could not be started");
     }
     Patience patience(kLongestStart);
-    while (!IsDaemonThere()) {
+    while (!ProbeDaemon().listens.value_or(true)) {
         if (!patience.Again()) {
             throw Failure(ExitStatus::kUnreachable,
-                          std::string(kDaemon) +
-                              " was started, but does not listen; the system log may tell "
-                              "why");
+                          "fileindexd was started, but does not listen; the system log may tell why");
         }
     }
-    return {};
 }
 
-Finding Standstill(const std::string &what) {
-    Finding finding{what, "folders are indexed, but nobody does it, and commands are lost", StartCommand(kDaemon)};
-    if (IsServiceKnown(kDaemon)) {
-        finding.repairs = {
-            {kDaemon, "starts it", {"- not running", "+ running, also after the next boot"}, Start}};
-    }
-    return finding;
+void ReportStandstill(const std::string &what, Findings &findings) {
+    findings.Add(kWrong, "fileindexd does not run: " + what, {},
+                 "folders are indexed, but nobody does it, and commands are lost",
+                 RunsSystemd() ? "systemctl start fileindexd" : "service fileindexd start",
+                 {kDaemon,
+                  "starts it",
+                  {"- not running", "+ running, also after the next boot"},
+                  IsServiceKnown(kDaemon) ? Start : Action()});
 }
 
-// Otherwise the setting reads as off, and there is another finding.
-bool IsPlatformReadable() {
-    try {
-        ReadPlatformFile();
-        return true;
-    } catch (const Failure &) {
-        return false;
-    }
-}
-
-std::string SwitchSearchOn(Patience & /*patience*/) {
-    std::string copy = KeepCopy(kPlatformFile);
+void SwitchSearchOn(Patience & /*patience*/, std::string &copy) {
+    copy = KeepCopy(kPlatformFile);
     if (VORKSMBSetSpotlight(1) < 0) {
         throw Failure(ExitStatus::kCannotSave, "the search setting could not be changed");
     }
@@ -85,95 +57,137 @@ std::string SwitchSearchOn(Patience & /*patience*/) {
         throw Failure(ExitStatus::kUnreachable,
                       "search is on, but the file-sharing service could not be restarted");
     }
-    return copy;
 }
 
 // Nothing is lost yet.
-Findings CheckIdleDaemon() {
-    const DaemonCondition condition = ProbeDaemon().condition;
-    if (condition != DaemonCondition::kAbsent && condition != DaemonCondition::kStale) {
-        return {};
+void CheckIdleDaemon(Findings &findings) {
+    if (!ProbeDaemon().listens.value_or(true)) {
+        findings.Add(kNote, "fileindexd does not run", {}, "no folder is indexed, so nothing is missed",
+                     IsServiceKnown(kDaemon) ? "the first folder that is added starts it"
+                                             : "install the daemon's package before the first folder is added");
     }
-    return {{"fileindexd does not run",
-             "no folder is indexed, so nothing is missed",
-             IsServiceKnown(kDaemon) ? "the first folder that is added starts it"
-                                     : "install the daemon's package before the first folder is added",
-             {},
-             Level::kNote}};
+}
+
+// Of all shares with folders: which of them were paused is lost with the file.
+void RegisterAnew(Patience &patience, std::string &copy) {
+    VORK::FILEINDEX::Folders store;
+    ForgetErrors();
+    const ConfigLock lock(store, patience);
+    if (!lock.IsHeld()) {
+        throw FailureOf(store);
+    }
+    try {
+        ReadRegistrations();
+        return;  // somebody else was faster
+    } catch (const Failure &) {
+        copy = SetAside(kRegistrationsFile);
+    }
+    std::vector<std::string> failed;
+    for (const auto &share : SharesOf(ReadFolders())) {
+        if (IsSharePresent(share) && !VORK::FILEINDEX::IndexMgr::UpsertVorkNotifydCfg(share)) {
+            failed.push_back(share);
+        }
+    }
+    if (!failed.empty()) {
+        throw Failure(ExitStatus::kPartly,
+                      "not registered: " + Enumerate(failed) + "; the former registrations are " + copy);
+    }
+}
+
+void ReportBroken(const std::string &what, const Facts &facts, Findings &findings) {
+    const Items shares(facts.indexedShares.begin(), facts.indexedShares.end());
+    findings.Add(
+        kWrong, what, {}, "no change is noticed, and \"add\", \"set\" and \"remove\" fail at the monitor",
+        "put the file aside, then \"fileindexctl monitor refresh\"",
+        {kRegistrationsFile,
+         "puts the file aside and registers every share with indexed folders anew; those that were paused "
+         "cannot be told from the others, and go on",
+         {"- what cannot be read, registrations of other programs included",
+          "+ registered: " + (shares.empty() ? "nothing" : Enumerate(shares))},
+         RegisterAnew});
 }
 
 }  // namespace
 
-Findings CheckDaemon(const Facts &facts) {
+void CheckDaemon(Facts &facts, Findings &findings) {
     if (facts.folders.empty()) {
-        return CheckIdleDaemon();
+        return CheckIdleDaemon(findings);
     }
     const std::string socket = kDaemonSocket;
     const DaemonState state = ProbeDaemon();
     switch (state.condition) {
         case DaemonCondition::kListening:
-            return {};
+            return;
         case DaemonCondition::kAbsent:
-            return {Standstill("fileindexd does not run: there is no " + socket)};
+            return ReportStandstill("there is no " + socket, findings);
         case DaemonCondition::kStale:
-            return {Standstill("fileindexd does not run: nobody listens on " + socket + ", which is left over")};
+            return ReportStandstill("nobody listens on " + socket + ", which is left over", findings);
         case DaemonCondition::kFull:
-            return {{"fileindexd accepts no connections on " + socket,
-                     "it hangs: commands wait, and fail in the end",
-                     "restart fileindexd; the system log may tell what it waits for"}};
+            return findings.Add(kWrong, "fileindexd accepts no connections on " + socket, {},
+                                "it hangs: commands wait, and fail in the end",
+                                "restart fileindexd; the system log may tell what it waits for");
         case DaemonCondition::kDenied:
-            return state.listens.value_or(false) ? Findings() : Findings{NotAllowed("whether fileindexd listens")};
+            if (!state.listens) {
+                findings.AddNotAllowed("whether fileindexd listens");
+            }
+            return;
         case DaemonCondition::kUnknown:
-            break;
+            return findings.Add(kUnexamined, "whether fileindexd listens cannot be told: " + state.text, {},
+                                "commands may not reach it", "see the system log");
     }
-    return {{"whether fileindexd listens cannot be told: " + state.text,
-             "commands may not reach it",
-             "see the system log",
-             {},
-             Level::kUnexamined}};
 }
 
-Findings CheckServices(const Facts &facts) {
+void CheckServices(Facts &facts, Findings &findings) {
     if (facts.folders.empty()) {
-        return {};
+        return;
     }
-    Findings findings;
     if (!IsServiceKnown(kDaemon)) {
-        findings.push_back({"this machine has no service fileindexd",
-                            "the daemon cannot be started and stopped as folders come and go",
-                            "install the daemon's package"});
-    } else if (IsLeftOutAtBoot(kDaemon)) {
-        findings.push_back({"fileindexd is not started at boot", "indexing stops with the next boot",
-                            "systemctl enable fileindexd"});
+        findings.Add(kWrong, "this machine has no service fileindexd", {},
+                     "the daemon cannot be started and stopped as folders come and go",
+                     "install the daemon's package");
+    } else if (RunsSystemd() && !Systemctl("is-enabled", kDaemon)) {  // without systemd it cannot be told
+        findings.Add(kWrong, "fileindexd is not started at boot", {}, "indexing stops with the next boot",
+                     "systemctl enable fileindexd");
     }
     if (!IsFileSharingThere()) {
-        findings.push_back({"this machine has no file-sharing service (smbd or smb)",
-                            "the search setting is without effect, which indexing does not need",
-                            "install the package of Samba if clients are to search",
-                            {},
-                            Level::kNote});
+        findings.Add(kNote, "this machine has no file-sharing service (smbd or smb)", {},
+                     "the search setting is without effect, which indexing does not need",
+                     "install the package of Samba if clients are to search");
     }
-    return findings;
 }
 
-Findings CheckSearch(const Facts &facts) {
+void CheckSearch(Facts &facts, Findings &findings) {
     if (facts.folders.empty() || VORKSMBIsEnableSpotlight() != 0 || !IsFileSharingThere()) {
-        return {};
+        return;
     }
-    if (!IsPlatformReadable()) {
-        return {{"the search setting is not known",
-                 std::string(kPlatformFile) + " cannot be read",
-                 "mend what is found in the configuration",
-                 {},
-                 Level::kUnexamined}};
+    const std::string file = kPlatformFile;
+    if (facts.platformFailure) {  // the setting reads as off
+        return findings.Add(kUnexamined, "the search setting is not known", {}, file + " cannot be read",
+                            "mend what is found in the configuration");
     }
-    Finding finding{"the search setting is off", "folders are indexed, but clients cannot search them",
-                    "switch it on in " + std::string(kPlatformFile) + ", and restart the file-sharing service"};
-    finding.repairs = {{kPlatformFile,
-                        "switches it on, and restarts the file-sharing service",
-                        {"- \"search\": false", "+ \"search\": true"},
-                        SwitchSearchOn}};
-    return {finding};
+    findings.Add(kWrong, "the search setting is off", {}, "folders are indexed, but clients cannot search them",
+                 "switch it on in " + file + ", and restart the file-sharing service",
+                 {file,
+                  "switches it on, and restarts the file-sharing service",
+                  {"- \"search\": false", "+ \"search\": true"},
+                  SwitchSearchOn});
+}
+
+void CheckMonitor(Facts &facts, Findings &findings) try {
+    const auto registrations = ReadRegistrations();
+    for (const auto &share : facts.indexedShares) {
+        const std::string queue = QueuePathOf(share);
+        if (!queue.empty() && registrations.count(queue) == 0) {
+            findings.Add(kNote, "paused share", {share}, "changes in it are not noticed",
+                         "\"fileindexctl share resume %\" if it is to go on");
+        }
+    }
+} catch (const Failure &failure) {
+    if (failure.Status() == ExitStatus::kPermission) {
+        findings.AddNotAllowed(failure.what());
+    } else {
+        ReportBroken(failure.what(), facts, findings);
+    }
 }
 
 }  // namespace VORK::FILEINDEXCTL::DOCTOR
