@@ -1,5 +1,6 @@
 #include "base/whole_file.h"
 
+#include "base/flush.h"
 #include "base/unique_fd.h"
 
 #include <sys/stat.h>
@@ -58,7 +59,7 @@ bool WriteTemporary(std::string &temporary, const std::string &target, std::stri
                     Replacing what) {
     UniqueFd file = OpenTemporary(temporary, what);
     return file && WriteAll(file.Get(), text) && TakeOver(file.Get(), target, modeIfNew, what) &&
-           fsync(file.Get()) == 0 && file.Close();
+           Flush(fsync, file.Get()) && file.Close();
 }
 
 // Makes the rename itself durable. The new text is in place whatever comes of it.
@@ -66,7 +67,7 @@ void SyncDirectoryOf(const std::string &path) {
     const std::string parent = path.substr(0, path.rfind('/') + 1);
     const UniqueFd directory = Open(parent.empty() ? "." : parent.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
     if (directory) {
-        fsync(directory.Get());
+        (void)Flush(fsync, directory.Get());
     }
 }
 

@@ -1,5 +1,6 @@
 #include "config/in_place_file.h"
 
+#include "base/flush.h"
 #include "base/unique_fd.h"
 #include "config/tail.h"
 
@@ -68,19 +69,6 @@ bool ReadAll(int fd, off_t sizeHint, std::string &out) {
             out.resize(used * 2);
         }
     }
-}
-
-/// Calls `flush` (fsync or fdatasync). A file system that knows no flush counts as flushed.
-bool Flush(int (*flush)(int), int fd) {
-    for (int interruptions = 0; flush(fd) != 0; ++interruptions) {
-        if (errno == EINVAL || errno == ENOSYS) {
-            return true;
-        }
-        if (errno != EINTR || interruptions == kMaxInterruptions) {
-            return false;
-        }
-    }
-    return true;
 }
 
 bool FlushData(int fd) {
