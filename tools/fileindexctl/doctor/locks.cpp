@@ -117,7 +117,7 @@ void CheckDirectoryOfLocks(Findings &findings) {
 void CheckHolders(const std::string &path, const std::string &why, const std::string &remedy, Findings &findings) {
     const auto holders = LastingLockHolders(path);
     if (!holders.empty()) {
-        findings.Add(kWrong, path + " is held by " + HolderText(holders), {}, why, remedy);
+        findings.Add(kWrong, path + " is held by " + holders, {}, why, remedy);
     }
 }
 

@@ -3,11 +3,10 @@
 #include "base/json/document.h"
 #include "base/json/text.h"
 #include "facts/paths.h"
+#include "facts/status_file.h"
 #include "report/failure.h"
 #include "report/folder_text.h"
 #include "report/text.h"
-
-#include <fileindex/status.h>
 
 #include <algorithm>
 #include <ctime>
@@ -19,34 +18,6 @@ namespace {
 
 constexpr int kVersion = 1;
 constexpr long long kNotPaused = -1;
-
-// Shares and markers are members with names of their own, which the library's questions cannot list.
-class StatusFile : public VORK::FILEINDEX::Status {
-public:
-    std::set<std::string> MembersOf(const char *name) const {
-        const Json::Value none(Json::objectValue);
-        return document_.isObject() ? Names(document_.get(name, none)) : std::set<std::string>();
-    }
-
-    std::set<std::string> Markers() {
-        std::set<std::string> markers = Names(document_);
-        std::erase_if(markers, [this](const std::string &name) { return IsOwn(name) || !IsUpdated(name); });
-        return markers;
-    }
-
-    static bool IsOwn(const std::string &name) {
-        return name == "resume_time" || name == "no_space" || name == "need_reindex";
-    }
-
-private:
-    static std::set<std::string> Names(const Json::Value &object) {
-        if (!object.isObject()) {
-            return {};
-        }
-        const auto names = object.getMemberNames();
-        return {names.begin(), names.end()};
-    }
-};
 
 // A pause that is over reads as none.
 long long InEffect(long long resumeTime) {
@@ -192,19 +163,8 @@ FolderRecords StoredFolders() {
 
 StatusSettings StoredStatus() {
     StatusFile file;
-    ForgetErrors();
-    if (!file.Load()) {
-        throw FailureOf(file);
-    }
-    StatusSettings settings;
-    if (!file.GetPauseInfo(settings.resumeTime)) {
-        throw Failure(ExitStatus::kMalformed, file.GetPath() + ": \"resume_time\" is no number");
-    }
-    settings.resumeTime = InEffect(settings.resumeTime);
-    settings.noSpace = file.MembersOf("no_space");
-    settings.needReindex = file.MembersOf("need_reindex");
-    settings.markers = file.Markers();
-    return settings;
+    const long long resumeTime = file.LoadPause();
+    return {InEffect(resumeTime), file.Marked("no_space"), file.Marked("need_reindex"), file.Markers()};
 }
 
 Json::Value DocumentOf(const FolderRecords &folders, const StatusSettings &status) {

@@ -1,5 +1,6 @@
 #include "facts/file_locks.h"
 
+#include "base/whole_file.h"
 #include "facts/mounts.h"
 #include "report/text.h"
 
@@ -11,9 +12,9 @@
 #include <chrono>
 #include <cstdio>
 #include <fstream>
-#include <iterator>
 #include <sstream>
 #include <thread>
+#include <vector>
 
 namespace VORK::FILEINDEXCTL {
 
@@ -23,9 +24,7 @@ constexpr std::chrono::milliseconds kLookAgain{50};
 constexpr int kLooks = 20;
 
 std::string CommandOf(int process) {
-    const std::string directory = "/proc/" + std::to_string(process);
-    std::ifstream file(directory + "/cmdline", std::ios::binary);
-    std::string command{std::istreambuf_iterator<char>(file), {}};
+    std::string command = ReadFile("/proc/" + std::to_string(process) + "/cmdline").value_or("");
     while (!command.empty() && command.back() == '\0') {
         command.pop_back();
     }
@@ -51,49 +50,42 @@ std::string FileName(const std::string &path) {
     return name.data();
 }
 
-}  // namespace
+std::string HolderText(int process) {
+    const std::string command = CommandOf(process);
+    return "process " + std::to_string(process) + (command.empty() ? "" : " (" + command + ")");
+}
 
-std::vector<LockHolder> LockHolders(const std::string &path) {
+std::vector<std::string> HoldersNow(const std::string &path) {
     const std::string name = FileName(path);
-    std::vector<LockHolder> holders;
+    std::vector<std::string> holders;
     std::ifstream locks("/proc/locks");
     for (std::string line; !name.empty() && std::getline(locks, line);) {
         // "1: FLOCK  ADVISORY  WRITE 4711 00:2f:1234 0 EOF"; those that wait have "->" in the second place
         std::istringstream fields(line);
-        std::string number;
         std::string kind;
-        std::string advisory;
-        std::string mode;
+        std::string skipped;
         int process = 0;
         std::string file;
-        fields >> number >> kind >> advisory >> mode >> process >> file;
+        fields >> skipped >> kind >> skipped >> skipped >> process >> file;
         if (kind == "FLOCK" && file == name) {
-            holders.push_back({process, CommandOf(process)});
+            holders.push_back(HolderText(process));
         }
     }
     return holders;
 }
 
-std::vector<LockHolder> LastingLockHolders(const std::string &path) {
-    std::vector<LockHolder> lasting = LockHolders(path);
+}  // namespace
+
+std::string LastingLockHolders(const std::string &path) {
+    std::vector<std::string> lasting = HoldersNow(path);
     for (int look = 1; look < kLooks && !lasting.empty(); ++look) {
         std::this_thread::sleep_for(kLookAgain);
-        const auto now = LockHolders(path);
-        std::erase_if(lasting, [&](const LockHolder &holder) {
+        const auto now = HoldersNow(path);
+        std::erase_if(lasting, [&](const std::string &holder) {
             return std::find(now.begin(), now.end(), holder) == now.end();
         });
     }
-    return lasting;
-}
-
-std::string HolderText(const std::vector<LockHolder> &holders) {
-    std::vector<std::string> items;
-    items.reserve(holders.size());
-    for (const auto &holder : holders) {
-        items.push_back("process " + std::to_string(holder.process) +
-                        (holder.command.empty() ? "" : " (" + holder.command + ")"));
-    }
-    return Enumerate(items);
+    return Enumerate(lasting);
 }
 
 }  // namespace VORK::FILEINDEXCTL

@@ -4,6 +4,8 @@
 
 #include <sys/stat.h>
 
+#include <algorithm>
+#include <iterator>
 #include <string_view>
 
 namespace VORK::FILEINDEXCTL {
@@ -11,11 +13,13 @@ namespace VORK::FILEINDEXCTL {
 namespace {
 
 // The usual extensions. fileindexd has a table of its own, which may know more of them.
-constexpr struct {
-    std::string_view kind;
-    std::string_view plural;
+struct Kind {
+    const char *name;
+    const char *plural;
     std::string_view extensions;  // each between blanks
-} kKinds[] = {
+};
+
+constexpr Kind kKinds[] = {
     {"document", "documents",
      " csv doc docm docx dot dotx epub htm html key md mobi numbers odp ods odt ott pages pdf pps ppsx ppt pptx "
      "rtf "
@@ -29,50 +33,42 @@ constexpr struct {
      "webp "},
 };
 
-}  // namespace
-
-std::string KindOf(const std::string &path) {
+std::string ExtensionOf(const std::string &path) {
     const auto dot = path.rfind('.');
-    if (dot == std::string::npos || path.find('/', dot) != std::string::npos) {
-        return kOtherKind;
-    }
-    std::string extension = path.substr(dot + 1);
+    std::string extension = dot == std::string::npos ? "" : path.substr(dot + 1);
     for (char &character : extension) {
         character = character >= 'A' && character <= 'Z' ? static_cast<char>(character - 'A' + 'a') : character;
     }
-    for (const auto &row : kKinds) {
-        if (extension.find(' ') == std::string::npos && !extension.empty() &&
-            row.extensions.find(" " + extension + " ") != std::string_view::npos) {
-            return std::string(row.kind);
-        }
-    }
-    return kOtherKind;
+    return extension;
 }
 
-namespace {
-
-std::string PluralOf(const std::string &kind) {
-    for (const auto &row : kKinds) {
-        if (row.kind == kind) {
-            return std::string(row.plural);
-        }
+// Null for a file of none of them.
+const Kind *KindOf(const std::string &path) {
+    const std::string extension = ExtensionOf(path);
+    if (extension.empty() || extension.find_first_of(" /") != std::string::npos) {
+        return nullptr;
     }
-    return kind;
+    const auto *kind = std::find_if(std::begin(kKinds), std::end(kKinds), [&](const Kind &row) {
+        return row.extensions.find(" " + extension + " ") != std::string_view::npos;
+    });
+    return kind == std::end(kKinds) ? nullptr : kind;
 }
 
 }  // namespace
 
 std::string ObstacleOfKind(const std::string &path, const Json::Value &record, std::string &kind) {
     struct stat status {};
-    const std::string folder = record["path"].asString();
+    const Kind *found = nullptr;
     if (stat(path.c_str(), &status) == 0 && S_ISREG(status.st_mode)) {
-        kind = KindOf(path);
+        found = KindOf(path);
+        kind = found == nullptr ? kOtherKind : found->name;
     }
+    const std::string folder = record["path"].asString();
     if (MediaText(record) == "none") {
         return "no kind of file is on in " + folder;
     }
-    const bool isOff = record.isMember(kind) && !record[kind].asBool();
-    return isOff ? PluralOf(kind) + " are off in " + folder : std::string();
+    const bool isOff = found != nullptr && record.isMember(found->name) && !record[found->name].asBool();
+    return isOff ? found->plural + (" are off in " + folder) : "";
 }
 
 }  // namespace VORK::FILEINDEXCTL

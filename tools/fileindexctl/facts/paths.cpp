@@ -15,7 +15,6 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <array>
 #include <cerrno>
 
 namespace VORK::FILEINDEXCTL {
@@ -39,12 +38,8 @@ void RequireAbsolute(const std::string &path) {
 
 // Empty when no share holds the full path.
 std::string SharePathOf(const std::string &fullPath) {
-    std::array<char, 492> name{};
-    std::array<char, 4096> directory{};
-    if (VORKShareNamePathGet(fullPath.c_str(), name.data(), name.size(), directory.data(), directory.size()) < 0) {
-        return {};
-    }
-    return "/" + std::string(name.data()) + fullPath.substr(std::string(directory.data()).size());
+    const auto share = ShareHolding(fullPath);
+    return share ? "/" + share->first + fullPath.substr(share->second.size()) : "";
 }
 
 const Folder *Find(const std::string &path, const Folders &folders) {
@@ -185,30 +180,25 @@ Place RequirePlain(const std::string &given, const Folders &folders) {
 }
 
 std::vector<std::string> DownFrom(const std::string &top, const std::string &path) {
-    std::vector<std::string> result{path};
-    for (std::string outer = path; outer.size() > top.size();) {
-        outer.erase(outer.rfind('/'));
-        if (!IsAtOrUnder(outer, top)) {
-            break;
+    std::vector<std::string> parts;
+    for (std::size_t end = 0; end < path.size();) {
+        end = std::min(path.find('/', end + 1), path.size());
+        if (std::string part = path.substr(0, end); end == path.size() || IsAtOrUnder(part, top)) {
+            parts.push_back(std::move(part));
         }
-        result.insert(result.begin(), outer);
     }
-    return result;
+    return parts;
 }
 
 namespace {
 
-// The form to compare in: that of the place. A folder whose share is away has no full path, and lies nowhere.
-std::string PathOf(const Folder &folder, const Place &place) {
-    return place.isFull ? folder.GetFullPath() : folder.path;
-}
-
-template <typename Test>
-std::vector<std::string> Select(const Place &place, const Folders &folders, Test test) {
+// Compared in the form of the place. A folder whose share is away has no full path, and lies nowhere.
+std::vector<std::string> Select(const Place &place, const Folders &folders,
+                                bool (*holds)(std::string_view, std::string_view)) {
     std::vector<std::string> result;
     for (const auto &folder : folders) {
-        const std::string path = PathOf(folder, place);
-        if (!path.empty() && test(place.path, path)) {
+        const std::string path = place.isFull ? folder.GetFullPath() : folder.path;
+        if (!path.empty() && holds(place.path, path)) {
             result.push_back(folder.path);
         }
     }
@@ -218,13 +208,12 @@ std::vector<std::string> Select(const Place &place, const Folders &folders, Test
 }  // namespace
 
 std::vector<std::string> Covering(const Place &place, const Folders &folders) {
-    return Select(place, folders,
-                  [](const std::string &path, const std::string &folder) { return IsAtOrUnder(path, folder); });
+    return Select(place, folders, IsAtOrUnder);
 }
 
 std::vector<std::string> Contained(const Place &place, const Folders &folders) {
     return Select(place, folders,
-                  [](const std::string &path, const std::string &folder) { return IsAtOrUnder(folder, path); });
+                  [](std::string_view path, std::string_view folder) { return IsAtOrUnder(folder, path); });
 }
 
 }  // namespace VORK::FILEINDEXCTL

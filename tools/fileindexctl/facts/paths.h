@@ -57,7 +57,7 @@ std::set<std::string> SharesOf(const Folders &folders);
 
 bool IsSharePresent(const std::string &share);
 
-/// `path` and what it lies in, the outermost first, as far as `top`.
+/// The full path and what it lies in, the outermost first, from `top` on; from the root when that is empty.
 std::vector<std::string> DownFrom(const std::string &top, const std::string &path);
 
 /// The same place in the form of a full path, if it has one: full paths see through shares inside shares.

@@ -2,11 +2,33 @@
 
 #include <vork/error.h>
 
+#include <algorithm>
 #include <cstdlib>
+#include <iterator>
 
 namespace VORK::FILEINDEXCTL {
 
 namespace {
+
+struct Error {
+    long code;
+    const char *words;
+    bool isJournaled = false;
+};
+
+constexpr Error kErrors[] = {
+    {VORK_ERR_NOT_FOUND, "a file is missing"},
+    {VORK_ERR_ACCESS, "no permission"},
+    {VORK_ERR_IO, "reading or writing failed"},
+    {VORK_ERR_TIMEOUT, "no answer in time"},
+    {VORK_ERR_MALFORMED, "a settings file is malformed"},
+    {VORK_ERR_NO_SUCH_SERVICE, "there is no such service"},
+    {VORK_ERR_SERVICE, "the service reported a failure"},
+    {VORK_ERR_UNIT_FAILED, "systemd reports a failure", true},
+    {VORK_ERR_UNIT_MASKED, "its unit is masked; \"systemctl unmask\" allows it"},
+    {VORK_ERR_UNIT_TIMEOUT, "systemd had not done it after ten seconds", true},
+    {VORK_ERR_EXEC, "a program could not be run"},
+};
 
 // Only the file-sharing service is restarted. Its unit has one of two names.
 std::string SeeJournal(const std::string &record) {
@@ -25,32 +47,10 @@ std::string PlatformErrorOf(const std::string &record) {
                    ? "/usr/vork/etc/vorknotifyd/registrations.json is malformed; see \"fileindexctl doctor\""
                    : "";
     }
-    switch (std::strtol(record.c_str() + start + sizeof(kStart) - 1, nullptr, 16)) {
-        case VORK_ERR_NOT_FOUND:
-            return "a file is missing";
-        case VORK_ERR_ACCESS:
-            return "no permission";
-        case VORK_ERR_IO:
-            return "reading or writing failed";
-        case VORK_ERR_TIMEOUT:
-            return "no answer in time";
-        case VORK_ERR_MALFORMED:
-            return "a settings file is malformed";
-        case VORK_ERR_NO_SUCH_SERVICE:
-            return "there is no such service";
-        case VORK_ERR_SERVICE:
-            return "the service reported a failure";
-        case VORK_ERR_UNIT_FAILED:
-            return "systemd reports a failure" + SeeJournal(record);
-        case VORK_ERR_UNIT_MASKED:
-            return "its unit is masked; \"systemctl unmask\" allows it";
-        case VORK_ERR_UNIT_TIMEOUT:
-            return "systemd had not done it after ten seconds" + SeeJournal(record);
-        case VORK_ERR_EXEC:
-            return "a program could not be run";
-        default:
-            return {};
-    }
+    const long code = std::strtol(record.c_str() + start + sizeof(kStart) - 1, nullptr, 16);
+    const auto *found = std::find_if(std::begin(kErrors), std::end(kErrors),
+                                     [code](const auto &error) { return error.code == code; });
+    return found == std::end(kErrors) ? "" : found->words + (found->isJournaled ? SeeJournal(record) : "");
 }
 
 }  // namespace VORK::FILEINDEXCTL

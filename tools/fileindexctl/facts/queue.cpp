@@ -3,8 +3,10 @@
 #include "facts/paths.h"
 #include "facts/queue_files.h"
 
+#include <algorithm>
+#include <functional>
 #include <set>
-#include <unordered_map>
+#include <string_view>
 
 namespace VORK::FILEINDEXCTL {
 
@@ -24,42 +26,29 @@ class PlaceIndex {
 public:
     explicit PlaceIndex(const std::vector<std::string> &places) {
         for (std::size_t i = 0; i < places.size(); ++i) {
-            byPath_[places[i]].push_back(i);
+            byPath_.emplace(places[i], i);
         }
     }
 
     std::set<std::size_t> Of(const QueueEvent &event) const {
         std::set<std::size_t> found;
         AddAbove(event.path, found);
-        if (!event.oldPath.empty()) {
-            AddAbove(event.oldPath, found);
-        }
+        AddAbove(event.oldPath, found);
         return found;
     }
 
 private:
-    void Add(const std::string &path, std::set<std::size_t> &found) const {
-        const auto places = byPath_.find(path);
-        if (places != byPath_.end()) {
-            found.insert(places->second.begin(), places->second.end());
+    void AddAbove(std::string_view path, std::set<std::size_t> &found) const {
+        for (bool isLast = false; !isLast;) {
+            isLast = path.empty();
+            const auto [first, last] = byPath_.equal_range(path);
+            std::for_each(first, last, [&](const auto &place) { found.insert(place.second); });
+            path = path.substr(0, std::min(path.rfind('/'), path.size()));
         }
     }
 
-    void AddAbove(const std::string &path, std::set<std::size_t> &found) const {
-        for (std::size_t end = path.size(); end != std::string::npos && end > 0; end = path.rfind('/', end - 1)) {
-            Add(path.substr(0, end), found);
-        }
-        Add("", found);
-    }
-
-    std::unordered_map<std::string, std::vector<std::size_t>> byPath_;
+    std::multimap<std::string, std::size_t, std::less<>> byPath_;
 };
-
-void Count(const QueueEvent &event, const std::string &file, Backlog &backlog) {
-    ++backlog.events[event.type];
-    ++backlog.files[file];
-    backlog.taken += event.taken ? 1 : 0;
-}
 
 }  // namespace
 
@@ -82,7 +71,9 @@ std::vector<Backlog> ReadBacklogs(const std::string &share, const std::vector<st
             return;
         }
         for (const std::size_t i : index.Of(*event)) {
-            Count(*event, files.Identity(event->taken), backlogs[i]);
+            ++backlogs[i].events[event->type];
+            ++backlogs[i].files[files.Identity()];
+            backlogs[i].taken += files.IsAtTaken() ? 1 : 0;
         }
     });
     for (auto &backlog : backlogs) {
@@ -110,7 +101,7 @@ std::string EventName(unsigned type) {
             return "rename";
         case kReindexEvent:
             return "reindex";
-        case kSettingsEvent:
+        case kSettingEvent:
             return "settings";
         default:
             return std::to_string(type);
@@ -135,7 +126,7 @@ std::string BacklogText(const Backlog &backlog) {
     unsigned long settings = 0;
     unsigned long files = 0;
     for (const auto &[type, count] : backlog.events) {
-        (type == kReindexEvent ? reindex : type == kSettingsEvent ? settings : files) += count;
+        (type == kReindexEvent ? reindex : type == kSettingEvent ? settings : files) += count;
     }
     std::string text;
     const auto add = [&](unsigned long count, const char *what) {

@@ -2,6 +2,8 @@
 /// What waits in a share's event queue, for people and reports. The daemon may take it at any moment.
 #pragma once
 
+#include "base/queue/event.h"
+
 #include <json/value.h>
 
 #include <map>
@@ -10,10 +12,6 @@
 #include <vector>
 
 namespace VORK::FILEINDEXCTL {
-
-inline constexpr unsigned kRenameEvent = 0x100;
-inline constexpr unsigned kReindexEvent = 0x10000;
-inline constexpr unsigned kSettingsEvent = 0x20000;
 
 struct Backlog {
     std::map<unsigned, unsigned long> events;  ///< number of lines by event type

@@ -1,68 +1,18 @@
 #include "facts/queue_files.h"
 
-#include "facts/queue.h"
-#include "facts/queue_lines.h"
 #include "facts/share_record.h"
 #include "report/failure.h"
-
-#include <json/reader.h>
 
 #include <fcntl.h>
 #include <sys/stat.h>
 
 #include <algorithm>
 #include <cerrno>
-#include <memory>
 #include <utility>
 
 namespace VORK::FILEINDEXCTL {
 
 namespace {
-
-constexpr int kDeepest = 256;
-
-using Visitor = std::function<void(const QueueEvent *event)>;
-
-bool IsEvent(const Json::Value &line) {
-    return line.isObject() && line.isMember("event") && line["event"].isConvertibleTo(Json::uintValue) &&
-           line["path"].isString();
-}
-
-std::unique_ptr<Json::CharReader> LineReader() {
-    Json::CharReaderBuilder builder;
-    Json::CharReaderBuilder::strictMode(&builder.settings_);
-    builder["strictRoot"] = false;
-    builder["rejectDupKeys"] = false;
-    builder["stackLimit"] = kDeepest;
-    return std::unique_ptr<Json::CharReader>(builder.newCharReader());
-}
-
-std::optional<QueueEvent> ParseLine(Json::CharReader &reader, const char *begin, const char *end, bool taken) {
-    Json::Value line;
-    try {
-        if (!reader.parse(begin, end, &line, nullptr) || !IsEvent(line)) {
-            return std::nullopt;
-        }
-    } catch (const Json::Exception &) {  // nested too deeply
-        return std::nullopt;
-    }
-    QueueEvent event{line["event"].asUInt(), line["path"].asString(), {}, line["data"], taken};
-    if (event.type == kRenameEvent && line["path_old"].isString()) {
-        event.oldPath = line["path_old"].asString();
-    }
-    return event;
-}
-
-void VisitLines(UniqueFd file, long long size, bool taken, const Visitor &visitor) {
-    QueueLines lines(std::move(file), size);
-    const auto reader = LineReader();
-    for (QueueLines::Line line; lines.Next(line);) {
-        const auto event = line.passed
-                               ? std::nullopt
-                               : ParseLine(*reader, line.text.data(), line.text.data() + line.text.size(), taken);
-        visitor(event ? &*event : nullptr);
-    }
-}
 
 // Without a metadata directory, which the first event makes, nothing waits.
 UniqueFd OpenDirectory(const std::string &queuePath) {
@@ -100,7 +50,7 @@ QueueFiles::File QueueFiles::Open(const UniqueFd &directory, const std::string &
     file.descriptor = UniqueFd(openat(directory.Get(), path.c_str() + path.rfind('/') + 1,
                                       O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
     if (!file.descriptor && (errno == EACCES || errno == EPERM)) {
-        throw Failure(ExitStatus::kPermission, "no permission for " + path + "; run this as the administrator");
+        throw Denied(path);
     }
     struct statx status {};
     if (!file.descriptor ||
@@ -108,7 +58,7 @@ QueueFiles::File QueueFiles::Open(const UniqueFd &directory, const std::string &
         !S_ISREG(status.stx_mode)) {
         return {};
     }
-    file.size = static_cast<long long>(status.stx_size);
+    file.size = static_cast<off_t>(status.stx_size);
     // A queue is made by the first event that goes into it, so its age is that of the oldest event.
     file.birth = (status.stx_mask & STATX_BTIME) != 0 ? status.stx_btime.tv_sec : status.stx_mtime.tv_sec;
     file.identity = std::to_string(status.stx_dev_major) + ":" + std::to_string(status.stx_dev_minor) + ":" +
@@ -123,11 +73,7 @@ QueueFiles::QueueFiles(const std::string &queuePath) : QueueFiles(OpenDirectory(
 
 QueueFiles::QueueFiles(const UniqueFd &directory, const std::string &queuePath)
     : queue_(Open(directory, queuePath)), taken_(Open(directory, queuePath + ".tmp")) {
-    struct stat queue {};
-    struct stat taken {};
-    if (queue_.descriptor && taken_.descriptor && fstat(queue_.descriptor.Get(), &queue) == 0 &&
-        fstat(taken_.descriptor.Get(), &taken) == 0 && queue.st_dev == taken.st_dev &&
-        queue.st_ino == taken.st_ino) {
+    if (queue_.identity == taken_.identity) {
         queue_ = {};
     }
 }
@@ -148,16 +94,17 @@ std::optional<long long> QueueFiles::Oldest() const {
     return std::min(*taken_.birth, *queue_.birth);
 }
 
-void QueueFiles::Visit(const Visitor &visitor) {
+void QueueFiles::Visit(const std::function<void(const QueueEvent *)> &visitor) {
     for (const bool taken : {true, false}) {
         File &file = taken ? taken_ : queue_;
         atTaken_ = taken;
         line_ = 0;
         if (file.descriptor) {
-            VisitLines(std::move(file.descriptor), file.size, taken, [&](const QueueEvent *event) {
+            QueueLines lines(std::move(file.descriptor), 0, file.size);
+            while (lines.Next(current_)) {
                 ++line_;
-                visitor(event);
-            });
+                visitor(reader_.Read(current_));
+            }
         }
     }
 }

@@ -1,12 +1,8 @@
 /// \file
 /// The files of a share's event queue, read as they are at one moment.
-///
-/// No lock is taken: writers give up on a queue that stays locked, and lose their event.
 #pragma once
 
-#include "base/unique_fd.h"
-
-#include <json/value.h>
+#include "base/queue/event.h"
 
 #include <functional>
 #include <optional>
@@ -24,28 +20,17 @@ bool IsQueueReadable(const std::string &share);
 /// Why no event can be queued for the share, as far as it can be seen; empty otherwise.
 std::string TroubleWithQueue(const std::string &share);
 
-struct QueueEvent {
-    unsigned type;
-    std::string path;
-    std::string oldPath;  ///< of a rename
-    Json::Value data;
-    bool taken;  ///< in the ".tmp" companion
-};
-
 class QueueFiles {
 public:
     /// Opens both, not through a metadata directory that is a link. Throws Failure when one of them is there and
     /// may not be read.
     explicit QueueFiles(const std::string &queuePath);
 
+    /// Is there a ".tmp" companion, an earlier queue that was taken away?
     bool IsTaken() const { return taken_.birth.has_value(); }
 
     /// When the older of the files was made, in seconds since the epoch.
     std::optional<long long> Oldest() const;
-
-    /// Tells the queue, or what was taken of it, from every other file, also from one of the same name before or
-    /// after it. A queue keeps it when it is taken. Empty for a file that is not there.
-    const std::string &Identity(bool taken) const { return (taken ? taken_ : queue_).identity; }
 
     /// Calls the visitor for each line that was there when the files were opened, the oldest first; with null for
     /// a malformed one. Once.
@@ -55,10 +40,17 @@ public:
     bool IsAtTaken() const { return atTaken_; }
     unsigned long Line() const { return line_; }
 
+    /// Tells that file from every other, also from one of the same name before or after it. A queue keeps it when
+    /// it is taken.
+    const std::string &Identity() const { return (atTaken_ ? taken_ : queue_).identity; }
+
+    /// The "data" of that line.
+    Json::Value Data() { return reader_.Data(current_); }
+
 private:
     struct File {
         UniqueFd descriptor{};
-        long long size = 0;
+        off_t size = 0;
         std::optional<long long> birth{};
         std::string identity{};
     };
@@ -69,6 +61,8 @@ private:
     File taken_;
     bool atTaken_ = false;
     unsigned long line_ = 0;
+    QueueLine current_{};
+    QueueEventReader reader_{};
 };
 
 }  // namespace VORK::FILEINDEXCTL

@@ -82,14 +82,12 @@ std::map<std::string, Watches> ReadRegistrations() try {
     throw Malformed();
 }
 
-bool IsQueuePaused(const std::string &queue) try {
+bool IsQueuePaused(const std::string &queue) {
     const Json::Value document = ReadDocument();
     const Json::Value &list = document[kRegistrationsKey];
     return TellsPauses(document) && std::none_of(list.begin(), list.end(), [&](const Json::Value &entry) {
                return IsOwn(entry) && entry["queue"].asString() == queue;
            });
-} catch (const Json::Exception &) {
-    throw Malformed();
 }
 
 namespace {

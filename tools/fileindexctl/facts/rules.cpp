@@ -52,22 +52,11 @@ struct Probe {
     std::string fullPath;
     int type = kUnknownType;
     std::string shareName{};
-    std::string shareDirectory{};
     SharePointer share{};
 };
 
 bool Mentions(const std::string &path, const char *name) {
     return path.find(name) != std::string::npos;
-}
-
-// Every start of the path that ends at a component: "/a", "/a/b".
-std::vector<std::string> Starts(const std::string &path) {
-    std::vector<std::string> starts;
-    for (std::size_t end = 0; end < path.size();) {
-        end = std::min(path.find('/', end + 1), path.size());
-        starts.push_back(path.substr(0, end));
-    }
-    return starts;
 }
 
 std::string FileSystemOf(const Probe &probe) {
@@ -153,15 +142,12 @@ Finding NoPseudoFileSystem(Probe &probe) {
 }
 
 Finding InShare(Probe &probe) {
-    std::array<char, 492> name{};
-    std::array<char, PATH_MAX> directory{};
-    if (VORKShareNamePathGet(probe.fullPath.c_str(), name.data(), name.size(), directory.data(),
-                             directory.size()) < 0) {
+    const auto share = ShareHolding(probe.fullPath);
+    if (!share) {
         return {false, "no share's directory holds the path", "share a directory above it, or move the folder"};
     }
-    probe.shareName = name.data();
-    probe.shareDirectory = directory.data();
-    return Pass(Quoted(probe.shareName) + " at " + probe.shareDirectory);
+    probe.shareName = share->first;
+    return Pass(Quoted(share->first) + " at " + share->second);
 }
 
 Finding ShareFound(Probe &probe) {
@@ -242,7 +228,7 @@ Finding RealPath(Probe &probe) {
         return Pass("free of links");
     }
     const std::string remedy = "name the folder by its real path, " + std::string(resolved.data());
-    for (const auto &start : Starts(probe.fullPath)) {
+    for (const auto &start : DownFrom("", probe.fullPath)) {
         std::array<char, PATH_MAX> target{};
         if (readlink(start.c_str(), target.data(), target.size() - 1) >= 0) {
             return {false, Quoted(start) + " is a link to " + Quoted(target.data()), remedy};
@@ -327,12 +313,16 @@ Verdict JudgeOnce(const Place &place) {
     return verdict;
 }
 
+const RuleOutcome *FirstFailed(const std::vector<RuleOutcome> &rules) {
+    const auto failed = std::find_if(rules.begin(), rules.end(),
+                                     [](const RuleOutcome &rule) { return rule.result == RuleResult::kFailed; });
+    return failed == rules.end() ? nullptr : &*failed;
+}
+
 }  // namespace
 
 const RuleOutcome *Verdict::Failed() const {
-    const auto failed = std::find_if(rules.begin(), rules.end(),
-                                     [](const RuleOutcome &rule) { return rule.result == RuleResult::kFailed; });
-    return explained && failed != rules.end() ? &*failed : nullptr;
+    return explained ? FirstFailed(rules) : nullptr;
 }
 
 Verdict Judge(const Place &place) {
@@ -344,7 +334,7 @@ std::optional<Unreachable> FirstUnreachable(const std::string &fullPath) {
     if (VORKGetFSType(fullPath.c_str(), 0) != kUnknownType) {
         return std::nullopt;
     }
-    for (const auto &start : Starts(fullPath)) {
+    for (const auto &start : DownFrom("", fullPath)) {
         struct stat status {};
         if (stat(start.c_str(), &status) != 0) {
             return Unreachable{start, errno};
@@ -372,10 +362,8 @@ std::string ObstacleTo(const std::string &path, const std::string &folder) {
         // What else is passed over fails the first rules of folders too.
         std::vector<RuleOutcome> outcomes;
         Run({part, true, {}, part}, outcomes);
-        const auto failed = std::find_if(outcomes.begin(), outcomes.end(), [](const RuleOutcome &rule) {
-            return rule.result == RuleResult::kFailed;
-        });
-        if (failed == outcomes.end()) {
+        const RuleOutcome *failed = FirstFailed(outcomes);
+        if (failed == nullptr) {
             return "the indexer passes over " + Quoted(part);
         }
         const bool isPlace = failed->key == "recycle_bin" || failed->key == "snapshot";

@@ -1,11 +1,15 @@
 /// \file
-/// The platform's record of a share, for the length of a scope.
+/// What the platform knows of a share.
 #pragma once
 
 #include <vork/share.h>
 
+#include <array>
+#include <climits>
 #include <memory>
+#include <optional>
 #include <string>
+#include <utility>
 
 namespace VORK::FILEINDEXCTL {
 
@@ -18,6 +22,16 @@ using SharePointer = std::unique_ptr<VORKSHARE, ShareDeleter>;
 inline SharePointer FindShare(const std::string &name) {
     VORKSHARE *share = nullptr;
     return SharePointer(VORKShareGet(name.c_str(), &share) < 0 ? nullptr : share);
+}
+
+/// The name and the directory of the share that holds a full path; nothing when none does.
+inline std::optional<std::pair<std::string, std::string>> ShareHolding(const std::string &fullPath) {
+    std::array<char, 492> name{};
+    std::array<char, PATH_MAX> directory{};
+    if (VORKShareNamePathGet(fullPath.c_str(), name.data(), name.size(), directory.data(), directory.size()) < 0) {
+        return std::nullopt;
+    }
+    return std::pair(std::string(name.data()), std::string(directory.data()));
 }
 
 }  // namespace VORK::FILEINDEXCTL

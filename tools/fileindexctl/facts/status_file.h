@@ -6,8 +6,8 @@
 
 #include <json/value.h>
 
+#include <set>
 #include <string>
-#include <vector>
 
 namespace VORK::FILEINDEXCTL {
 
@@ -15,11 +15,14 @@ class StatusFile : public VORK::FILEINDEX::Status {
 public:
     Json::Value &Document() { return document_; }
 
+    /// Loads the file, for the end of the pause in it. Throws Failure.
+    long long LoadPause();
+
     /// The shares that have the flag, indexed or not.
-    std::vector<std::string> Marked(const char *flag) const {
-        const bool usable = document_.isObject() && document_[flag].isObject();
-        return usable ? document_[flag].getMemberNames() : std::vector<std::string>();
-    }
+    std::set<std::string> Marked(const char *flag) const;
+
+    /// The steps that are marked as done.
+    std::set<std::string> Markers();
 };
 
 }  // namespace VORK::FILEINDEXCTL

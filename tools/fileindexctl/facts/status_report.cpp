@@ -26,6 +26,11 @@ std::string Listed(const std::vector<std::string> &items) {
     return items.empty() ? "none" : Enumerate(items);
 }
 
+std::vector<std::string> MarkedShares(const StatusFile &file, const char *flag) {
+    const auto shares = file.Marked(flag);
+    return {shares.begin(), shares.end()};
+}
+
 std::string EventsText(const Backlog &backlog) {
     return BacklogText(backlog) + (backlog.hasTemporary ? " (.tmp present)" : "");
 }
@@ -38,20 +43,13 @@ void SetState(const std::string &state, StatusReport &report) {
 
 void AddService(StatusReport &report) {
     StatusFile file;
-    long long resumeTime = -1;
-    ForgetErrors();
-    if (!file.Load()) {
-        throw FailureOf(file);
-    }
-    if (!file.GetPauseInfo(resumeTime)) {
-        throw Failure(ExitStatus::kMalformed, file.GetPath() + ": \"resume_time\" is no number");
-    }
+    const long long resumeTime = file.LoadPause();
     if (!StatusMgr::GetStatus(report.state)) {
         report.state = "unknown";
         report.gaps.Add("the state cannot be told: " + Records().Last());
     }
-    const auto noSpace = file.Marked("no_space");
-    const auto needReindex = file.Marked("need_reindex");
+    const auto noSpace = MarkedShares(file, "no_space");
+    const auto needReindex = MarkedShares(file, "need_reindex");
     const DaemonState daemon = ProbeDaemon();
     report.data["resume_time"] = static_cast<Json::Int64>(resumeTime);
     report.data["daemon"] = daemon.ForPrograms();

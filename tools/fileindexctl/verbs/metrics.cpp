@@ -51,7 +51,7 @@ const char *KindOf(unsigned type) {
     switch (type) {
         case kReindexEvent:
             return "reindex";
-        case kSettingsEvent:
+        case kSettingEvent:
             return "settings";
         case kRenameEvent:
             return "rename";

@@ -52,7 +52,7 @@ void StateEffect(const Folders &folders, Output &output) {
     for (const auto &share : SharesOf(folders)) {
         QueueFiles(QueuePathOf(share)).Visit([&](const QueueEvent *event) {
             if (event != nullptr && event->type == kReindexEvent) {
-                waiting.insert(event->path);
+                waiting.emplace(event->path);
             }
         });
     }

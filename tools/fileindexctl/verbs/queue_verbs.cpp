@@ -48,7 +48,7 @@ public:
             } else {
                 --left_;
                 ++shown_;
-                ShowEvent(share, *event);
+                ShowEvent(share, *event, files);
             }
         });
     }
@@ -73,21 +73,23 @@ public:
     }
 
 private:
-    void ShowEvent(const std::string &share, const QueueEvent &event) {
+    void ShowEvent(const std::string &share, const QueueEvent &event, QueueFiles &files) {
+        const std::string path(event.path);
+        const std::string oldPath(event.oldPath);
         if (!output_.IsJson()) {
             output_.Line(share + "  " + Padded(EventName(event.type)) + "  " +
-                         (event.oldPath.empty() ? "" : event.oldPath + " -> ") + event.path +
-                         (event.taken ? "  (taken)" : ""));
+                         (oldPath.empty() ? "" : oldPath + " -> ") + path +
+                         (files.IsAtTaken() ? "  (taken)" : ""));
             return;
         }
         Json::Value entry(Json::objectValue);
         entry["share"] = share;
         entry["event"] = event.type;
-        entry["path"] = event.path;
-        entry["data"] = event.data;
-        entry["tmp"] = event.taken;
-        if (!event.oldPath.empty()) {
-            entry["path_old"] = event.oldPath;
+        entry["path"] = path;
+        entry["data"] = files.Data();
+        entry["tmp"] = files.IsAtTaken();
+        if (!oldPath.empty()) {
+            entry["path_old"] = oldPath;
         }
         output_.Data()["event"].append(entry);
     }
