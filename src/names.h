@@ -1,6 +1,6 @@
 /// \file
-/// Fixed paths, keys, limits and codes that other parties know as well. What one function alone spells out for a
-/// call, such as the arguments of the notification tool, stands there.
+/// Fixed paths, keys, limits and codes that other programs know as well. What only one function needs, such as the
+/// arguments of the notification tool, is in that function.
 #pragma once
 
 #include <cstddef>

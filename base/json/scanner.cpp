@@ -1,5 +1,6 @@
 #include "base/json/scanner.h"
 
+#include "base/has_nul.h"
 #include "base/json/number.h"
 
 #include <algorithm>
@@ -40,7 +41,7 @@ void AppendUtf8(std::string &out, unsigned codePoint) {
 
 // A NUL ends the text for the exact reader, which therefore refuses it.
 JsonScanner::JsonScanner(std::string_view text, std::string &decoded)
-    : rest_(text.find('\0') == std::string_view::npos ? text : std::string_view()), decoded_(decoded) {
+    : rest_(HasNul(text) ? std::string_view() : text), decoded_(decoded) {
     decoded_.clear();
 }
 

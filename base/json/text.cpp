@@ -1,5 +1,6 @@
 #include "base/json/text.h"
 
+#include "base/has_nul.h"
 #include "base/json/elements.h"
 #include "base/json/number.h"
 
@@ -39,7 +40,7 @@ public:
     explicit DialectCheck(std::string_view text) : rest_(text) {}
 
     bool Passes() {
-        if (rest_.find('\0') != std::string_view::npos) {
+        if (HasNul(rest_)) {
             return false;
         }
         char last = 0;  // the last character outside strings that is no blank

@@ -29,7 +29,7 @@ public:
     ~Folders() override;
 
     /// Reads folder.conf into a fresh object. A missing file is an empty list. A record whose share is away is
-    /// loaded all the same, without a full path, and leaves FILEINDEX_ERR_PATH behind. Not an object: one record,
+    /// loaded all the same, without a full path, and FILEINDEX_ERR_PATH is set. Not an object: one record,
     /// FILEINDEX_ERR_MALFORMED_CONFIG, false; unreadable: see Config::LoadJson.
     bool Load() override;
 
@@ -81,9 +81,8 @@ public:
     ///
     /// @param out   {path: change report}; untouched when the path no longer resolves, which is still true, so
     ///              that folders of a vanished share can be removed
-    /// @param path  share path, exactly as stored; one that no longer resolves leaves FILEINDEX_ERR_PATH behind,
-    /// an
-    ///              empty one record utils.cpp:389 and no code
+    /// @param path  share path, exactly as stored. One that no longer resolves sets FILEINDEX_ERR_PATH;
+    ///              an empty one leaves record utils.cpp:389 and no code
     bool Delete(Json::Value &out, const std::string &path);
 
 private:

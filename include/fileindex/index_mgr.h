@@ -6,8 +6,12 @@
 /// The daemon acts later. Changes are serialised between processes by /tmp/fileidx_cfg_folder.lock, held from the
 /// load to the last notification; a call that finds it busy fails with FILEINDEX_ERR_LOCK after at most 27 ms of
 /// sleep. Nothing is rolled back: folder.conf is saved before anyone is told, and a failed call can be repeated,
-/// which tells everyone again. The events of the second call report no change, since the first has saved it: call
-/// Reindex to have the folders read again. Nothing here throws.
+/// which tells everyone again. The events of a repeated Upsert report no change, since the first has saved it:
+/// call Reindex to have the folders read again. Nothing here throws.
+///
+/// True does not promise that every event is in its queue. One is dropped, and counts as queued, when the queue
+/// stays locked for three attempts, when the disk does not take its line whole, and when a reindex of the same
+/// path is queued already, which makes it redundant. The first two leave a record only at LOG_LEVEL 7.
 ///
 /// A request nested deeper than 256 levels of arrays and objects is a bad parameter, and so is one to Upsert with
 /// an infinite number or NaN. Its record shows "..." in the place of what is deeper. The value is only looked at;
@@ -100,13 +104,16 @@ public:
     /// Removes folders: `paths` is an array of share paths; one that is not indexed is no error. Takes the lock. A
     /// share left without folders loses its queue, index database and monitor; when no folder is left anywhere,
     /// the daemon is stopped and the search setting switched off. A folder whose share is gone is removed and
-    /// saved, but the call fails where its event cannot be queued or its share not be cleaned. Codes: BAD_PARAM,
+    /// saved, but the call fails where its event cannot be queued or its share not be cleaned. The events of a
+    /// repeated call report all kinds as changed, or none where another folder governs the path. Codes: BAD_PARAM,
     /// LOCK, LOAD_JSON, MALFORMED_CONFIG, SAVE_JSON, PATH; those who refuse set none, as with Upsert.
     FILEINDEX_API static bool Delete(const Json::Value &paths);
 
     /// Queues a reindex of each share path of the array, and revives those of their shares that were out of
-    /// space. Each share must have an indexed folder: otherwise false without a record. Takes no folder.conf
-    /// lock. Codes: BAD_PARAM, PATH.
+    /// space; one that cannot be revived is only logged. Each share must have an indexed folder: otherwise false
+    /// without a record of its own. Takes no folder.conf lock. Codes: BAD_PARAM, PATH; LOAD_JSON and
+    /// MALFORMED_CONFIG for folder.conf; LOCK, LOAD_JSON and SAVE_JSON for status.conf, where a share is revived,
+    /// or marked because its event cannot be queued.
     FILEINDEX_API static bool Reindex(const Json::Value &jsArrPath);
     /// @}
 
@@ -129,8 +136,8 @@ public:
 
     /// Moves the folders of `oldShare` to `newShare`, which exists already, in folder.conf. Nobody is told, and
     /// the monitor keeps its old registration. Both are names of shares, and only folders of exactly `oldShare`
-    /// move. Takes the lock. Codes: BAD_PARAM for an unknown new share, LOCK, LOAD_JSON, MALFORMED_CONFIG,
-    /// SAVE_JSON.
+    /// move. A folder that `newShare` has already at the same path is overwritten. Takes the lock. Codes:
+    /// BAD_PARAM for an unknown new share, LOCK, LOAD_JSON, MALFORMED_CONFIG, SAVE_JSON.
     FILEINDEX_API static bool ShareRename(const std::string &oldShare, const std::string &newShare);
 
     /// Removes the folders of the share from folder.conf; when none is left anywhere, stops the daemon and
@@ -146,8 +153,7 @@ public:
 
     /// Deletes the share's queue file, its ".tmp" companion and its index database directory. No lock. The
     /// caller sees to it that the share is not in use. Refused when a path might have been cut. Whether all is
-    /// gone afterwards is not looked at: the platform removes nothing that lies behind a link in place of
-    /// "@eaDir".
+    /// gone afterwards is not looked at: the platform removes nothing where "@eaDir" is a link.
     FILEINDEX_API static bool CleanShareIndexData(const std::string &share);
     /// @}
 };

@@ -47,8 +47,8 @@ public:
     static constexpr std::size_t kLengthSize = sizeof(std::uint32_t);
     std::size_t Size() const { return bytes_.size() - zeros_; }
 
-    /// The bytes from an offset to the end; a negative one lies among the zeros. They are made when they are first
-    /// reached, which is hardly ever.
+    /// The bytes from an offset to the end. A negative offset points into the zeros before the frame; they are
+    /// made when one is first asked for, which is rare.
     const char *At(std::ptrdiff_t offset) {
         if (offset < 0 && zeros_ == 0) {
             bytes_.insert(0, kBackwardRoom, '\0');
@@ -64,11 +64,11 @@ private:
 
 using Clock = std::chrono::steady_clock;
 
-/// Writes the frame's bytes [offset, offset + size) in chunks. A result of -1 counts like any other: the position
-/// moves back by a byte and one more is to be written. The daemon has always been spoken to like this, and frames
-/// that it resynchronises on must not change. Where a step would leave the zeros in front the frame is given up,
-/// which soon ends the loop when the peer is gone. A peer that is there and does not read costs a timeout for each
-/// step, and one that reads slowly nearly as much, hence the deadline: no write begins after it.
+/// Writes the frame's bytes [offset, offset + size) in chunks. The result of a failed write, -1, is added like any
+/// other: the next write begins one byte earlier, and one byte more is left to write. Every release has done so,
+/// and what a daemon has to find its way in must not change. A write that would begin before the zeros is not made
+/// and ends the frame; when the peer is gone, that is soon. With a peer that does not read, or reads slowly, a
+/// write can take as long as the timeout, hence the deadline: no write begins after it.
 bool WriteAll(int fd, std::size_t size, Frame &frame, std::ptrdiff_t offset, Clock::time_point deadline) {
     std::size_t remaining = size;
     int retries = kEmptyWriteRetries;

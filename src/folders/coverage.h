@@ -12,8 +12,8 @@
 
 namespace VORK::FILEINDEX::internal {
 
-/// Does the folder cover the full path? One that could not be resolved covers none; compared by the rule above
-/// its empty path would cover all.
+/// Does the folder cover the full path? One without a full path of its own covers none: compared as text, an empty
+/// path would cover all.
 inline bool Covers(const Folder &folder, std::string_view fullPath) {
     const std::string &stored = FolderAccess::StoredFullPath(folder);
     if (!stored.empty()) {

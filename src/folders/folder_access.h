@@ -30,7 +30,7 @@ struct FolderAccess {
     /// Fills the list from the document. Not an object: one record, FILEINDEX_ERR_MALFORMED_CONFIG, false.
     static bool TakeDocument(Folders &store);
 
-    /// Finds the full path anew. One of another path is worse than none, so the former is forgotten first.
+    /// Looks for the full path again. The old one is forgotten first: none is better than that of another path.
     static bool Resolve(Folder &folder) {
         folder.full_path_.clear();
         return GetFullPath(folder.full_path_, folder.path);

@@ -29,7 +29,7 @@ constexpr auto kQueueType = VORKNOTIFYD::MONITOR_QUEUE_TYPE_FILE;
 
 bool WatchList(Json::Value &config, const std::vector<Folder> &folders) {
     Json::Value ignore(Json::arrayValue);
-    ignore.append(kMetadataDir);  // the queue lies there: watching it would feed it for ever
+    ignore.append(kMetadataDir);  // the queue is in it, and each event would make another
     for (const Folder &folder : folders) {
         std::string fullPath;
         if (!GetFullPath(fullPath, folder.path)) {

@@ -34,7 +34,7 @@ bool BadParam(const Json::Value &what) {
     return false;
 }
 
-/// In memory: a batch that fails in the middle leaves folder.conf as it was.
+/// In memory only: a batch that fails half way changes nothing in folder.conf.
 bool DeleteAll(Folders &store, const Json::Value &paths, Changes &changes) {
     for (const Json::Value &element : Elements(paths)) {
         if (!element.isString()) {

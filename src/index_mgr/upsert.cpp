@@ -31,7 +31,7 @@ std::string PathOf(const Json::Value &element) {
     return path;
 }
 
-/// In memory: a batch that fails in the middle leaves folder.conf as it was.
+/// In memory only: a batch that fails half way changes nothing in folder.conf.
 bool UpsertAll(Folders &store, const Json::Value &folders, Changes &changes) {
     for (const Json::Value &element : Elements(folders)) {
         const std::string path = PathOf(element);

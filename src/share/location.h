@@ -1,7 +1,8 @@
 /// \file
-/// Where a share's index data lies, for names that come as strings.
+/// Where a share keeps its index data, for names that are strings.
 #pragma once
 
+#include "base/has_nul.h"
 #include "names.h"
 
 #include <fileindex/fileidx.h>
@@ -10,12 +11,7 @@
 
 namespace VORK::FILEINDEX::internal {
 
-/// A name or path with a NUL inside names nothing; as a C string it would name something else.
-inline bool HasNul(const std::string &text) {
-    return text.find('\0') != std::string::npos;
-}
-
-/// FILEIDXQueuePathGet; -1 also for a name that is none.
+/// FILEIDXQueuePathGet; -1 also for a name with a NUL.
 inline int QueuePathOf(const std::string &share, char (&buffer)[kPathSize]) {
     return HasNul(share) ? -1 : FILEIDXQueuePathGet(share.c_str(), buffer, kPathSize);
 }

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "base/cancellation.h"
+#include "base/has_nul.h"
 
 #include <vork/share.h>
 
@@ -19,10 +20,10 @@ struct ShareDeleter {
 };
 using Share = std::unique_ptr<_tag_VORKSHARE, ShareDeleter>;
 
-/// The share's record, or null. Calls the platform exactly once, and answers a record without a directory as a
-/// failed look-up. A name with a NUL inside is no share's name; as a C string it would be another's.
+/// The share's record; null when there is none, or one without a directory. Calls the platform exactly once, and
+/// not at all for a name with a NUL.
 inline Share FindShare(const std::string &name) {
-    if (name.find('\0') != std::string::npos) {
+    if (HasNul(name)) {
         return nullptr;
     }
     const NoCancellation finding;  // or a record that was just made could get lost on its way here

@@ -15,7 +15,6 @@
 namespace VORK {
 namespace FILEINDEX {
 
-using internal::HasNul;
 namespace records = internal::records;
 
 bool GetFullPath(std::string &out, const std::string &sharePath) {

@@ -27,7 +27,6 @@
 namespace VORK {
 namespace FILEINDEX {
 
-using internal::HasNul;
 using internal::Rule;
 namespace records = internal::records;
 

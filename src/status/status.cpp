@@ -20,9 +20,10 @@ namespace {
 
 constexpr int kNotPaused = -1;
 
-/// Adds or removes `share` under root[flagKey], which comes into being as null if it is absent and is not replaced
-/// if it is of another type: then the JSON library throws, and nothing of the file is lost. `beforeFirst` runs
-/// when the share is not marked yet, even if it then cannot be: the administrators should know of it all the same.
+/// Marks or unmarks `share` in root[flagKey]. If that is missing, unmarking makes it a null. If it has an
+/// unexpected type, it stays as it is: the JSON library throws, and nothing of the file is lost. `beforeFirst`
+/// runs when the share is not marked yet, even if it then cannot be marked: the administrators should know of it
+/// all the same.
 template <typename BeforeFirst>
 void SetShareFlag(Json::Value &root, const char *flagKey, const std::string &share, bool set,
                   BeforeFirst beforeFirst) {

@@ -1,5 +1,6 @@
 #include "notifyd/registrations.h"
 
+#include "base/has_nul.h"
 #include "base/json/document.h"
 #include "base/platform_files.h"
 #include "base/whole_file.h"
@@ -25,8 +26,7 @@ constexpr mode_t kDirectoryMode = 0755;
 constexpr mode_t kFileMode = 0644;
 
 bool IsAbsolutePath(const Json::Value &value) {
-    return value.isString() && value.asString().rfind('/', 0) == 0 &&
-           value.asString().find('\0') == std::string::npos;
+    return value.isString() && value.asString().rfind('/', 0) == 0 && !HasNul(value.asString());
 }
 
 bool IsWatch(const Json::Value &watch) {

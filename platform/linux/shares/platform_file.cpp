@@ -1,5 +1,6 @@
 #include "shares/platform_file.h"
 
+#include "base/has_nul.h"
 #include "base/json/document.h"
 #include "base/platform_files.h"
 #include "base/unique_fd.h"
@@ -41,7 +42,7 @@ bool SameTime(const timespec &a, const timespec &b) {
 
 // A directory below the share's, such as "#recycle"; an empty text means none.
 bool IsRelativeDirectory(const std::string &text) {
-    return text.empty() || (text.front() != '/' && text.back() != '/' && text.find('\0') == text.npos);
+    return text.empty() || (text.front() != '/' && text.back() != '/' && !HasNul(text));
 }
 
 bool ReadSetting(const Json::Value &record, const char *member, std::string &setting) {

@@ -1,5 +1,7 @@
 #include "shares/share_table.h"
 
+#include "base/has_nul.h"
+
 #include <vork/error.h>
 
 #include <climits>
@@ -40,8 +42,7 @@ int WhyRefused(const Share &share) {
 }  // namespace
 
 bool IsComponent(std::string_view text) {
-    return !text.empty() && text != "." && text != ".." && text.find('/') == text.npos &&
-           text.find('\0') == text.npos;
+    return !text.empty() && text != "." && text != ".." && text.find('/') == text.npos && !HasNul(text);
 }
 
 void ShareTable::Add(Share share) {

@@ -1,5 +1,6 @@
 #include "facts/configuration.h"
 
+#include "base/has_nul.h"
 #include "base/json/document.h"
 #include "base/json/text.h"
 #include "facts/paths.h"
@@ -128,7 +129,7 @@ private:
     // What is absent is empty or false, as in folder.conf.
     Json::Value Record(const std::string &path, const Json::Value &given, const std::string &member) const {
         RequireObject(given, member);
-        if (path.empty() || path.front() != '/' || path.find('\0') != std::string::npos) {
+        if (path.empty() || path.front() != '/' || HasNul(path)) {
             Fault(member, "a share path is expected: it begins with \"/\" and a share's name");
         }
         Json::Value record = VORK::FILEINDEX::Folder().asJson();
