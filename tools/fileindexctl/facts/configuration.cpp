@@ -33,124 +33,119 @@ Json::Value Flags(const std::set<std::string> &names) {
     return flags;
 }
 
-std::string Member(const std::string &parent, const std::string &name) {
-    return parent + "[" + Quoted(name) + "]";
-}
-
-// The checks, each of which names the member at fault.
-class Checker {
+// A part of the document. Each check names the place at fault.
+class Part {
 public:
-    explicit Checker(const std::string &source) : source_(source) {}
+    Part(const std::string &source, const Json::Value &value, std::string place = {})
+        : source_(source), value_(value), place_(std::move(place)) {}
 
-    [[noreturn]] void Fault(const std::string &member, const std::string &what) const {
-        throw Failure(ExitStatus::kMalformed, source_ + ": " + (member.empty() ? "" : member + ": ") + what);
-    }
-
-    void RequireObject(const Json::Value &value, const std::string &member) const {
-        if (!value.isObject()) {
-            Fault(member, "an object is expected");
+    void Require(bool holds, const std::string &what) const {
+        if (!holds) {
+            throw Failure(ExitStatus::kMalformed, source_ + ": " + (place_.empty() ? "" : place_ + ": ") + what);
         }
     }
 
-    Json::Value Parse(const std::string &text) const {
-        std::string problems;
-        auto document = ParseStrictly(text, &problems);
-        if (!document && problems.empty()) {
-            Fault({}, "it is nested more deeply than " + std::to_string(kMaxJsonDepth) + " levels");
-        }
-        if (!document) {
-            std::replace(problems.begin(), problems.end(), '\n', ' ');
-            Fault({}, "this is no JSON: " + problems.substr(0, problems.find_last_not_of(' ') + 1));
-        }
-        return std::move(*document);
+    Json::Value::Members Names() const {
+        Require(value_.isObject(), "an object is expected");
+        return value_.getMemberNames();
     }
 
-    FolderRecords Folders(const Json::Value &folders) const {
-        RequireObject(folders, "folder");
-        FolderRecords records;
-        for (const auto &path : folders.getMemberNames()) {
-            records[path] = Record(path, folders[path], Member("folder", path));
-        }
-        return records;
+    Part operator[](const std::string &name) const {
+        return {source_, value_[name], place_.empty() ? name : place_ + "[" + Quoted(name) + "]"};
     }
 
-    StatusSettings Status(const Json::Value &status) const {
-        RequireObject(status, "status");
-        StatusSettings settings;
-        for (const auto &name : status.getMemberNames()) {
-            const std::string member = Member("status", name);
-            if (name == "resume_time") {
-                settings.resumeTime = InEffect(Time(status[name], member));
-            } else if (name == "no_space") {
-                settings.noSpace = Set(status[name], member);
-            } else if (name == "need_reindex") {
-                settings.needReindex = Set(status[name], member);
-            } else if (Boolean(status[name], member)) {
-                settings.markers.insert(name);
-            }
-        }
-        return settings;
+    bool Boolean() const {
+        Require(value_.isBool(), "true or false is expected");
+        return value_.asBool();
     }
 
-private:
-    bool Boolean(const Json::Value &value, const std::string &member) const {
-        if (!value.isBool()) {
-            Fault(member, "true or false is expected");
-        }
-        return value.asBool();
+    std::string Text() const {
+        Require(value_.isString(), "a text is expected");
+        return value_.asString();
     }
 
-    std::string Text(const Json::Value &value, const std::string &member) const {
-        if (!value.isString()) {
-            Fault(member, "a text is expected");
-        }
-        return value.asString();
-    }
-
-    long long Time(const Json::Value &value, const std::string &member) const {
-        if (!value.isInt64() || value.asInt64() < kNotPaused) {
-            Fault(member, "-1, 0 or a time is expected");
-        }
-        return value.asInt64();
+    long long Time() const {
+        Require(value_.isInt64() && value_.asInt64() >= kNotPaused, "-1, 0 or a time is expected");
+        return value_.asInt64();
     }
 
     // false is taken at its word here; the files themselves never hold it.
-    std::set<std::string> Set(const Json::Value &value, const std::string &member) const {
-        RequireObject(value, member);
+    std::set<std::string> Set() const {
         std::set<std::string> names;
-        for (const auto &name : value.getMemberNames()) {
-            if (Boolean(value[name], Member(member, name))) {
+        for (const auto &name : Names()) {
+            if ((*this)[name].Boolean()) {
                 names.insert(name);
             }
         }
         return names;
     }
 
-    // What is absent is empty or false, as in folder.conf.
-    Json::Value Record(const std::string &path, const Json::Value &given, const std::string &member) const {
-        RequireObject(given, member);
-        if (path.empty() || path.front() != '/' || HasNul(path)) {
-            Fault(member, "a share path is expected: it begins with \"/\" and a share's name");
-        }
-        Json::Value record = VORK::FILEINDEX::Folder().asJson();
-        record["path"] = path;
-        for (const auto &name : given.getMemberNames()) {
-            const std::string place = Member(member, name);
-            if (name == "path" && Text(given[name], place) != path) {
-                Fault(place, "it differs from the name of the record");
-            } else if (name == "name") {
-                record[name] = Text(given[name], place);
-            } else if (std::find(std::begin(kMediaKinds), std::end(kMediaKinds), name) != std::end(kMediaKinds)) {
-                record[name] = Boolean(given[name], place);
-            } else if (name != "path") {
-                Fault(place, "there is no such member");
-            }
-        }
-        return record;
-    }
-
+private:
     const std::string &source_;
+    const Json::Value &value_;
+    std::string place_;
 };
+
+// What is absent is empty or false, as in folder.conf.
+Json::Value RecordOf(const std::string &path, const Part &given) {
+    const auto names = given.Names();
+    given.Require(path.starts_with('/') && !HasNul(path),
+                  "a share path is expected: it begins with \"/\" and a share's name");
+    Json::Value record = VORK::FILEINDEX::Folder().asJson();
+    record["path"] = path;
+    for (const auto &name : names) {
+        const Part member = given[name];
+        if (name == "path") {
+            member.Require(member.Text() == path, "it differs from the name of the record");
+        } else if (name == "name") {
+            record[name] = member.Text();
+        } else {
+            member.Require(std::ranges::find(kMediaKinds, name) != std::end(kMediaKinds),
+                           "there is no such member");
+            record[name] = member.Boolean();
+        }
+    }
+    return record;
+}
+
+FolderRecords FoldersOf(const Part &folders) {
+    FolderRecords records;
+    for (const auto &path : folders.Names()) {
+        records[path] = RecordOf(path, folders[path]);
+    }
+    return records;
+}
+
+StatusSettings StatusOf(const Part &status) {
+    StatusSettings settings;
+    for (const auto &name : status.Names()) {
+        const Part member = status[name];
+        if (name == "resume_time") {
+            settings.resumeTime = InEffect(member.Time());
+        } else if (name == "no_space") {
+            settings.noSpace = member.Set();
+        } else if (name == "need_reindex") {
+            settings.needReindex = member.Set();
+        } else if (member.Boolean()) {
+            settings.markers.insert(name);
+        }
+    }
+    return settings;
+}
+
+Json::Value Parse(const std::string &text, const std::string &source) {
+    std::string problems;
+    auto document = ParseStrictly(text, &problems);
+    if (document) {
+        return std::move(*document);
+    }
+    std::replace(problems.begin(), problems.end(), '\n', ' ');
+    problems.erase(problems.find_last_not_of(' ') + 1);
+    throw Failure(ExitStatus::kMalformed, source + ": " +
+                                              (problems.empty() ? "it is nested more deeply than " +
+                                                                      std::to_string(kMaxJsonDepth) + " levels"
+                                                                : "this is no JSON: " + problems));
+}
 
 }  // namespace
 
@@ -183,25 +178,22 @@ Json::Value DocumentOf(const FolderRecords &folders, const StatusSettings &statu
 }
 
 Configuration ParseConfiguration(const std::string &text, const std::string &source) {
-    const Checker checker(source);
-    Json::Value document = checker.Parse(text);
-    checker.RequireObject(document, {});
-    if (document.isMember("schema") && document.isMember("data")) {  // what "export --json" writes
-        const Json::Value data = document["data"];
-        checker.RequireObject(data, "data");
-        document = data;
-    }
-    if (document["version"] != kVersion) {
-        checker.Fault("version", "1 is expected");
-    }
+    const Json::Value document = Parse(text, source);
+    const Part whole(source, document);
+    // "export --json" wraps it.
+    const bool isWrapped = document.isObject() && document.isMember("schema") && document.isMember("data");
+    (isWrapped ? whole["data"] : whole).Names();  // throws unless it is an object
+    const Json::Value &values = isWrapped ? document["data"] : document;
+    const Part content(source, values);
+    content["version"].Require(values["version"] == kVersion, "1 is expected");
     Configuration configuration;
-    for (const auto &name : document.getMemberNames()) {
+    for (const auto &name : content.Names()) {
         if (name == "folder") {
-            configuration.folders = checker.Folders(document[name]);
+            configuration.folders = FoldersOf(content[name]);
         } else if (name == "status") {
-            configuration.status = checker.Status(document[name]);
-        } else if (name != "version") {
-            checker.Fault(name, "there is no such member");
+            configuration.status = StatusOf(content[name]);
+        } else {
+            content[name].Require(name == "version", "there is no such member");
         }
     }
     return configuration;

@@ -123,37 +123,28 @@ int FindOut() {
     return listener ? *listener : TryToConnect();
 }
 
-DaemonCondition ConditionOf(int error) {
-    switch (error) {
-        case ENOENT:
-            return DaemonCondition::kAbsent;
-        case ECONNREFUSED:
-            return DaemonCondition::kStale;
-        case EACCES:
-        case EPERM:
-            return DaemonCondition::kDenied;
-        default:
-            return DaemonCondition::kUnknown;
-    }
-}
-
 }  // namespace
 
 DaemonState ProbeDaemon() {
     const int error = FindOut();
-    if (error == 0) {
-        return {"reachable", DaemonCondition::kListening, true};
+    const std::string why = std::string("not reachable: ") + std::strerror(error);
+    switch (error) {
+        case 0:
+            return {"reachable", DaemonCondition::kListening, true};
+        case EAGAIN:
+            return {"reachable, but its backlog is full", DaemonCondition::kFull, true};
+        case ENOENT:
+            return {why, DaemonCondition::kAbsent, false};
+        case ECONNREFUSED:
+            return {why, DaemonCondition::kStale, false};
+        case EACCES:
+        case EPERM:
+            return AskKernel()
+                       ? DaemonState{"listening, but not reachable by this user", DaemonCondition::kDenied, true}
+                       : DaemonState{why, DaemonCondition::kDenied, std::nullopt};
+        default:
+            return {why, DaemonCondition::kUnknown, std::nullopt};
     }
-    if (error == EAGAIN) {
-        return {"reachable, but its backlog is full", DaemonCondition::kFull, true};
-    }
-    const DaemonCondition condition = ConditionOf(error);
-    if (condition == DaemonCondition::kDenied && AskKernel()) {
-        return {"listening, but not reachable by this user", condition, true};
-    }
-    const bool none = condition == DaemonCondition::kAbsent || condition == DaemonCondition::kStale;
-    return {std::string("not reachable: ") + std::strerror(error), condition,
-            none ? std::optional(false) : std::nullopt};
 }
 
 }  // namespace VORK::FILEINDEXCTL

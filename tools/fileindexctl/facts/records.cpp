@@ -32,6 +32,15 @@ bool Keep(int priority, const char *format, va_list arguments) noexcept {
     return isHeld;
 }
 
+void Log(int priority, const char *format, va_list arguments) {
+    va_list copy;
+    va_copy(copy, arguments);
+    if (!Keep(priority, format, copy)) {
+        vsyslog(priority, format, arguments);
+    }
+    va_end(copy);
+}
+
 // Past the `syslog` of this program.
 __attribute__((format(printf, 2, 3))) void PassOn(int priority, const char *format, ...) {
     va_list arguments;
@@ -101,13 +110,7 @@ extern "C" {
 __attribute__((visibility("default"), format(printf, 2, 3))) void syslog(int priority, const char *format, ...) {
     va_list arguments;
     va_start(arguments, format);
-    va_list copy;
-    va_copy(copy, arguments);
-    const bool isHeld = VORK::FILEINDEXCTL::Keep(priority, format, copy);
-    va_end(copy);
-    if (!isHeld) {
-        vsyslog(priority, format, arguments);
-    }
+    VORK::FILEINDEXCTL::Log(priority, format, arguments);
     va_end(arguments);
 }
 
@@ -116,13 +119,7 @@ __attribute__((visibility("default"), format(printf, 3, 4))) void __syslog_chk(i
                                                                                const char *format, ...) {
     va_list arguments;
     va_start(arguments, format);
-    va_list copy;
-    va_copy(copy, arguments);
-    const bool isHeld = VORK::FILEINDEXCTL::Keep(priority, format, copy);
-    va_end(copy);
-    if (!isHeld) {
-        vsyslog(priority, format, arguments);
-    }
+    VORK::FILEINDEXCTL::Log(priority, format, arguments);
     va_end(arguments);
 }
 
