@@ -100,27 +100,17 @@ public:
     }
 
     Invocation Run(int argc, const char *const argv[]) {
-        Invocation invocation;
         const auto own = SplitOff(argc, argv);
         try {
             app_.parse(static_cast<int>(own.size()), own.data());
         } catch (const CLI::CallForHelp &) {
-            invocation.help = app_.help();
-            return invocation;
+            return {nullptr, {}, false, app_.help()};
         } catch (const CLI::CallForVersion &) {
-            invocation.help = std::string(FILEINDEXCTL_VERSION) + "\n";
-            return invocation;
+            return {nullptr, {}, false, FILEINDEXCTL_VERSION "\n"};
         } catch (const CLI::ParseError &error) {
             throw UsageFailure(Explain(error, own));
         }
-        invocation.json = json_;
-        for (const auto &[command, app] : commands_) {
-            if (app->parsed()) {
-                invocation.command = command;
-                invocation.arguments = ArgumentsOf(*command, *app);
-            }
-        }
-        return invocation;
+        return invocation_;
     }
 
 private:
@@ -198,7 +188,9 @@ private:
         return *group->require_subcommand(1)->fallthrough();
     }
 
-    void AddJson(CLI::App &app) { app.add_flag(std::string(kJson.name), json_, std::string(kJson.help)); }
+    void AddJson(CLI::App &app) {
+        app.add_flag(std::string(kJson.name), invocation_.json, std::string(kJson.help));
+    }
 
     void AddCommand(const Command &command) {
         CLI::App &parent = ParentOf(command);
@@ -211,22 +203,30 @@ private:
         for (const auto &parameter : command.parameters) {
             AddParameter(*app, parameter);
         }
+        app->final_callback([this, &command] { invocation_.command = &command; });
         commands_.emplace_back(&command, app);
     }
 
-    static void AddParameter(CLI::App &app, const Parameter &parameter) {
+    void AddParameter(CLI::App &app, const Parameter &parameter) {
+        const bool isMany = parameter.takes == Takes::kMany;
         const std::string letter(parameter.letter);
         const std::string name = (letter.empty() ? letter : letter + ",") + std::string(parameter.name);
-        const std::string help(parameter.help);
+        CLI::Option *option = app.add_option(
+            name,
+            [this, &parameter](const CLI::results_t &values) {
+                const bool isRest = parameter.takes == Takes::kRest && !rest_.empty();
+                invocation_.arguments.Set(parameter.name, isRest ? rest_ : values);
+                return true;
+            },
+            std::string(parameter.help));
         if (parameter.takes == Takes::kNothing) {
-            app.add_flag(name)->description(help);
+            option->multi_option_policy(CLI::MultiOptionPolicy::TakeLast)->expected(0);
             return;
         }
-        CLI::Option *option = app.add_option(name)->description(help);
         option->type_name(std::string(parameter.IsOption() ? parameter.value : ""))
             ->required(parameter.IsRequired());
-        option->expected(1, parameter.takes == Takes::kMany ? CLI::detail::expected_max_vector_size : 1);
-        option->allow_extra_args(parameter.takes == Takes::kMany);
+        option->expected(1, isMany ? CLI::detail::expected_max_vector_size : 1);
+        option->allow_extra_args(isMany);
         if (parameter.takes == Takes::kNumber) {
             option->check(CheckNumber);
         }
@@ -236,20 +236,8 @@ private:
         }
     }
 
-    Arguments ArgumentsOf(const Command &command, const CLI::App &app) const {
-        Arguments arguments;
-        for (const auto &parameter : command.parameters) {
-            const CLI::Option *option = app.get_option(std::string(parameter.name));
-            if (option->count() > 0) {
-                const bool rest = parameter.takes == Takes::kRest && !rest_.empty();
-                arguments.Set(parameter.name, rest ? rest_ : option->results());
-            }
-        }
-        return arguments;
-    }
-
     CLI::App app_;
-    bool json_ = false;
+    Invocation invocation_;
     std::vector<std::string> rest_;
     std::vector<std::pair<const Command *, CLI::App *>> commands_;
 };
