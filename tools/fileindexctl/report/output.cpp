@@ -4,7 +4,6 @@
 #include "report/screen.h"
 #include "report/text.h"
 
-#include <sys/ioctl.h>
 #include <unistd.h>
 
 #include <cstdio>
@@ -13,14 +12,6 @@
 namespace VORK::FILEINDEXCTL {
 
 namespace {
-
-unsigned TerminalWidth() {
-    winsize size{};
-    if (isatty(STDOUT_FILENO) == 0) {
-        return 0;
-    }
-    return ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0 ? size.ws_col : 80;
-}
 
 bool MayColour() {
     const char *noColour = std::getenv("NO_COLOR");
@@ -46,7 +37,11 @@ Json::Value ToArray(const std::vector<std::string> &items) {
     return array;
 }
 
-Output::Output(bool json) : json_(json), colour_(MayColour()), width_(TerminalWidth()), data_(Json::objectValue) {}
+Output::Output(bool json)
+    : json_(json),
+      colour_(MayColour()),
+      width_(isatty(STDOUT_FILENO) != 0 ? Screen::Width() : 0),
+      data_(Json::objectValue) {}
 
 void Output::Line(const std::string &text, Colour colour) {
     static constexpr const char *kCodes[] = {"", "\033[32m", "\033[31m", "\033[2m"};

@@ -1,5 +1,5 @@
 /// \file
-/// Times in words.
+/// What people are told of times ("indexing is paused until ...", "12 min" ago), and how a pause is set.
 #pragma once
 
 #include "report/steps.h"
@@ -11,12 +11,24 @@
 
 namespace VORK::FILEINDEXCTL {
 
+/// \name Ends of a pause that are no points in time
+/// @{
+inline constexpr long long kNotPaused = -1;
+inline constexpr long long kWithoutEnd = 0;
+/// @}
+
 /// The library and the daemon reckon pauses in 32 bits: a later end would wrap and end the pause at once.
 inline constexpr long long kLatestEnd = std::numeric_limits<int>::max();
 
-/// Pauses until that time, 0 for without an end, or resumes for -1; the first step is called `saved`. Throws
-/// Failure when nothing was done.
+/// A point in time as local clocks show it.
+std::string LocalTime(long long seconds, const char *format = "%Y-%m-%d %H:%M %Z");
+
+/// Lets a pause end then, or indexing go on for kNotPaused; the first step is called `saved`. Throws Failure when
+/// nothing was done.
 StepReport SetPause(long long resumeTime, const std::string &saved, Patience &patience);
+
+/// The same for a pause that ends after so many hours; 0 for one without an end.
+StepReport PauseForHours(int hours, const std::string &saved, Patience &patience);
 
 /// "indexing is paused until 2025-03-01 07:00 CET", for a time as StatusMgr::GetPauseInfo gives it.
 std::string PauseText(long long resumeTime);

@@ -27,10 +27,9 @@ void Print(std::string_view text) {
 
 winsize Size() {
     winsize size{};
-    if (ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) != 0 || size.ws_col == 0 || size.ws_row == 0) {
-        size.ws_col = 80;
-        size.ws_row = 24;
-    }
+    ioctl(STDOUT_FILENO, TIOCGWINSZ, &size);  // leaves zeros where nobody knows
+    size.ws_col = size.ws_col > 0 ? size.ws_col : 80;
+    size.ws_row = size.ws_row > 0 ? size.ws_row : 24;
     return size;
 }
 

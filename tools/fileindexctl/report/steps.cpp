@@ -85,26 +85,22 @@ std::string Explain(const PlannedStep &step, const std::string *record) {
 }
 
 struct Wording {
+    StepResult result;
     const char *forPeople;
     const char *forPrograms;
     Colour colour;
 };
 
-Wording WordingOf(StepResult result) {
-    switch (result) {
-        case StepResult::kDone:
-            return {"done", "done", Colour::kGood};
-        case StepResult::kAlready:
-            return {"as before", "unchanged", Colour::kDim};
-        case StepResult::kFailed:
-        case StepResult::kWentOn:
-            return {"FAILED", "failed", Colour::kBad};
-        case StepResult::kNotReached:
-            return {"not reached", "not_reached", Colour::kBad};
-        case StepResult::kSkipped:
-            return {"skipped", "skipped", Colour::kDim};
-    }
-    return {"", "", Colour::kPlain};
+const Wording &WordingOf(StepResult result) {
+    static constexpr Wording kWordings[] = {
+        {StepResult::kDone, "done", "done", Colour::kGood},
+        {StepResult::kAlready, "as before", "unchanged", Colour::kDim},
+        {StepResult::kFailed, "FAILED", "failed", Colour::kBad},
+        {StepResult::kWentOn, "FAILED", "failed", Colour::kBad},
+        {StepResult::kNotReached, "not reached", "not_reached", Colour::kBad},
+        {StepResult::kSkipped, "skipped", "skipped", Colour::kDim},
+    };
+    return *std::ranges::find(kWordings, result, &Wording::result);
 }
 
 }  // namespace
@@ -214,7 +210,7 @@ std::vector<std::string> StepReport::Tell(Output &output) const {
     std::vector<std::vector<std::string>> rows;
     auto &list = output.Data()["steps"];
     for (const auto &step : steps_) {
-        const Wording wording = WordingOf(step.result);
+        const Wording &wording = WordingOf(step.result);
         rows.push_back({step.name, wording.forPeople + (step.detail.empty() ? "" : ": " + step.detail)});
         Json::Value entry(Json::objectValue);
         entry["step"] = step.name;

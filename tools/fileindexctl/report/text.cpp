@@ -25,8 +25,9 @@ const std::uint8_t *Bytes(const std::string &text) {
     return reinterpret_cast<const std::uint8_t *>(text.data());
 }
 
-bool IsUtf8(const std::string &text) {
-    return u8_check(Bytes(text), text.size()) == nullptr;
+// The columns the text takes on a terminal. Takes UTF-8.
+unsigned DisplayWidth(const std::string &text) {
+    return static_cast<unsigned>(u8_width(Bytes(text), text.size(), "UTF-8"));
 }
 
 // No control character, nor one that is not seen, breaks the line or turns the direction of what follows.
@@ -72,40 +73,22 @@ void Fit(unsigned width, std::vector<unsigned> &widths) {
     }
 }
 
-struct Character {
-    std::size_t length;
-    unsigned width;
-};
-
-Character CharacterAt(const std::string &text, std::size_t place) {
-    ucs4_t character = 0;
-    const int length = u8_mbtouc(&character, Bytes(text) + place, text.size() - place);
-    return {static_cast<std::size_t>(length), static_cast<unsigned>(std::max(uc_width(character, "UTF-8"), 0))};
-}
-
 // The end of a path and the beginning of other texts, with "..." in the place of the rest. Takes UTF-8.
 std::string Shorten(const std::string &text, unsigned width) {
-    unsigned whole = DisplayWidth(text);
-    if (whole <= width) {
+    if (DisplayWidth(text) <= width) {
         return text;
     }
     const std::string dots(std::min(width, kDots), '.');
-    const unsigned room = width - static_cast<unsigned>(dots.size());
-    std::size_t cut = 0;
-    if (text.starts_with('/')) {
-        while (whole > room) {
-            const Character first = CharacterAt(text, cut);
-            whole -= first.width;
-            cut += first.length;
-        }
-        return dots + text.substr(cut);
+    const bool isPath = text.starts_with('/');
+    std::string kept = text;
+    while (DisplayWidth(kept) > width - dots.size()) {
+        ucs4_t character = 0;
+        const std::uint8_t *begin = Bytes(kept);
+        const std::uint8_t *last = u8_prev(&character, begin + kept.size(), begin);
+        isPath ? kept.erase(0, static_cast<std::size_t>(u8_mblen(begin, kept.size())))
+               : kept.erase(static_cast<std::size_t>(last - begin));
     }
-    unsigned used = 0;
-    for (Character next = CharacterAt(text, 0); used + next.width <= room; next = CharacterAt(text, cut)) {
-        used += next.width;
-        cut += next.length;
-    }
-    return text.substr(0, cut) + dots;
+    return isPath ? dots + kept : kept + dots;
 }
 
 }  // namespace
@@ -126,11 +109,6 @@ std::string Printable(const std::string &text) {
         i = end;
     }
     return result;
-}
-
-unsigned DisplayWidth(const std::string &text) {
-    const int width = IsUtf8(text) ? u8_width(Bytes(text), text.size(), "UTF-8") : -1;
-    return width >= 0 ? static_cast<unsigned>(width) : static_cast<unsigned>(text.size());
 }
 
 std::string Quoted(const std::string &text) {

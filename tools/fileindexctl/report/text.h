@@ -11,9 +11,6 @@ namespace VORK::FILEINDEXCTL {
 /// change the direction of writing, and bytes that are not UTF-8. What is printable already stays as it is.
 std::string Printable(const std::string &text);
 
-/// The columns the text takes on a terminal; for bytes that are not UTF-8, their number.
-unsigned DisplayWidth(const std::string &text);
-
 /// The text in double quotes.
 std::string Quoted(const std::string &text);
 

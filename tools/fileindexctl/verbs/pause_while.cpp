@@ -24,8 +24,6 @@ namespace {
 
 using VORK::FILEINDEX::StatusMgr;
 
-constexpr long long kNotPaused = -1;
-constexpr long long kWithoutEnd = 0;
 // Other programs hold a lock for moments, and a pause that is left behind is worse than a wait.
 constexpr std::chrono::seconds kLeastPatience(10);
 

@@ -3,10 +3,10 @@
 #include "facts/progress.h"
 #include "facts/status_report.h"
 #include "report/failure.h"
+#include "report/schedule.h"
 #include "report/screen.h"
 #include "report/text.h"
 
-#include <array>
 #include <chrono>
 #include <ctime>
 #include <functional>
@@ -57,15 +57,6 @@ StatusReport Sample(const Reporter &reporter, Progress &progress) {
     return report;
 }
 
-std::string Clock() {
-    const std::time_t now = std::time(nullptr);
-    std::tm local{};
-    localtime_r(&now, &local);
-    std::array<char, 40> text{};
-    std::strftime(text.data(), text.size(), "%Y-%m-%dT%H:%M:%S%z", &local);
-    return text.data();
-}
-
 // One line, for logs and for programs that read lines.
 std::string Brief(const StatusReport &report, const Progress &progress) {
     std::vector<std::string> shares;
@@ -76,8 +67,9 @@ std::string Brief(const StatusReport &report, const Progress &progress) {
     for (const auto &share : report.data["paused_shares"]) {
         paused.push_back(share.asString());
     }
-    return Clock() + ": " + report.state + ", " + std::to_string(report.Queued()) + " queued" +
-           (shares.empty() ? "" : " (" + Enumerate(shares) + ")") + ", taken away: " + report.Taken() + ", " +
+    return LocalTime(std::time(nullptr), "%Y-%m-%dT%H:%M:%S%z") + ": " + report.state + ", " +
+           std::to_string(report.Queued()) + " queued" + (shares.empty() ? "" : " (" + Enumerate(shares) + ")") +
+           ", taken away: " + report.Taken() + ", " +
            (paused.empty() ? "" : "paused: " + Enumerate(paused) + ", ") + ProgressText(report, progress);
 }
 
