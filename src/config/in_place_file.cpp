@@ -83,7 +83,7 @@ bool WriteOnce(int fd, std::string_view bytes, std::size_t offset) {
     return count >= 0 && static_cast<std::size_t>(count) == bytes.size();
 }
 
-/// Sets the file's length, on the disk too: the next tail must not meet what is left of this one.
+/// Sets the file's length, on the disk too: nothing of this tail may be left under the next one.
 bool CutTo(int fd, std::size_t size) {
     return ftruncate(fd, static_cast<off_t>(size)) == 0 && FlushData(fd);
 }

@@ -27,8 +27,8 @@ Presence PresenceOf(const std::string &path) {
     return errno == ENOENT || errno == ENOTDIR ? Presence::kMissing : Presence::kUnknown;
 }
 
-/// A text that is no JSON, or was read while a writer was at work, is read again: the writer may have been starved
-/// of the file's lock, or hold it while it is not running. What is really broken stays so.
+/// Reads again when the text is no JSON or a writer was at work: the writer may not have got the file's lock in
+/// time, or may have it without getting to run. A file that is really broken is so the third time as well.
 bool ReadAndParse(const std::string &path, const TextParser &parse) {
     constexpr int kAttempts = 3;
     for (int attempt = 1; attempt <= kAttempts; ++attempt) {

@@ -7,7 +7,7 @@
 
 namespace VORK::FILEINDEX::internal {
 
-/// Gets the file's text, which it may change, and tells whether it is JSON.
+/// Parses the file's text, which it may change. False when that is no JSON.
 using TextParser = std::function<bool(std::string &text)>;
 
 /// True also when there is no file; then `parse` is not called. Otherwise one record and FILEINDEX_ERR_LOAD_JSON.

@@ -13,7 +13,7 @@ namespace {
 // blocks flushes several at once, which loses nothing.
 constexpr std::size_t kPage = 4096;
 
-// A NUL, so that no document can hold a trailer; then in words and hexadecimal digits, for whoever meets one.
+// It begins with a NUL, so that no document can hold a trailer. The rest is text, for people who find one.
 constexpr std::size_t kTrailerSize = 40;
 
 /// FNV-1a: it has to tell a torn text from a whole one, not to resist an attacker.

@@ -6,7 +6,6 @@
 #include "records.h"
 
 #include <fileindex/fileidx.h>
-#include <fileindex/folders.h>
 #include <fileindex/index_mgr.h>
 #include <fileindex/paths.h>
 

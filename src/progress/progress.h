@@ -11,7 +11,7 @@ inline constexpr char kPaused[] = "paused";
 inline constexpr char kProcessing[] = "processing";
 inline constexpr char kNoSpace[] = "err_no_space";
 
-/// What is said of work that is left: "paused" or "processing".
+/// The word for a folder or service with work left: "paused" or "processing".
 const char *ProgressOfWork(long long resumeTime);
 
 /// StatusMgr::GetFolderStatus.

@@ -198,8 +198,8 @@ bool IsSkipIndex(const std::string &fullPath) {
             IsInRecycleBin(fullPath) || IsInSnapshot(fullPath)) {
             return true;
         }
-        // Unlike CanFullPathBeIndexed: skipping a file for want of an answer would leave it out of the index for
-        // good.
+        // Unlike in CanFullPathBeIndexed: a file that is skipped because the platform cannot tell would stay out
+        // of the index for good.
         return type != kUnknownFileSystem && IsForeignFileSystem(type);
     });
 }

@@ -39,7 +39,7 @@ struct Announcement {
     }
 };
 
-/// In 32 bits, as the daemon reckons it: an end past January 2038 wraps to the past, and the daemon resumes at
+/// In 32 bits, as the daemon computes it: an end past January 2038 wraps to the past, and the daemon resumes at
 /// once instead of never.
 long long ResumeTimeIn(int hours) {
     if (hours == 0) {
