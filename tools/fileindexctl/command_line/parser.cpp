@@ -129,24 +129,18 @@ private:
     }
 
     static bool TakesRest(std::string_view word) {
-        for (const auto &command : Commands()) {
-            for (const auto &parameter : command.parameters) {
-                if (parameter.takes == Takes::kRest && parameter.name == word) {
-                    return true;
-                }
-            }
-        }
-        return false;
+        return std::ranges::any_of(Commands(), [&](const Command &command) {
+            return std::ranges::any_of(command.parameters, [&](const Parameter &parameter) {
+                return parameter.takes == Takes::kRest && parameter.name == word;
+            });
+        });
     }
 
     // In the order of the line; the parser's own text has them the other way round.
     static std::string Unexpected(const std::vector<std::string> &words) {
-        std::string text = words.size() == 1 ? "The following argument was not expected:"
-                                             : "The following arguments were not expected:";
-        for (const auto &word : words) {
-            text += " " + word;
-        }
-        return text;
+        const std::string text = words.size() == 1 ? "The following argument was not expected:"
+                                                   : "The following arguments were not expected:";
+        return text + " " + CLI::detail::join(words, " ");
     }
 
     // A word that is no command is not what the parser complains about first.

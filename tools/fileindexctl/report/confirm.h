@@ -1,5 +1,5 @@
 /// \file
-/// Consent to what deletes.
+/// Asks before what cannot be undone.
 #pragma once
 
 #include "command_line/arguments.h"

@@ -1,5 +1,5 @@
 /// \file
-/// Folder records in words.
+/// Folder records as people read and type them.
 #pragma once
 
 #include <json/value.h>

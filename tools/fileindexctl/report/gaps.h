@@ -1,5 +1,5 @@
 /// \file
-/// What a report has to do without.
+/// What a report could not find out, and why.
 #pragma once
 
 #include "report/exit_status.h"

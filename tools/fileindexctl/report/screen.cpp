@@ -16,14 +16,10 @@ namespace VORK::FILEINDEXCTL {
 
 namespace {
 
-constexpr std::string_view kEnter = "\033[?25l\033[?7l";  // no cursor, no wrapping
-constexpr std::string_view kLeave = "\033[?7h\033[?25h";
-constexpr std::string_view kClearRestOfLine = "\033[K";
-constexpr std::string_view kClearBelow = "\033[J";
-
-void Print(std::string_view text) {
-    std::fwrite(text.data(), 1, text.size(), stdout);
-}
+constexpr const char *kEnter = "\033[?25l\033[?7l";  // no cursor, no wrapping
+constexpr const char *kLeave = "\033[?7h\033[?25h";
+constexpr const char *kEndLine = "\033[K\n";  // and clear what is left of it
+constexpr const char *kClearBelow = "\033[J";
 
 winsize Size() {
     winsize size{};
@@ -46,26 +42,24 @@ unsigned Screen::Width() {
 
 void Screen::Enter() {
     drawn_ = 0;
-    Print(kEnter);
+    std::fputs(kEnter, stdout);
 }
 
 void Screen::Leave() {
-    Print(kLeave);
+    std::fputs(kLeave, stdout);
     std::fflush(stdout);
 }
 
 void Screen::Draw(const std::vector<std::string> &lines) {
     if (drawn_ > 0) {
-        Print("\033[" + std::to_string(drawn_) + "A\r");
+        std::printf("\033[%zuA\r", drawn_);
     }
     const std::size_t room = Size().ws_row - 1U;  // the cursor stands below
     drawn_ = std::min(lines.size(), room);
     for (std::size_t i = 0; i < drawn_; ++i) {
-        Print(Printable(lines[i]));
-        Print(kClearRestOfLine);
-        Print("\n");
+        std::fputs((Printable(lines[i]) + kEndLine).c_str(), stdout);
     }
-    Print(kClearBelow);
+    std::fputs(kClearBelow, stdout);
     std::fflush(stdout);
 }
 

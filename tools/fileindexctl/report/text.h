@@ -1,5 +1,5 @@
 /// \file
-/// Text for people: any bytes in, lines that keep a terminal and a table in order out. Needs no locale.
+/// Text for people: from any bytes to lines that do no harm to a terminal or a table. Needs no locale.
 #pragma once
 
 #include <string>
