@@ -79,17 +79,13 @@ bool QueueEvents(const Json::Value &reports) {
 }
 
 bool FollowShare(const Folders &saved, const std::string &share) {
-    if (IndexMgr::IsShareIndexed(share)) {
-        if (IndexMgr::UpsertVorkNotifydCfg(share)) {
-            return true;
-        }
-        syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", records::kDeleteMonitor.module,
-               records::kDeleteMonitor.line, share.c_str());
-        return false;
+    const bool isIndexed = IndexMgr::IsShareIndexed(share);
+    if (isIndexed && IndexMgr::UpsertVorkNotifydCfg(share)) {
+        return true;
     }
     // "No" can also mean that folder.conf could not be read again. Cleaning then would delete the index of a share
     // that is in use; what was just saved decides.
-    if (!FoldersOf(saved, share).empty()) {
+    if (isIndexed || !FoldersOf(saved, share).empty()) {
         syslog(LOG_ERR, "%s:%d UpsertVorkNotifydCfg failed, share=%s", records::kDeleteMonitor.module,
                records::kDeleteMonitor.line, share.c_str());
         return false;
