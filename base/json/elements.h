@@ -1,5 +1,5 @@
 /// \file
-/// The elements of a JSON array as a range.
+/// The elements of a JSON array as a range, and the names in an object.
 #pragma once
 
 #include <json/value.h>
@@ -33,5 +33,10 @@ public:
 private:
     const Json::Value &array_;
 };
+
+/// In sorted order; none for what is no object.
+inline Json::Value::Members MemberNames(const Json::Value &object) {
+    return object.isObject() ? object.getMemberNames() : Json::Value::Members();
+}
 
 }  // namespace VORK

@@ -2,6 +2,8 @@
 /// Is the indexing daemon there?
 #pragma once
 
+#include "src/names.h"
+
 #include <json/value.h>
 
 #include <optional>
@@ -9,7 +11,7 @@
 
 namespace VORK::FILEINDEXCTL {
 
-inline constexpr const char *kDaemonSocket = "/var/run/fileindexd.sock";
+using VORK::FILEINDEX::internal::kDaemonSocket;
 
 enum class DaemonCondition {
     kListening,

@@ -1,5 +1,7 @@
 #include "facts/platform_error.h"
 
+#include "base/platform_files.h"
+
 #include <vork/error.h>
 
 #include <algorithm>
@@ -44,7 +46,7 @@ std::string PlatformErrorOf(const std::string &record) {
     if (start == std::string::npos) {
         const bool isOnMonitor = record.find("tifydCfg failed") != std::string::npos;
         return isOnMonitor && VLIBCErrGet() == VORK_ERR_REGISTRATIONS
-                   ? "/usr/vork/etc/vorknotifyd/registrations.json is malformed; see \"fileindexctl doctor\""
+                   ? std::string(kRegistrationsFile) + " is malformed; see \"fileindexctl doctor\""
                    : "";
     }
     const long code = std::strtol(record.c_str() + start + sizeof(kStart) - 1, nullptr, 16);

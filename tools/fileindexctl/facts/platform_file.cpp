@@ -1,6 +1,7 @@
 #include "facts/platform_file.h"
 
 #include "base/json/document.h"
+#include "base/json/elements.h"
 #include "base/whole_file.h"
 #include "report/failure.h"
 
@@ -28,24 +29,22 @@ std::vector<std::string> UnknownMembers(const Json::Value &document) {
     std::vector<std::string> unknown;
     const auto add = [&](const Json::Value &object, const std::string &prefix,
                          const std::set<std::string> &known) {
-        for (const auto &name : object.isObject() ? object.getMemberNames() : std::vector<std::string>()) {
+        for (const auto &name : MemberNames(object)) {
             if (known.count(name) == 0) {
                 unknown.push_back(prefix + name);
             }
         }
     };
     add(document, "", {"shares", "search"});
-    const Json::Value &shares = document["shares"];
-    for (const auto &share : shares.isObject() ? shares.getMemberNames() : std::vector<std::string>()) {
-        add(shares[share], "shares." + share + ".", {"path", "recycle", "snapshot"});
+    for (const auto &share : MemberNames(document["shares"])) {
+        add(document["shares"][share], "shares." + share + ".", {"path", "recycle", "snapshot"});
     }
     return unknown;
 }
 
 std::vector<std::string> ConfiguredShares() {
     try {
-        const Json::Value document = ReadPlatformFile();
-        return document["shares"].isObject() ? document["shares"].getMemberNames() : std::vector<std::string>();
+        return MemberNames(ReadPlatformFile()["shares"]);
     } catch (const Failure &) {
         return {};
     }

@@ -2,6 +2,7 @@
 
 #include "facts/share_record.h"
 #include "report/failure.h"
+#include "src/names.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -11,6 +12,9 @@
 #include <utility>
 
 namespace VORK::FILEINDEXCTL {
+
+using VORK::FILEINDEX::internal::kMetadataDir;
+using VORK::FILEINDEX::internal::kQueueFile;
 
 namespace {
 
@@ -32,7 +36,7 @@ UniqueFd OpenDirectory(const std::string &queuePath) {
 
 std::string QueuePathOf(const std::string &share) {
     const SharePointer found = FindShare(share);
-    return found ? found->szPath + std::string("/@eaDir/VORK@file_index_queue") : std::string();
+    return found ? std::string(found->szPath) + "/" + kMetadataDir + "/" + kQueueFile : std::string();
 }
 
 std::string TroubleWithQueue(const std::string &share) {

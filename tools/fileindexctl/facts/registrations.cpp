@@ -19,9 +19,6 @@ namespace VORK::FILEINDEXCTL {
 
 namespace {
 
-constexpr unsigned kMask = 0xFFCE;
-constexpr const char *kIgnored = "@eaDir";
-
 Watches::value_type WatchOf(Json::Value entry) {
     const std::string path = entry["path"].asString();
     entry.removeMember("path");
@@ -135,8 +132,8 @@ void WarnOfResumption(const std::set<std::string> &touched, const std::set<std::
 Watches::value_type ExpectedWatch(const std::string &fullPath) {
     Json::Value entry(Json::objectValue);
     entry["path"] = fullPath;
-    entry["mask"] = kMask;
-    entry["ignore"].append(kIgnored);
+    entry["mask"] = VORK::FILEINDEX::internal::kMonitorMask;
+    entry["ignore"].append(VORK::FILEINDEX::internal::kMetadataDir);
     return WatchOf(entry);
 }
 

@@ -6,6 +6,7 @@
 #include "base/platform_files.h"
 #include "facts/paths.h"
 #include "report/output.h"
+#include "src/names.h"
 
 #include <map>
 #include <set>
@@ -14,7 +15,7 @@
 namespace VORK::FILEINDEXCTL {
 
 /// The name under which the library registers.
-inline constexpr const char *kRegistration = "fileindex";
+inline constexpr const char *kRegistration = VORK::FILEINDEX::internal::kMonitorName;
 
 /// By full path, how it is watched: the rest of its entry, as text.
 using Watches = std::map<std::string, std::string>;

@@ -2,10 +2,11 @@
 /// What the platform knows of a share.
 #pragma once
 
+#include "src/names.h"
+
 #include <vork/share.h>
 
 #include <array>
-#include <climits>
 #include <memory>
 #include <optional>
 #include <string>
@@ -26,8 +27,8 @@ inline SharePointer FindShare(const std::string &name) {
 
 /// The name and the directory of the share that holds a full path; nothing when none does.
 inline std::optional<std::pair<std::string, std::string>> ShareHolding(const std::string &fullPath) {
-    std::array<char, 492> name{};
-    std::array<char, PATH_MAX> directory{};
+    std::array<char, VORK::FILEINDEX::internal::kShareNameSize> name{};
+    std::array<char, VORK::FILEINDEX::internal::kPathSize> directory{};
     if (VORKShareNamePathGet(fullPath.c_str(), name.data(), name.size(), directory.data(), directory.size()) < 0) {
         return std::nullopt;
     }

@@ -1,13 +1,19 @@
 #include "facts/status_file.h"
 
+#include "base/json/elements.h"
 #include "report/failure.h"
+#include "src/names.h"
 
 namespace VORK::FILEINDEXCTL {
 
+using VORK::FILEINDEX::internal::kNeedReindexKey;
+using VORK::FILEINDEX::internal::kNoSpaceKey;
+using VORK::FILEINDEX::internal::kResumeTimeKey;
+
 namespace {
 
-std::set<std::string> NamesIn(const Json::Value &object) {
-    const auto names = object.isObject() ? object.getMemberNames() : Json::Value::Members();
+std::set<std::string> NameSet(const Json::Value &object) {
+    const auto names = MemberNames(object);
     return {names.begin(), names.end()};
 }
 
@@ -26,13 +32,13 @@ long long StatusFile::LoadPause() {
 }
 
 std::set<std::string> StatusFile::Marked(const char *flag) const {
-    return document_.isObject() ? NamesIn(document_[flag]) : std::set<std::string>();
+    return document_.isObject() ? NameSet(document_[flag]) : std::set<std::string>();
 }
 
 std::set<std::string> StatusFile::Markers() {
-    std::set<std::string> markers = NamesIn(document_);
+    std::set<std::string> markers = NameSet(document_);
     std::erase_if(markers, [this](const std::string &name) {
-        return name == "resume_time" || name == "no_space" || name == "need_reindex" || !IsUpdated(name);
+        return name == kResumeTimeKey || name == kNoSpaceKey || name == kNeedReindexKey || !IsUpdated(name);
     });
     return markers;
 }
