@@ -6,7 +6,6 @@
 #include <fcntl.h>
 #include <sys/file.h>
 
-#include <cstdio>
 #include <map>
 #include <sstream>
 
@@ -61,31 +60,27 @@ void Prepare(const Row &row) {
 /// A configuration file as everybody loads it: a tail may follow the bytes that stand first.
 class Loaded : public Config {
 public:
-    explicit Loaded(const char *path) : path_(path), isWhole_(LoadJson()) {}
+    explicit Loaded(const char *path) : path_(path), isWhole(LoadJson()) {}
     bool Load() override { return true; }
     bool Save() override { return false; }
     std::string GetLockPath() const override { return ""; }
     std::string GetPath() const override { return path_; }
-
-    bool IsWhole() const { return isWhole_; }
     bool operator==(const Loaded &other) const { return document_ == other.document_; }
 
 private:
     const char *path_;
-    bool isWhole_;
+
+public:
+    const bool isWhole;
 };
 
-struct Files {
-    Loaded folders{kFolderConf};
-    Loaded status{kStatusConf};
-};
-
+/// A change is done wholly or not at all.
 const char *StateOf(const Loaded &before, const Loaded &after, const Loaded &repeated) {
-    return after == before ? "old" : after == repeated ? "new" : "lost";
+    return !after.isWhole ? "BROKEN" : after == before ? "old" : after == repeated ? "new" : "LOST";
 }
 
 bool HasWholeLines() {
-    std::istringstream queue(ReadFile(kQueue).value_or(""));
+    std::istringstream queue(ReadFile(kQueue));
     std::string line;
     while (std::getline(queue, line) && Parse(line)) {
     }
@@ -105,9 +100,9 @@ void Operation(const std::string &name) {
     const Row &row = kOperations.at(name);
     Prepare(row);
     const pid_t daemon = StartDaemon();
-    const Files before;
+    const Loaded folders(kFolderConf);
+    const Loaded status(kStatusConf);
     const auto open = fileindex_test::OpenDescriptors();
-    ErrorHandler::SetError(FILEINDEX_ERR_NONE);
     ::getppid();  // marks the beginning in the trace
     const bool result = row.run();
     ::getppid();  // and the end
@@ -115,14 +110,14 @@ void Operation(const std::string &name) {
     const auto records = fileindex_test::SyslogCapture::Records();
     const bool sameDescriptors = fileindex_test::OpenDescriptors() == open;
     const bool locksFree = IsFree(kFolderLock) && IsFree(kStatusLock);
-    const Files after;
-    const bool whole = after.folders.IsWhole() && after.status.IsWhole() && HasWholeLines();
-    const bool repeated = row.run();
-    const Files again;
-    std::printf("%s %d folders=%s status=%s files=%s locks=%s descriptors=%s repeated=%s",
-                result ? "true" : "false", code, StateOf(before.folders, after.folders, again.folders),
-                StateOf(before.status, after.status, again.status), whole ? "whole" : "BROKEN",
-                locksFree ? "free" : "HELD", sameDescriptors ? "same" : "DIFFERENT", repeated ? "true" : "false");
+    const Loaded foldersAfter(kFolderConf);
+    const Loaded statusAfter(kStatusConf);
+    const bool isRepeated = row.run();
+    std::printf("%s %d folders=%s status=%s queue=%s locks=%s descriptors=%s repeated=%s",
+                result ? "true" : "false", code, StateOf(folders, foldersAfter, Loaded(kFolderConf)),
+                StateOf(status, statusAfter, Loaded(kStatusConf)), HasWholeLines() ? "whole" : "BROKEN",
+                locksFree ? "free" : "HELD", sameDescriptors ? "same" : "DIFFERENT",
+                isRepeated ? "true" : "false");
     for (const auto &record : records) {
         std::printf("; %s %s", record.file.c_str(), record.message.c_str());
     }

@@ -6,7 +6,7 @@
 #include <sys/file.h>
 #include <sys/resource.h>
 
-#include <cstdio>
+#include <algorithm>
 #include <map>
 #include <sstream>
 
@@ -87,7 +87,7 @@ bool ConsumeOnce(Consumed &consumed) {
     }
     const int fd = ::open(taken.c_str(), O_RDONLY | O_CLOEXEC);
     Check(fd >= 0 && ::flock(fd, LOCK_EX) == 0, "take the queue");
-    std::istringstream lines(ReadFile(taken).value_or(""));
+    std::istringstream lines(ReadFile(taken));
     ::unlink(taken.c_str());
     ::close(fd);
     const double gone = Now();
