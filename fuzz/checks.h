@@ -1,8 +1,9 @@
 /// \file
-/// What the fuzz targets share: their one kind of assertion, files, the in-memory platform, and the checks.
+/// What the fuzz targets share: their one kind of assertion, files, and the in-memory platform.
 #pragma once
 
-#include <cstddef>
+#include "input.h"
+
 #include <string>
 #include <string_view>
 
@@ -18,23 +19,13 @@ void WriteWhole(const std::string &path, std::string_view text);
 inline constexpr const char *kShares[] = {"a", "b", "photo", "ro"};
 
 std::string ShareOf(const std::string &path);  ///< what stands between the first character and the next "/"
+bool IsKnown(const std::string &path);         ///< is it in one of the shares?
 std::string QueueOf(const std::string &share);
-
-/// Forgets earlier inputs: what the platform and the log have kept, the configuration files and the shares'
-/// queues.
-void ResetMachine();
 
 /// The commands the daemon got since the last time, each a line; malformed frames end the program.
 std::string TakeCommands();
 
-/// The fast reader against the exact one, and the writer against the JSON library's. Each returns whether the fast
-/// reader decided, or whether the text is JSON at all.
-bool CheckEvent(std::string_view line);
-bool CheckFolders(std::string_view text);
-bool CheckWriter(std::string_view text);
-
-/// Every way of reading a queue file against a plain one, line by line: the queue whole, and in two steps: the
-/// first `cut` bytes, and again when the rest has been appended.
-void CheckQueue(const std::string &text, std::size_t cut);
+using Target = void(Input &input);
+Target FeedReaders, FeedQueue, FeedDocuments, FeedPaths, FeedOperations;
 
 }  // namespace fileindex_fuzz

@@ -9,10 +9,6 @@
 #include <fileindex/index_mgr.h>
 #include <fileindex/status_mgr.h>
 
-#include <fuzzer/FuzzedDataProvider.h>
-
-#include <algorithm>
-#include <iterator>
 #include <map>
 #include <set>
 #include <utility>
@@ -22,6 +18,8 @@ namespace fileindex_fuzz {
 
 namespace {
 
+using VORK::JsonReader;
+using VORK::ToString;
 using VORK::FILEINDEX::IndexMgr;
 using VORK::FILEINDEX::StatusMgr;
 namespace names = VORK::FILEINDEX::internal;
@@ -58,13 +56,12 @@ Json::Value Put(Json::Value &folders, const Json::Value &element) {
     for (const auto &[flag, member] : names::kMediaKinds) {
         record[flag] = element.get(flag, record.get(flag, false));
     }
-    const bool known = std::count(std::begin(kShares), std::end(kShares), ShareOf(path)) > 0;
-    return known ? Report(before, record) : Json::Value();
+    return IsKnown(path) ? Report(before, record) : Json::Value();
 }
 
 /// A line of a queue.
 std::string Line(const char *type, const std::string &path, const Json::Value &data) {
-    return R"({"data":)" + names::ToString(data) + R"(,"event":)" + type + R"(,"path":"/vol1)" + path + "\"}\n";
+    return R"({"data":)" + ToString(data) + R"(,"event":)" + type + R"(,"path":"/vol1)" + path + "\"}\n";
 }
 
 Json::Value PathsOf(const Json::Value &records) {
@@ -101,7 +98,7 @@ struct Model {
 
     void ReportChanges(const char *command, const Json::Value &paths, const Json::Value &reports) {
         for (const Json::Value &path : paths) {
-            Command(command, R"("folder_path":)", names::ToString(path));
+            Command(command, R"("folder_path":)", ToString(path));
         }
         for (const std::string &path : reports.getMemberNames()) {
             Event(kSetting, path, reports[path]);
@@ -192,35 +189,35 @@ struct Model {
     }
 };
 
-Json::Value SomeRecords(FuzzedDataProvider &input, int most) {
+Json::Value SomeRecords(Input &input, std::size_t most) {
     Json::Value records(Json::arrayValue);
-    for (auto left = input.ConsumeIntegralInRange(0, most); left > 0; --left) {
+    for (std::size_t left = input.Below(most + 1); left > 0; --left) {
         Json::Value &record = records.append(Json::objectValue);
-        record["path"] = input.PickValueInArray(kPaths);
+        record["path"] = input.OneOf(kPaths);
         for (const auto &[flag, member] : names::kMediaKinds) {
-            if (input.ConsumeBool()) {
-                record[flag] = input.ConsumeBool();
+            if (input.OneIn(2)) {
+                record[flag] = input.OneIn(2);
             }
         }
-        if (input.ConsumeBool()) {
-            record["name"] = input.ConsumeRandomLengthString(8);
+        if (input.OneIn(2)) {
+            record["name"] = input.Text("p");
         }
     }
     return records;
 }
 
 /// Do the library and the model give the same answer?
-bool Step(FuzzedDataProvider &input, Model &model, int operation) {
-    const std::string share = input.PickValueInArray(kNames);
-    const std::string to = input.PickValueInArray(kNames);
-    const bool set = input.ConsumeBool();
+bool Step(Input &input, Model &model, std::size_t operation) {
+    const std::string share = input.OneOf(kNames);
+    const std::string to = input.OneOf(kNames);
+    const bool set = input.OneIn(2);
     const Json::Value records = SomeRecords(input, operation < 3 ? 3 : 0);
     const Json::Value paths = PathsOf(records);
     switch (operation) {
         case 0:
             return IndexMgr::Upsert(records) == model.Upsert(records);
         case 1:  // a share that is away has no event: see the tests
-            return names::ToString(paths).find("away") != std::string::npos ||
+            return ToString(paths).find("away") != std::string::npos ||
                    IndexMgr::Delete(paths) == model.Delete(paths);
         case 2:
             return IndexMgr::Reindex(paths) == model.Reindex(paths);
@@ -264,13 +261,13 @@ void Compare(const char *what, const std::string &is, const std::string &expecte
 std::string FileAsText(const char *path) {
     Json::Value document(Json::objectValue);
     const std::string text = ReadWhole(path);
-    Require(text.empty() || names::JsonReader().Parse(text, document), "a broken file", text);
-    return names::ToString(document);
+    Require(text.empty() || JsonReader().Parse(text, document), "a broken file", text);
+    return ToString(document);
 }
 
 void CompareAll(Model &model) {
-    Compare("folder.conf differs", FileAsText(names::kFolderConf), names::ToString(model.folders));
-    Compare("status.conf differs", FileAsText(names::kStatusConf), names::ToString(model.status));
+    Compare("folder.conf differs", FileAsText(names::kFolderConf), ToString(model.folders));
+    Compare("status.conf differs", FileAsText(names::kStatusConf), ToString(model.status));
     for (const char *share : kShares) {
         Compare("a queue differs", ReadWhole(QueueOf(share)), model.queues[share]);
     }
@@ -279,11 +276,10 @@ void CompareAll(Model &model) {
 
 }  // namespace
 
-void FeedOperations(const std::string &bytes) {
-    FuzzedDataProvider input(reinterpret_cast<const std::uint8_t *>(bytes.data()), bytes.size());
+void FeedOperations(Input &input) {
     Model model;
-    for (int step = 0; step < 16 && input.remaining_bytes() > 0; ++step) {
-        const int operation = input.ConsumeIntegralInRange(0, 11);
+    while (!input.IsEmpty()) {
+        const std::size_t operation = input.Below(12);
         Require(Step(input, model, operation), "the answer differs", std::to_string(operation));
         CompareAll(model);
     }

@@ -8,11 +8,6 @@
 #include <fileindex/indexability.h>
 #include <fileindex/paths.h>
 
-#include <fuzzer/FuzzedDataProvider.h>
-
-#include <algorithm>
-#include <iterator>
-
 namespace fileindex_fuzz {
 
 namespace {
@@ -27,8 +22,7 @@ void CheckPath(const std::string &path) {
     Require(share == (path.empty() ? kUntouched : ShareOf(path)), "another share name", path);
 
     std::string full = kUntouched;
-    const bool known = std::count(std::begin(kShares), std::end(kShares), ShareOf(path)) > 0 &&
-                       path.find('\0') == std::string::npos;
+    const bool known = IsKnown(path) && path.find('\0') == std::string::npos;
     Require(GetFullPath(full, path) == known, "full path", path);
     Require(full == (known ? "/vol1" + path : kUntouched), "another full path", path);
     if (known && path[0] == '/') {
@@ -70,21 +64,19 @@ void CheckIndexability(const std::string &path) {
 
 }  // namespace
 
-void FeedPaths(const std::string &bytes) {
-    FuzzedDataProvider input(reinterpret_cast<const std::uint8_t *>(bytes.data()), bytes.size());
-    const std::string first = input.ConsumeRandomLengthString();
-    std::string second = input.ConsumeRandomLengthString();
-    if (input.ConsumeBool()) {
-        second = first + second;  // seldom met by chance
+void FeedPaths(Input &input) {
+    while (!input.IsEmpty()) {
+        const std::string first = input.MaybeSpoilt("Z");
+        const std::string second = (input.OneIn(2) ? first : "") + input.MaybeSpoilt("Z");
+        for (const std::string &path : {first, second}) {
+            CheckPath(path);
+            CheckPath("/" + path);
+            CheckIndexability(path);
+            CheckIndexability("/vol1/" + path);
+        }
+        CheckBoth(first, second);
+        CheckBoth(second, first);
     }
-    for (const std::string &path : {first, second}) {
-        CheckPath(path);
-        CheckPath("/" + path);
-        CheckIndexability(path);
-        CheckIndexability("/vol1/" + path);
-    }
-    CheckBoth(first, second);
-    CheckBoth(second, first);
 }
 
 }  // namespace fileindex_fuzz

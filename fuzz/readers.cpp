@@ -1,3 +1,5 @@
+// The fast readers of queue lines, queues and folder.conf against the exact one, and the writer of JSON against
+// the JSON library's.
 #include "base/json/text.h"
 #include "base/metadata_entry.h"
 #include "base/queue/event.h"
@@ -140,25 +142,20 @@ void CheckFind(const std::vector<Line> &lines, const std::string &path) {
     Require(IsReindexQueued(path, kFile) == expected, "the search answers otherwise", path);
 }
 
-}  // namespace
-
-bool CheckEvent(std::string_view line) {
+void CheckEvent(std::string_view line) {
     const Alone alone(line);
     static QueueEventReader kept;  // what an earlier line left in it must not matter
     QueueEvent event = {0, "left", "over"};
-    if (!kept.ReadUsual(alone.Text(), event)) {
-        return false;
-    }
-    Require(ReferenceEvent(line) == Copy(event), "the fast reader reads another event", line);
-    return true;
+    const bool decided = kept.ReadUsual(alone.Text(), event);
+    Require(!decided || ReferenceEvent(line) == Copy(event), "the fast reader reads another event", line);
 }
 
-bool CheckFolders(std::string_view text) {
+void CheckFolders(std::string_view text) {
     const Alone alone(text);
     Folders fast;
     if (!FolderAccess::TakeText(fast, alone.Text())) {
         Require(FolderAccess::All(fast).empty(), "something was taken", text);
-        return false;
+        return;
     }
     Json::Value document;
     Require(JsonReader().Parse(text, document) && document.isObject(), "the fast reader accepts no object", text);
@@ -172,20 +169,18 @@ bool CheckFolders(std::string_view text) {
         Require(FolderAccess::StoredFullPath(folder) == FolderAccess::StoredFullPath(exact), "the place differs",
                 text);
     }
-    return true;
 }
 
-bool CheckWriter(std::string_view text) {
+void CheckWriter(std::string_view text) {
     Json::Value value;
     if (!JsonReader().Parse(text, value)) {
-        return false;
+        return;
     }
     Json::StreamWriterBuilder builder;
     builder["indentation"] = "";
     builder["emitUTF8"] = true;
     builder["commentStyle"] = "None";
     Require(ToString(value) == Json::writeString(builder, value), "the JSON library writes otherwise", text);
-    return true;
 }
 
 void CheckQueue(const std::string &text, std::size_t cut) {
@@ -203,6 +198,29 @@ void CheckQueue(const std::string &text, std::size_t cut) {
         CheckFind(lines, line.event ? line.event->path + "x" : "x");
     }
     CheckFind(lines, "");
+}
+
+}  // namespace
+
+void FeedReaders(Input &input) {
+    while (!input.IsEmpty()) {
+        const std::string text = input.MaybeSpoilt(input.OneOf({"Q", "F", "D"}));
+        CheckEvent(text);
+        CheckFolders(text);
+        CheckWriter(text);
+    }
+}
+
+/// Every way of reading a queue against a plain one: whole, and in two steps with an end in between. One place may
+/// be blown up to the reader's block or longest line; most inputs stay small, as a large one costs as much as a
+/// thousand.
+void FeedQueue(Input &input) {
+    const std::size_t kind = input.Below(256);
+    std::string text = input.MaybeSpoilt("M");
+    const std::size_t least = (kind < 225 ? 0UL : kind < 254 ? 64UL : 1024UL) * 1024;
+    const std::size_t filler = least == 0 ? 0 : least - 500 + input.Below(513);
+    text.insert(input.Below(text.size() + 1), filler, kind % 2 == 0 ? 'x' : ' ');
+    CheckQueue(text, input.Below(text.size() + 1));
 }
 
 }  // namespace fileindex_fuzz

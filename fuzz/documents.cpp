@@ -16,6 +16,7 @@ namespace fileindex_fuzz {
 
 namespace {
 
+using namespace VORK;             // NOLINT(google-build-using-namespace): its tools
 using namespace VORK::FILEINDEX;  // NOLINT(google-build-using-namespace): the subject of every check
 using namespace internal;         // NOLINT(google-build-using-namespace): its names
 
@@ -95,10 +96,8 @@ void CheckDelete(const Json::Value &request) {
     }
 }
 
-}  // namespace
-
 // No operation of the store throws, and what is saved loads again to the same list.
-void FeedFolderConf(const std::string &text) {
+void CheckFolderConf(const std::string &text) {
     WriteWhole(kFolderConf, text);
     Folders store;
     const bool isObject = HoldsAnObject(text);
@@ -129,7 +128,7 @@ void FeedFolderConf(const std::string &text) {
 }
 
 // Nothing throws, a refused change leaves the file alone, an accepted one can be read back.
-void FeedStatusConf(const std::string &text) {
+void CheckStatusConf(const std::string &text) {
     WriteWhole(kStatusConf, text);
     WriteWhole(kFolderConf, R"({"/a/d":{},"/ro/d":{},"/away/x":{}})");
     long long resumeTime = 0;
@@ -159,7 +158,7 @@ void FeedStatusConf(const std::string &text) {
 
 // Nothing throws, no lock or descriptor stays behind, the configuration stays whole, and a success means that the
 // request was carried out.
-void FeedRequests(const std::string &text) {
+void CheckRequests(const std::string &text) {
     Json::Value request;
     if (!JsonReader().Parse(text, request)) {
         return;
@@ -180,6 +179,19 @@ void FeedRequests(const std::string &text) {
         IndexMgr::Reindex(request);
     }
     IsListed("/a");
+}
+
+}  // namespace
+
+void FeedDocuments(Input &input) {
+    switch (input.Below(3)) {
+        case 0:
+            return CheckFolderConf(input.MaybeSpoilt("F"));
+        case 1:
+            return CheckStatusConf(input.MaybeSpoilt("T"));
+        default:
+            return CheckRequests(input.MaybeSpoilt("U"));
+    }
 }
 
 }  // namespace fileindex_fuzz
