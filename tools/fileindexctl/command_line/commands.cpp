@@ -25,7 +25,8 @@ constexpr Parameter kList[] = {
     {"--status", Takes::kNothing, "", "add how far indexing is; reads the queues"},
     {"--paths", Takes::kNothing, "", "only the paths, as they are, each on a line"},
 };
-constexpr Parameter kFolder[] = {{"PATH", Takes::kOne, "", "the indexed folder: /SHARE/..."}};
+constexpr Parameter kPath = {"PATH", Takes::kOne, "", "the indexed folder: /SHARE/..."};
+constexpr Parameter kFolder[] = {kPath};
 constexpr Parameter kAdd[] = {
     {"PATH", Takes::kOne, "PLACE", "the folder: /SHARE/..."},
     {"--name", Takes::kOne, "NAME", "the name that people are shown; if not given, the last part of the path"},
@@ -34,7 +35,7 @@ constexpr Parameter kAdd[] = {
     {"--force", Takes::kNothing, "", "also a folder that is yet to come"},
     kWait,
 };
-constexpr Parameter kSet[] = {{"PATH", Takes::kOne, "", "the indexed folder: /SHARE/..."}, kName, kMedia, kWait};
+constexpr Parameter kSet[] = {kPath, kName, kMedia, kWait};
 constexpr Parameter kYes = {"--yes", Takes::kNothing, "", "delete without asking"};
 constexpr Parameter kRemove[] = {
     {"PATH", Takes::kMany, "", "indexed folders"},
@@ -67,7 +68,8 @@ constexpr Parameter kDoctor[] = {
 };
 constexpr Parameter kReindex[] = {{"PATH", Takes::kMany, "PLACE", "share paths in or of indexed folders"}, kWait};
 constexpr Parameter kRevive[] = {{"SHARE", Takes::kMany, "", "names of shares"}, kWait};
-constexpr Parameter kShare[] = {{"SHARE", Takes::kOne, "", "the name of the share"}};
+constexpr Parameter kShareName = {"SHARE", Takes::kOne, "", "the name of the share"};
+constexpr Parameter kShare[] = {kShareName};
 constexpr Parameter kShareRename[] = {
     {"OLD", Takes::kOne, "", "the name that the share had"},
     {"NEW", Takes::kOne, "", "the name that the share has now"},
@@ -75,8 +77,8 @@ constexpr Parameter kShareRename[] = {
      "without asking, overwrite settings of folders that are indexed under both names"},
     kWait,
 };
-constexpr Parameter kShareRemove[] = {{"SHARE", Takes::kOne, "", "the name of the share"}, kYes, kWait};
-constexpr Parameter kShareClean[] = {{"SHARE", Takes::kOne, "", "the name of the share"}, kYes};
+constexpr Parameter kShareRemove[] = {kShareName, kYes, kWait};
+constexpr Parameter kShareClean[] = {kShareName, kYes};
 constexpr Parameter kOneShare = {"SHARE", Takes::kOptional, "", "only this share"};
 constexpr Parameter kMonitorShow[] = {kOneShare};
 constexpr Parameter kMonitorRefresh[] = {kOneShare, kWait};

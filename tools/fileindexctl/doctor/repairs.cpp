@@ -1,9 +1,9 @@
 // Mending what was found.
 #include "doctor/finding.h"
 #include "facts/config_lock.h"
+#include "report/schedule.h"
 
 #include <algorithm>
-#include <array>
 #include <cstdio>
 #include <ctime>
 #include <filesystem>
@@ -15,18 +15,9 @@ namespace fs = std::filesystem;
 
 namespace {
 
-std::string Stamp() {
-    const std::time_t now = std::time(nullptr);
-    std::tm local{};
-    localtime_r(&now, &local);
-    std::array<char, 32> text{};
-    std::strftime(text.data(), text.size(), "%Y%m%d-%H%M%S", &local);
-    return text.data();
-}
-
 // Never that of another file.
 std::string FreeName(const std::string &path) {
-    const std::string first = path + "." + Stamp();
+    const std::string first = path + "." + LocalTime(std::time(nullptr), "%Y%m%d-%H%M%S");
     std::string name = first;
     std::error_code error;
     for (int number = 2; fs::exists(fs::symlink_status(name, error)); ++number) {
