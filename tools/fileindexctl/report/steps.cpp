@@ -3,12 +3,11 @@
 #include "facts/platform_error.h"
 #include "facts/queue_files.h"
 #include "facts/registrations.h"
+#include "facts/system_services.h"
 #include "report/failure.h"
 #include "report/text.h"
 
 #include <fileindex/error.h>
-
-#include <sys/stat.h>
 
 #include <algorithm>
 #include <string_view>
@@ -50,14 +49,13 @@ std::string TroubleWithQueues(const std::set<std::string> &shares) {
 
 // The command that shows what a service that failed has said itself.
 std::string WhereToLook(const std::string &record, const std::string &cause) {
-    struct stat status {};
     const bool ran = record.find("VLIBService") != std::string::npos &&
                      record.find("err=[0x1500") == std::string::npos;  // there is no such service
     if (!ran || cause.find('"') != std::string::npos) {                // a command is named already
         return {};
     }
     const bool fileSharing = record.find("VLIBServiceRestart") != std::string::npos;  // nothing else is restarted
-    if (stat("/run/systemd/system", &status) == 0) {
+    if (RunsSystemd()) {
         return std::string("; see: journalctl -n 20 -u ") + (fileSharing ? "'smb*'" : "fileindexd");
     }
     return std::string("; see: service ") + (fileSharing ? "smbd" : "fileindexd") + " status";
