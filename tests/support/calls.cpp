@@ -3,11 +3,11 @@
 
 #include <vork/share.h>
 
-#include <algorithm>
 #include <array>
 #include <filesystem>
 #include <functional>
 #include <map>
+#include <set>
 #include <string>
 #include <type_traits>
 #include <vector>
@@ -22,7 +22,11 @@ std::string YesNo(bool yes) {
     return yes ? "yes" : "no";
 }
 
-/// A function of one argument that says yes or no.
+/// A function that says yes or no.
+Function Asks(bool (*function)()) {
+    return [function](Text) { return YesNo(function()); };
+}
+
 template <typename Result, typename Parameter>
 Function Asks(Result (*function)(Parameter)) {
     return [function](Text argument) {
@@ -36,13 +40,25 @@ Function Asks(Result (*function)(Parameter)) {
     };
 }
 
-/// One question, asked in each way that there is.
+template <typename Second>
+Function Asks(bool (*function)(Text, Second)) {
+    return [function](Text argument) {
+        const Json::Value arguments = Parse(argument);
+        return YesNo(function(arguments[0].asString(), arguments[1].as<std::decay_t<Second>>()));
+    };
+}
+
+/// One question, asked in each way that there is: with the same answer, code and records.
 template <typename... Questions>
 Function Agree(Questions... questions) {
     return [=](Text argument) {
-        const std::vector<std::string> answers = {questions(argument)...};
-        const bool agree = std::equal(answers.begin() + 1, answers.end(), answers.begin());
-        return agree ? answers.front() : "the ways to ask disagree";
+        std::set<std::string> answers;
+        for (const Function &question : {Function(questions)...}) {
+            const std::string answer = question(argument);
+            const std::string left = Left();
+            answers.insert(answer + (left.empty() ? "" : "; ") + left);
+        }
+        return answers.size() == 1 ? *answers.begin() : "the ways to ask disagree";
     };
 }
 
@@ -55,15 +71,6 @@ std::vector<Folder> Listed() {
 /// The question for those who have the folders at hand.
 Function AsksOfList(bool (*function)(Text, const std::vector<Folder> &)) {
     return [function](Text argument) { return YesNo(function(argument, Listed())); };
-}
-
-/// A function of two arguments.
-template <typename Second>
-Function AsksOfTwo(bool (*function)(Text, Second)) {
-    return [function](Text argument) {
-        const Json::Value arguments = Parse(argument);
-        return YesNo(function(arguments[0].asString(), arguments[1].as<std::decay_t<Second>>()));
-    };
 }
 
 /// What a function fills in, and nothing when it fails.
@@ -86,10 +93,12 @@ Function LocationFrom(int (*get)(const char *, char *, int)) {
 
 /// The report of a change of the stored folders.
 template <typename Change>
-std::string Stored(const Change &change) {
-    Folders store;
-    Json::Value report = "done";
-    return store.Load() && change(store, report) && store.Save() ? Print(report) : "no";
+Function Stores(const Change &change) {
+    return [=](Text argument) {
+        Folders store;
+        Json::Value report = "done";
+        return store.Load() && change(store, report, argument) && store.Save() ? Print(report) : "no";
+    };
 }
 
 /// What is read of a status.conf of this text.
@@ -102,10 +111,19 @@ std::string DocumentOf(Text text) {
     return loaded ? status.Text() : "no";
 }
 
-std::string PauseInfo(Text /*unused*/) {
+/// Calls below that are asked after a change of a file take its text as their argument; none leaves it as it is.
+void GivenText(const char *file, Text text) {
+    if (!text.empty()) {
+        WriteFile(file, text);
+    }
+}
+
+std::string PauseInfo(Text text) {
+    GivenText(kStatusConf, text);
     long long resumeTime = 5;
     const bool told = StatusMgr::GetPauseInfo(resumeTime);
-    return (told ? "" : "no ") + std::to_string(resumeTime);
+    EXPECT_TRUE(told || resumeTime == 5);
+    return told ? std::to_string(resumeTime) : "no";
 }
 
 std::string Governor(Text path) {
@@ -182,17 +200,50 @@ std::string MemberOf(Text object) {
     const bool isFlag = RetrieveBoolFromJsonObj(flags[0], "key", Parse(object));
     EXPECT_EQ(isFlag, RetrieveBoolFromJsonObj(flags[1], "key", Parse(object)));
     EXPECT_EQ(isFlag, flags[0] == flags[1]);
-    return isText ? "text " + text : text + (isFlag ? ", flag " + YesNo(flags[0]) : "");
+    EXPECT_TRUE(isText || text == "before");
+    return isText ? "text " + text : isFlag ? "flag " + YesNo(flags[0]) : "neither";
 }
 
-std::string FlagsOfA(Text /*unused*/) {
+std::string FlagsOfA(Text text) {
+    GivenText(kStatusConf, text);
     return "no space " + YesNo(StatusMgr::ShareIsNoSpace("a")) + ", reindex " +
            YesNo(StatusMgr::ShareIsNeedReindex("a")) + ", updated " + YesNo(StatusMgr::IsUpdated("a"));
+}
+
+/// Of everything, and of the folder /photo/a.
+std::string Statuses(Text text) {
+    GivenText(kStatusConf, text);
+    std::string status = "no";
+    StatusMgr::GetStatus(status);
+    return status + ", " + StatusMgr::GetFolderStatus("/photo/a");
+}
+
+std::string StatusWithQueue(Text line) {
+    GivenQueue(line + "\n");
+    Script::Current().ClearJournal();
+    return StatusMgr::GetFolderStatus("/photo/a");
+}
+
+std::string AddToQueue(Text line) {
+    GivenQueue(line + "\n");
+    Script::Current().ClearJournal();
+    return YesNo(AddCustomEvent(1, "/vol1/photo/a", Json::Value()));
+}
+
+std::string SavedFolders(Text text) {
+    GivenText(kFolderConf, text);
+    Folders store;
+    return YesNo(store.Load() && store.Save());
+}
+
+std::string Paused(Text hours) {
+    return YesNo(StatusMgr::Pause(std::stoi(hours)));
 }
 
 const std::map<std::string, Function> kFunctions = {
     {"Add", Asks(IndexMgr::Add)},
     {"AddCustomEvent", [](Text path) { return YesNo(AddCustomEvent(1, path, Json::Value())); }},
+    {"AddToQueue", AddToQueue},
     {"Additional", Additional},
     {"CanFullPathBeIndexed", Asks(CanFullPathBeIndexed)},
     {"CanPathBeIndexed", Asks(CanPathBeIndexed)},
@@ -206,14 +257,11 @@ const std::map<std::string, Function> kFunctions = {
     {"FILEIDXQueuePathGet", LocationFrom(FILEIDXQueuePathGet)},
     {"FlagsOfA", FlagsOfA},
     {"Folder::Load", LoadedFolder},
-    {"Folders::Delete",
-     [](Text path) { return Stored([&](auto &store, auto &report) { return store.Delete(report, path); }); }},
+    {"Folders::Delete", Stores([](auto &store, auto &report, Text path) { return store.Delete(report, path); })},
     {"Folders::List", PathsOfShare},
-    {"Folders::Save", [](Text) { return Stored([](auto &, auto &) { return true; }); }},
+    {"Folders::Save", SavedFolders},
     {"Folders::Upsert",
-     [](Text folder) {
-         return Stored([&](auto &store, auto &report) { return store.Upsert(report, Parse(folder)); });
-     }},
+     Stores([](auto &store, auto &report, Text folder) { return store.Upsert(report, Parse(folder)); })},
     {"Get", Fills<Json::Value>(IndexMgr::Get)},
     {"GetFolderStatus", StatusMgr::GetFolderStatus},
     {"GetFullPath", Fills<std::string>(GetFullPath)},
@@ -236,25 +284,27 @@ const std::map<std::string, Function> kFunctions = {
     {"IsSystemPreservedFileName", Asks(IsSystemPreservedFileName)},
     {"List", Page},
     {"MemberOf", MemberOf},
-    {"NotifyNoSpace", [](Text) { return YesNo(NotifyNoSpace()); }},
-    {"Pause", [](Text hours) { return YesNo(StatusMgr::Pause(std::stoi(hours))); }},
+    {"NotifyNoSpace", Asks(NotifyNoSpace)},
+    {"Pause", Paused},
     {"Reindex", Asks(IndexMgr::Reindex)},
     {"ReplaceShareName", [](Text path) { return ReplaceShareName(path, "new"); }},
-    {"Resume", [](Text) { return YesNo(StatusMgr::Resume()); }},
+    {"Resume", Asks(StatusMgr::Resume)},
     {"SendCammandToDaemon", [](Text command) { return YesNo(SendCammandToDaemon(command, Json::Value())); }},
     {"Set", Asks(IndexMgr::Set)},
     {"SetUpdated", Asks(StatusMgr::SetUpdated)},
     {"ShareIsNoSpace", Asks(StatusMgr::ShareIsNoSpace)},
     {"SharePause", Asks(IndexMgr::SharePause)},
     {"ShareRemove", Asks(IndexMgr::ShareRemove)},
-    {"ShareRename", AsksOfTwo(IndexMgr::ShareRename)},
+    {"ShareRename", Asks(IndexMgr::ShareRename)},
     {"ShareResume", Asks(IndexMgr::ShareResume)},
     {"ShareRevive", Asks(StatusMgr::ShareRevive)},
-    {"ShareSetNeedReindex", AsksOfTwo(StatusMgr::ShareSetNeedReindex)},
-    {"ShareSetNoSpace", AsksOfTwo(StatusMgr::ShareSetNoSpace)},
-    {"StringStartWith", AsksOfTwo(StringStartWith)},
+    {"ShareSetNeedReindex", Asks(StatusMgr::ShareSetNeedReindex)},
+    {"ShareSetNoSpace", Asks(StatusMgr::ShareSetNoSpace)},
+    {"StatusWithQueue", StatusWithQueue},
+    {"Statuses", Statuses},
+    {"StringStartWith", Asks(StringStartWith)},
     {"Update", [](Text path) { return YesNo(IndexMgr::Update(path, "anything")); }},
-    {"Updater_zol60_beta2", [](Text) { return YesNo(Updater_zol60_beta2()); }},
+    {"Updater_zol60_beta2", Asks(Updater_zol60_beta2)},
     {"Upsert", Asks(IndexMgr::Upsert)},
     {"UpsertVorkNotifydCfg", Asks(IndexMgr::UpsertVorkNotifydCfg)},
 };
@@ -264,6 +314,14 @@ const std::map<std::string, Function> kFunctions = {
 std::string Ask(const std::string &call) {
     const auto [name, argument] = Split(call);
     return kFunctions.at(name)(Decoded(argument));
+}
+
+std::set<std::string> FunctionNames() {
+    std::set<std::string> names;
+    for (const auto &[name, function] : kFunctions) {
+        names.insert(name);
+    }
+    return names;
 }
 
 }  // namespace fileindex_test

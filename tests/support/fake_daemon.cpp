@@ -15,16 +15,7 @@
 namespace fileindex_test {
 namespace {
 
-std::string ReadToEnd(int fd) {
-    std::string all;
-    std::array<char, 4096> buffer{};
-    for (ssize_t got = 0; (got = ::read(fd, buffer.data(), buffer.size())) > 0;) {
-        all.append(buffer.data(), static_cast<size_t>(got));
-    }
-    return all;
-}
-
-std::string Decode(const std::string &frame) {
+std::string TextOf(const std::string &frame) {
     std::uint32_t length = 0;
     std::memcpy(&length, frame.data(), std::min(frame.size(), sizeof length));
     const bool isWhole = length > 0 && frame.size() == sizeof length + length &&
@@ -58,8 +49,13 @@ void FakeDaemon::Closed(int fd) {
         return;
     }
     const int end = listening->far_ends_.extract(fd).mapped();
-    listening->frames_.push_back(ReadToEnd(end));
-    Script::Current().Record("command " + Decode(listening->frames_.back()));
+    std::string frame;
+    std::array<char, 4096> buffer{};
+    for (ssize_t got = 0; (got = ::read(end, buffer.data(), buffer.size())) > 0;) {
+        frame.append(buffer.data(), static_cast<size_t>(got));
+    }
+    listening->frames_.push_back(frame);
+    Script::Current().Record("command " + TextOf(frame));
     ::close(end);
 }
 

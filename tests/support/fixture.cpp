@@ -16,6 +16,7 @@
 #include <fstream>
 #include <functional>
 #include <iostream>
+#include <iterator>
 #include <map>
 #include <memory>
 #include <sstream>
@@ -23,14 +24,6 @@
 namespace fs = std::filesystem;
 
 namespace fileindex_test {
-namespace {
-
-/// The library's places are fixed: only where they are the test's own may it empty them.
-bool InPrivateNamespace() {
-    return ReadFile("/proc/self/mountinfo").find("fileindex-private") != std::string::npos;
-}
-
-}  // namespace
 
 Json::Value Parse(const std::string &text) {
     Json::CharReaderBuilder builder;
@@ -66,14 +59,34 @@ std::string Decoded(const std::string &text) {
     return text.starts_with('"') ? Parse(text).asString() : text;
 }
 
+std::string Times(size_t count, const std::string &text) {
+    std::string all;
+    while (count-- > 0) {
+        all += text;
+    }
+    return all;
+}
+
 std::string ReadFile(const std::string &path) {
     std::ifstream file(path, std::ios::binary);
-    if (!file) {
-        return "(missing)";
-    }
-    std::ostringstream text;
-    text << file.rdbuf();
-    return text.str();
+    return file ? std::string(std::istreambuf_iterator<char>(file), {}) : "(missing)";
+}
+
+void WriteFile(const std::string &path, const std::string &text) {
+    std::ofstream file(path, std::ios::binary | std::ios::trunc);
+    file << text;
+    ASSERT_TRUE(file.flush()) << path;
+}
+
+void GivenQueue(const std::string &text, const std::string &suffix) {
+    fs::create_directories(fs::path(kQueue).parent_path());
+    WriteFile(kQueue + suffix, text);
+}
+
+struct stat StatusOf(const std::string &path) {
+    struct stat status = {};
+    EXPECT_EQ(0, ::stat(path.c_str(), &status)) << path;
+    return status;
 }
 
 std::string TestPath(const std::string &name) {
@@ -88,25 +101,45 @@ void ExpectContent(const std::string &path, const std::string &found) {
     EXPECT_EQ(ReadFile(path), found);
 }
 
-void WriteFile(const std::string &path, const std::string &text) {
-    std::ofstream file(path, std::ios::binary | std::ios::trunc);
-    file << text;
-    ASSERT_TRUE(file.flush()) << path;
-}
-
-struct stat StatusOf(const std::string &path) {
-    struct stat status = {};
-    EXPECT_EQ(0, ::stat(path.c_str(), &status)) << path;
-    return status;
+std::string Left() {
+    const char *const codes[] = {
+        "",          "BAD_PARAM",        "PATH", "RESERVED", "NO_SUCH_FOLDER", "EXCEED_MAX_FOLDER", "LOAD_JSON",
+        "SAVE_JSON", "MALFORMED_CONFIG", "LOCK"};
+    const std::set<std::string> numbered = {"status.cpp", "utils.cpp", "status_mgr.cpp", "index_mgr.cpp"};
+    const std::set<std::string> unnumbered = {"config.cpp", "folder.cpp", "folders.cpp"};
+    std::string left = codes[ErrorHandler::GetError()];
+    std::vector<std::string> records;
+    for (const LogRecord &record : SyslogCapture::Records()) {
+        EXPECT_EQ(LOG_ERR, record.priority) << record.message;
+        EXPECT_TRUE(numbered.contains(record.file) || unnumbered.contains(record.file)) << record.message;
+        EXPECT_GT(record.line, 0) << record.message;
+        const std::string line = numbered.contains(record.file) ? ":" + std::to_string(record.line) : "";
+        records.push_back(record.file + line + " " + record.message);
+    }
+    for (auto record = records.begin(); record != records.end();) {
+        const auto other = std::find_if(record, records.end(), [&](const auto &next) { return next != *record; });
+        const std::string times = other - record > 1 ? std::to_string(other - record) + " times " : "";
+        left += (left.empty() ? "" : "; ") + times + *record;
+        record = other;
+    }
+    SyslogCapture::Clear();
+    ErrorHandler::SetError(FILEINDEX_ERR_NONE);
+    return left;
 }
 
 void FileIndexTest::SetUp() {
-    ASSERT_TRUE(InPrivateNamespace()) << "to be run by scripts/in-private-namespace";
-    fs::remove_all(kConfigDir);
-    fs::create_directories(kConfigDir);
-    fs::remove(kFolderLock);
-    fs::remove(kStatusLock);
+    // The library's places are fixed: only where they are the test's own may it empty them.
+    ASSERT_NE(ReadFile("/proc/self/mountinfo").find("fileindex-private"), std::string::npos)
+        << "to be run by scripts/in-private-namespace";
+    for (const char *place : {kConfigDir, kFolderLock, kStatusLock, "/vol1/photo", "/vol2/music"}) {
+        fs::remove_all(place);
+    }
+    for (const char *directory : {kConfigDir, "/vol1/photo/a", "/vol2/music"}) {
+        fs::create_directories(directory);
+    }
     Platform::Current() = Platform();
+    Platform::Current().shares["photo"].path = "/vol1/photo";
+    Platform::Current().shares["music"].path = "/vol2/music";
     Script::Current().Reset();
     Forget();
     LOG_LEVEL = 3;
@@ -115,9 +148,6 @@ void FileIndexTest::SetUp() {
 }
 
 void FileIndexTest::TearDown() {
-    for (const std::string &directory : directories_) {
-        fs::remove_all(directory);
-    }
     EXPECT_THAT(Script::Current().Finish(), IsEmpty()) << "failures that were scripted and never took place";
     daemon_.Stop();
     EXPECT_EQ(descriptors_, OpenDescriptors());
@@ -127,8 +157,7 @@ void FileIndexTest::TearDown() {
 }
 
 void FileIndexTest::Given(const std::string &line) {
-    const std::string what = Split(line).first;
-    const std::string text = Split(line).second;
+    const auto [what, text] = Split(line);
     if (what.ends_with(".conf")) {
         WriteFile(std::string(kConfigDir) + "/" + what, text);
         return;
@@ -137,45 +166,36 @@ void FileIndexTest::Given(const std::string &line) {
         GivenQueue(text.empty() ? "" : Decoded(text) + "\n", what.substr(5));
         return;
     }
-    const std::string first = Split(text).first;
-    const std::string second = Split(text).second;
+    const auto [first, second] = Split(text);
     Platform &platform = Platform::Current();
+    const auto share = [&platform, name = first]() -> FakeShare & { return platform.shares[Decoded(name)]; };
+    std::istringstream words(text);
+    const std::set<std::string> all{std::istream_iterator<std::string>(words), {}};
     const std::map<std::string, std::function<void()>> changes = {
         {"no", [&] { fs::remove_all(text.ends_with(".conf") ? kConfigDir + ("/" + text) : text); }},
         {"search", [&] { platform.searchOn = text == "on"; }},
-        {"gone", [&] { platform.shares.erase(text); }},
-        {"locked", [&] { platform.shares.at(text).encrypted = true; }},
-        {"encrypted", [&] { platform.shares.at(text).encryptionKind = true; }},
-        {"read-only", [&] { platform.shares.at(text).readOnly = true; }},
-        {"share", [&] { platform.shares[Decoded(first)].path = second; }},
-        {"directory", [&] { fs::create_directories(text); }},
+        {"share", [&] { share().path = second; }},
+        {"locked", [&] { share().encrypted = true; }},
+        {"encrypted", [&] { share().encryptionKind = true; }},
+        {"read-only", [&] { share().readOnly = true; }},
+        {"directory",
+         [&] { std::for_each(all.begin(), all.end(), [](auto &path) { fs::create_directories(path); }); }},
         {"link", [&] { fs::create_symlink(second, first); }},
         {"type", [&] { platform.fsTypes[first] = std::stoi(second); }},
-        {"recycle-bin", [&] { platform.recycleBins.insert(text); }},
-        {"snapshot", [&] { platform.snapshots.insert(text); }},
-        {"mounted", [&] { platform.mountPoints.insert(text); }},
+        {"recycle-bin", [&] { platform.recycleBins = all; }},
+        {"snapshot", [&] { platform.snapshots = all; }},
+        {"mounted", [&] { platform.mountPoints = all; }},
+        {"gone", [&] { platform.shares.erase(text); }},
         {"result",
          [&] {
              Fault fault;
-             std::istringstream words(text);
-             words >> fault.call >> fault.result >> std::hex >> fault.error >> std::ws;
-             std::getline(words, fault.about);
+             std::istringstream parts(text);
+             parts >> fault.call >> fault.result >> std::hex >> fault.error >> std::ws;
+             std::getline(parts, fault.about);
              Fail(fault);
          }},
     };
     changes.at(what)();
-}
-
-void FileIndexTest::GivenShare(const std::string &name, const std::string &path) {
-    const std::string directory = path.empty() ? "/vol1/" + name : path;
-    fs::create_directories(directory);
-    directories_.push_back(directory);
-    Platform::Current().shares[name].path = directory;
-}
-
-void FileIndexTest::GivenQueue(const std::string &text, const std::string &suffix) {
-    fs::create_directories(fs::path(kQueue).parent_path());
-    WriteFile(kQueue + suffix, text);
 }
 
 std::vector<std::string> FileIndexTest::Queue() {
@@ -187,31 +207,14 @@ std::vector<std::string> FileIndexTest::Queue() {
     return lines;
 }
 
-std::string FileIndexTest::Left() {
-    const std::set<std::string> numbered = {"status.cpp", "utils.cpp", "status_mgr.cpp", "index_mgr.cpp"};
-    const std::set<std::string> unnumbered = {"config.cpp", "folder.cpp", "folders.cpp"};
-    std::string records;
-    for (const LogRecord &record : SyslogCapture::Records()) {
-        EXPECT_EQ(LOG_ERR, record.priority) << record.message;
-        EXPECT_TRUE(numbered.contains(record.file) || unnumbered.contains(record.file)) << record.message;
-        EXPECT_GT(record.line, 0) << record.message;
-        records += records.empty() ? " " : " | ";
-        records += record.file + (numbered.contains(record.file) ? ":" + std::to_string(record.line) : "") + " " +
-                   record.message;
-    }
-    SyslogCapture::Clear();
-    const int code = ErrorHandler::GetError();
-    ErrorHandler::SetError(FILEINDEX_ERR_NONE);
-    return code == FILEINDEX_ERR_NONE && records.empty() ? "" : std::to_string(code) + records;
-}
-
 std::string FileIndexTest::AskAlone(const std::string &call) {
     const auto descriptors = OpenDescriptors();
     const std::string answer = Ask(call);
     const std::string left = Left();
     EXPECT_EQ(descriptors, OpenDescriptors()) << call;
     EXPECT_FALSE(IsLocked(kFolderLock) || IsLocked(kStatusLock)) << call;
-    return answer + (left.empty() ? "" : " " + left);
+    EXPECT_EQ(0, Platform::Current().shareRecords) << call;
+    return answer + (left.empty() ? "" : "; ") + left;
 }
 
 void FileIndexTest::Forget() {
@@ -222,9 +225,7 @@ void FileIndexTest::Forget() {
 bool FileIndexTest::IsLocked(const std::string &lockFile) {
     const long fd = ::syscall(SYS_openat, AT_FDCWD, lockFile.c_str(), O_RDWR | O_CLOEXEC);
     const bool locked = fd >= 0 && ::syscall(SYS_flock, fd, LOCK_EX | LOCK_NB) != 0;
-    if (fd >= 0) {
-        ::syscall(SYS_close, fd);
-    }
+    ::syscall(SYS_close, fd);
     return locked;
 }
 

@@ -41,47 +41,51 @@ Platform &World() {
     return Platform::Current();
 }
 
+int Failed(int error) {
+    VLIBCErrSetEx(error, "platform.c", 77);
+    return -1;
+}
+
 /// The scripted result of a call if it is to fail, with the platform's error set as a real one would.
 std::optional<int> Failure(const char *call, const std::string &about = {}) {
     const auto fault = Script::Current().Take(call, about);
-    if (!fault) {
-        return std::nullopt;
+    if (fault && fault->result <= 0) {
+        Failed(fault->error);
     }
-    if (fault->result <= 0) {
-        VLIBCErrSetEx(fault->error, "platform.c", 77);
-    }
-    return static_cast<int>(fault->result);
+    return fault ? std::optional(static_cast<int>(fault->result)) : std::nullopt;
+}
+
+/// A question with one answer.
+int Answer(const char *call, const std::string &about, int answer) {
+    return Failure(call, about).value_or(answer);
 }
 
 /// A call that changes something: one line of the journal, unless it is to fail.
 int Effect(const char *call, const std::string &about, const std::string &line) {
-    if (const auto result = Failure(call, about)) {
-        return *result;
+    const auto result = Failure(call, about);
+    if (!result) {
+        Script::Current().Record(line);
     }
-    Script::Current().Record(line);
-    return 0;
+    return result.value_or(0);
+}
+
+/// A question that is answered in `out`.
+int Fill(const char *call, const std::string &about, int *out, bool answer) {
+    const auto result = Failure(call, about);
+    *out = result || answer ? 1 : 0;  // what a failed call leaves behind is not to be believed
+    return result.value_or(0);
 }
 
 bool StartsWithAny(const std::string &path, const std::set<std::string> &beginnings) {
     return std::any_of(beginnings.begin(), beginnings.end(), [&](auto &begin) { return path.starts_with(begin); });
 }
 
-std::string OneLine(const Json::Value &value) {
-    Json::StreamWriterBuilder builder;
-    builder["indentation"] = "";
-    return Json::writeString(builder, value);
-}
-
 struct ShareRecord : _tag_VORKSHARE {
     std::string name, path;
 };
 
-int ShareFlag(const _tag_VORKSHARE *share, const char *call, bool FakeShare::*flag, int *out) {
-    if (const auto result = Failure(call, share->szName)) {
-        return *result;
-    }
-    *out = World().shares.at(share->szName).*flag ? 1 : 0;
-    return 0;
+const FakeShare &Of(const _tag_VORKSHARE *share) {
+    return World().shares.at(share->szName);
 }
 
 }  // namespace
@@ -93,15 +97,12 @@ extern "C" {
 
 int VORKShareGet(const char *szName, _tag_VORKSHARE **ppShare) {
     if (const auto result = Failure("VORKShareGet", szName)) {
-        if (*result == 0) {
-            *ppShare = nullptr;
-        }
+        *ppShare = *result == 0 ? nullptr : *ppShare;
         return *result;
     }
     const auto found = World().shares.find(szName);
     if (found == World().shares.end()) {
-        VLIBCErrSetEx(VORK_ERR_NO_SUCH_SHARE, "platform.c", 77);
-        return -1;
+        return Failed(VORK_ERR_NO_SUCH_SHARE);
     }
     auto *record = new ShareRecord();
     record->name = found->first;
@@ -114,10 +115,8 @@ int VORKShareGet(const char *szName, _tag_VORKSHARE **ppShare) {
 }
 
 void VORKShareFree(_tag_VORKSHARE *pShare) {
-    if (pShare != nullptr) {
-        --World().shareRecords;
-        delete static_cast<ShareRecord *>(pShare);
-    }
+    World().shareRecords -= pShare != nullptr ? 1 : 0;
+    delete static_cast<ShareRecord *>(pShare);
 }
 
 int VORKShareNamePathGet(const char *szFullPath, char *szName, int cbName, char *szPath, int cbPath) {
@@ -131,65 +130,51 @@ int VORKShareNamePathGet(const char *szFullPath, char *szName, int cbName, char 
             return 0;
         }
     }
-    VLIBCErrSetEx(VORK_ERR_NO_SUCH_SHARE, "platform.c", 77);
-    return -1;
+    return Failed(VORK_ERR_NO_SUCH_SHARE);
 }
 
 int VORKShareIsShareRecycle(const char *szFullPath) {
-    return Failure("VORKShareIsShareRecycle", szFullPath)
-        .value_or(StartsWithAny(szFullPath, World().recycleBins) ? 2 : 0);
+    return Answer("VORKShareIsShareRecycle", szFullPath, StartsWithAny(szFullPath, World().recycleBins) ? 2 : 0);
 }
 
 int VLIBShareIsEncryptedGet(const _tag_VORKSHARE *pShare, int *pEncrypted) {
-    return ShareFlag(pShare, "VLIBShareIsEncryptedGet", &FakeShare::encrypted, pEncrypted);
+    return Fill("VLIBShareIsEncryptedGet", pShare->szName, pEncrypted, Of(pShare).encrypted);
 }
 
 int VLIBShareIsEncryptionGet(const _tag_VORKSHARE *pShare, int *pEncryption) {
-    return ShareFlag(pShare, "VLIBShareIsEncryptionGet", &FakeShare::encryptionKind, pEncryption);
+    return Fill("VLIBShareIsEncryptionGet", pShare->szName, pEncryption, Of(pShare).encryptionKind);
 }
 
 int VLIBShareIsReadOnlyGet(const _tag_VORKSHARE *pShare, int *pReadOnly) {
-    return ShareFlag(pShare, "VLIBShareIsReadOnlyGet", &FakeShare::readOnly, pReadOnly);
+    return Fill("VLIBShareIsReadOnlyGet", pShare->szName, pReadOnly, Of(pShare).readOnly);
 }
 
 int VORKGetFSType(const char *szPath, int flags) {
-    if (flags != 0) {
-        throw std::logic_error("VORKGetFSType: flags");
-    }
-    if (const auto result = Failure("VORKGetFSType", szPath)) {
-        return *result;
-    }
-    for (const auto &[beginning, type] : World().fsTypes) {
-        if (std::string(szPath).starts_with(beginning)) {
-            return type;
-        }
-    }
-    return kPlainFs;
+    const auto &types = World().fsTypes;
+    const auto found = std::find_if(types.begin(), types.end(), [&](const auto &entry) {
+        return std::string(szPath).starts_with(entry.first);
+    });
+    return Answer("VORKGetFSType", szPath, flags != 0 ? -2 : found == types.end() ? kPlainFs : found->second);
 }
 
 int VORKFSIsRemoteFS(int type) {
-    return Failure("VORKFSIsRemoteFS").value_or(type == kRemoteFs ? 1 : 0);
+    return Answer("VORKFSIsRemoteFS", {}, type == kRemoteFs ? 1 : 0);
 }
 
 int VORKFSIsImageFS(int type) {
-    return Failure("VORKFSIsImageFS").value_or(type == kImageFs ? 1 : 0);
+    return Answer("VORKFSIsImageFS", {}, type == kImageFs ? 1 : 0);
 }
 
 int VORKFSDirIsMntPoint(const char *szPath) {
-    return Failure("VORKFSDirIsMntPoint", szPath).value_or(World().mountPoints.contains(szPath) ? 1 : 0);
+    return Answer("VORKFSDirIsMntPoint", szPath, World().mountPoints.contains(szPath) ? 1 : 0);
 }
 
 int VLIBFhsPathInSnapshot(const char *szPath, int *pInSnapshot) {
-    if (const auto result = Failure("VLIBFhsPathInSnapshot", szPath)) {
-        *pInSnapshot = 1;  // what a failed call leaves behind is not to be believed
-        return *result;
-    }
-    *pInSnapshot = StartsWithAny(szPath, World().snapshots) ? 1 : 0;
-    return 0;
+    return Fill("VLIBFhsPathInSnapshot", szPath, pInSnapshot, StartsWithAny(szPath, World().snapshots));
 }
 
 int VORKEAIsHiddenDir(const char *szName) {
-    return Failure("VORKEAIsHiddenDir", szName).value_or(std::string(szName) == "@eaDir" ? 1 : 0);
+    return Answer("VORKEAIsHiddenDir", szName, std::string(szName) == "@eaDir" ? 1 : 0);
 }
 
 int VORKEAMKDir(int flags, const char *szPath) {
@@ -200,9 +185,8 @@ int VORKEAMKDir(int flags, const char *szPath) {
 }
 
 int VORKQuotaIsEnough(unsigned int uid, const char *szPath, unsigned long long cbRequired) {
-    const std::string question =
-        std::to_string(uid) + " " + std::string(szPath) + " " + std::to_string(cbRequired);
-    return Failure("VORKQuotaIsEnough", question).value_or(1);
+    const std::string path = szPath;
+    return Answer("VORKQuotaIsEnough", std::to_string(uid) + " " + path + " " + std::to_string(cbRequired), 1);
 }
 
 int VLIBServiceStart(const char *szName, int flag) {
@@ -218,14 +202,12 @@ int VLIBServiceRestart(const char *szName) {
 }
 
 int VORKSMBIsEnableSpotlight(void) {
-    return Failure("VORKSMBIsEnableSpotlight").value_or(World().searchOn ? 5 : 0);
+    return Answer("VORKSMBIsEnableSpotlight", {}, World().searchOn ? 5 : 0);
 }
 
 int VORKSMBSetSpotlight(int enable) {
     const int result = Effect("VORKSMBSetSpotlight", {}, "search " + std::to_string(enable));
-    if (result >= 0) {
-        World().searchOn = enable != 0;
-    }
+    World().searchOn = result < 0 ? World().searchOn : enable != 0;
     return result;
 }
 
@@ -254,15 +236,16 @@ int VLIBCExec(const char *szProgram, const char *arg1, const char *arg2, const c
         line += argument != nullptr ? " " + std::string(argument) : "";
     }
     const int result = Effect("VLIBCExec", line, line);
+    const std::filesystem::path path = arg2;
+    const std::set<std::string> removable = {"VORK@file_index_queue", "VORK@file_index_queue.tmp",
+                                             "VORK@.fileindexdb"};
+    if (line != "exec /bin/rm -rf " + path.string() || !removable.contains(path.filename())) {
+        std::fprintf(stderr, "not to be run: %s\n", line.c_str());
+        std::abort();
+    }
     if (result == 0) {
-        const std::string path = arg2;
-        const auto is = [&](const char *end) { return path.ends_with(std::string("/@eaDir/VORK@") + end); };
-        if (line != "exec /bin/rm -rf " + path ||
-            !(is("file_index_queue") || is("file_index_queue.tmp") || is(".fileindexdb"))) {
-            std::fprintf(stderr, "not to be run: %s\n", line.c_str());
-            std::abort();
-        }
-        std::filesystem::remove_all(path);
+        std::error_code ignored;
+        std::filesystem::remove_all(path, ignored);
     }
     return result;
 }
@@ -297,18 +280,14 @@ MonitorQueue::~MonitorQueue() {
 }
 
 bool MonitorQueue::Upsert(const MonitorQueue &queue, const std::string &name, _tag_monitor_queue_type_ type) {
-    const std::string text = OneLine(queue.description_->json);
-    if (const auto result = Failure("MonitorQueue::Upsert", text)) {
-        if (*result == -2) {
-            throw std::runtime_error("notification daemon");
-        }
-        return false;
-    }
+    Json::StreamWriterBuilder builder;
+    builder["indentation"] = "";
+    const std::string text = Json::writeString(builder, queue.description_->json);
     Json::Value reread;
     std::istringstream(text) >> reread;
     const char *const note = reread == queue.description_->json ? "" : " of other types than the text's";
-    Script::Current().Record("monitor " + name + " " + std::to_string(type) + " " + text + note);
-    return true;
+    return Effect("MonitorQueue::Upsert", text,
+                  "monitor " + name + " " + std::to_string(type) + " " + text + note) == 0;
 }
 
 bool MonitorQueue::Delete(const std::string &queuePath, const std::string &name, _tag_monitor_queue_type_ type) {

@@ -17,12 +17,7 @@ namespace {
 struct Log {
     std::mutex mutex;
     std::vector<LogRecord> records;
-};
-
-Log &TheLog() {
-    static Log log;
-    return log;
-}
+} &log = *new Log;  // for ever: what runs at the end of a process writes records too
 
 void Keep(int priority, const char *format, va_list arguments) {
     const int error = errno;  // what %m stands for
@@ -36,21 +31,21 @@ void Keep(int priority, const char *format, va_list arguments) {
         record.line = std::stoi(record.message.substr(colon + 1));
         record.message.erase(0, record.message.find(' ', colon) + 1);
     }
-    const std::lock_guard guard(TheLog().mutex);
-    TheLog().records.push_back(record);
+    const std::lock_guard guard(log.mutex);
+    log.records.push_back(record);
     errno = error;
 }
 
 }  // namespace
 
 std::vector<LogRecord> SyslogCapture::Records() {
-    const std::lock_guard guard(TheLog().mutex);
-    return TheLog().records;
+    const std::lock_guard guard(log.mutex);
+    return log.records;
 }
 
 void SyslogCapture::Clear() {
-    const std::lock_guard guard(TheLog().mutex);
-    TheLog().records.clear();
+    const std::lock_guard guard(log.mutex);
+    log.records.clear();
 }
 
 }  // namespace fileindex_test

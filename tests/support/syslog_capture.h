@@ -14,6 +14,7 @@ struct LogRecord {
     std::string message;  ///< what follows
 };
 
+/// For any number of threads.
 class SyslogCapture {
 public:
     static std::vector<LogRecord> Records();

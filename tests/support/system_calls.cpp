@@ -10,6 +10,7 @@
 #include <sys/file.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -18,6 +19,7 @@
 #include <cstdarg>
 #include <cstdlib>
 #include <ctime>
+#include <fstream>
 #include <new>
 #include <string>
 
@@ -38,6 +40,10 @@ std::string PathOf(int fd) {
     const std::string link = "/proc/self/fd/" + std::to_string(fd);
     const ssize_t length = ::readlink(link.c_str(), target.data(), target.size());
     return length < 0 ? "" : std::string(target.data(), static_cast<size_t>(length));
+}
+
+std::string Below(int directory, const char *name) {
+    return PathOf(directory) + "/" + name;
 }
 
 /// Counts the call and fails it if the test says so; else the C library's function is called.
@@ -71,9 +77,11 @@ void RecordLock(const std::string &path, int operation) {
         return;
     }
     const std::string name = path.substr(prefix.size(), path.rfind('.') - prefix.size());
-    const bool exclusive = (operation & LOCK_EX) != 0;
-    Script::Current().Record((operation & LOCK_UN) != 0 ? "unlock " + name
-                                                        : "lock " + name + (exclusive ? " exclusive" : " shared"));
+    if ((operation & LOCK_UN) != 0) {
+        Script::Current().locks.erase(name);
+    } else {
+        Script::Current().locks.insert((operation & LOCK_EX) != 0 ? name : name + " shared");
+    }
 }
 
 /// `position`: the offset, for pwrite.
@@ -108,15 +116,39 @@ int Flush(const char *name, int fd) {
     return result;
 }
 
+mode_t ModeIn(int flags, va_list arguments) {
+    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): the callers have started it
+    return (flags & (O_CREAT | O_TMPFILE)) != 0 ? va_arg(arguments, mode_t) : 0;
+}
+
 }  // namespace
 
 extern "C" {
 
+// The name has to be the C library's, which no function can give: one row for each that is only counted, with what
+// it is about and its arguments.
+#define COUNTED(result, name, parameters, about, ...)   \
+    result name parameters {                            \
+        return Call<result>(#name, about, __VA_ARGS__); \
+    }
+COUNTED(ssize_t, pread, (int fd, void *to, size_t size, off_t at), PathOf(fd), fd, to, size, at)
+COUNTED(int, lstat, (const char *path, struct stat *out) noexcept, path, path, out)
+COUNTED(int, fchmod, (int fd, mode_t mode) noexcept, PathOf(fd), fd, mode)
+COUNTED(int, linkat, (int a, const char *from, int b, const char *to, int flags) noexcept, to, a, from, b, to,
+        flags)
+COUNTED(int, mkdirat, (int at, const char *name, mode_t mode) noexcept, Below(at, name), at, name, mode)
+COUNTED(int, fstatat, (int at, const char *name, struct stat *out, int flags) noexcept, Below(at, name), at, name,
+        out, flags)
+COUNTED(int, socket, (int domain, int type, int protocol) noexcept, "", domain, type, protocol)
+COUNTED(int, setsockopt, (int fd, int level, int option, const void *value, socklen_t size) noexcept,
+        std::to_string(option), fd, level, option, value, size)
+COUNTED(int, usleep, (useconds_t time), std::to_string(time), time)
+#undef COUNTED
+
 int open(const char *path, int flags, ...) {
     va_list arguments;
     va_start(arguments, flags);
-    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): started just above
-    const mode_t mode = (flags & (O_CREAT | O_TMPFILE)) != 0 ? va_arg(arguments, mode_t) : 0;
+    const mode_t mode = ModeIn(flags, arguments);
     va_end(arguments);
     return Call<int>("open", path, path, flags, mode);
 }
@@ -124,18 +156,19 @@ int open(const char *path, int flags, ...) {
 int openat(int directory, const char *name, int flags, ...) {
     va_list arguments;
     va_start(arguments, flags);
-    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): started just above
-    const mode_t mode = (flags & (O_CREAT | O_TMPFILE)) != 0 ? va_arg(arguments, mode_t) : 0;
+    const mode_t mode = ModeIn(flags, arguments);
     va_end(arguments);
     if (directory == AT_FDCWD) {  // not the library's: the C++ library removes directories with it
         return CallNext<int>("openat", directory, name, flags, mode);
     }
-    return Call<int>("openat", PathOf(directory) + "/" + name, directory, name, flags, mode);
+    return Call<int>("openat", Below(directory, name), directory, name, flags, mode);
 }
 
 /// A close that fails has closed all the same.
 int close(int fd) {
-    const auto fault = Script::Current().Take("close", PathOf(fd));
+    const std::string path = PathOf(fd);
+    const auto fault = Script::Current().Take("close", path);
+    RecordLock(path, LOCK_UN);
     const int result = CallNext<int>("close", fd);
     fileindex_test::FakeDaemon::Closed(fd);
     if (fault) {
@@ -143,10 +176,6 @@ int close(int fd) {
         return -1;
     }
     return result;
-}
-
-ssize_t pread(int fd, void *data, size_t size, off_t offset) {
-    return Call<ssize_t>("pread", PathOf(fd), fd, data, size, offset);
 }
 
 ssize_t write(int fd, const void *data, size_t size) {
@@ -161,40 +190,25 @@ int flock(int fd, int operation) noexcept {
     const std::string path = PathOf(fd);
     const int result = Call<int>("flock", path, fd, operation);
     const int error = errno;
-    if (result == 0 || (operation & LOCK_UN) != 0) {  // what closes the file unlocks it all the same
+    if (result == 0) {
         RecordLock(path, operation);
     }
     errno = error;
     return result;
 }
 
-int lstat(const char *path, struct stat *buffer) noexcept {
-    return Call<int>("lstat", path, path, buffer);
-}
-
+/// A save ends so.
 int chmod(const char *path, mode_t mode) noexcept {
     const int result = Call<int>("chmod", path, path, mode);
-    const std::string_view name(path);
+    const std::string name(path);
     if (result == 0 && name.ends_with(".conf")) {
-        Script::Current().Record("saved " + std::string(name.substr(name.rfind('/') + 1)));  // a save ends so
+        const NotCancelled reading;
+        std::ifstream file(name, std::ios::binary);
+        std::string text;
+        std::getline(file, text);
+        Script::Current().Record("saved " + name.substr(name.rfind('/') + 1) + " " + text);
     }
     return result;
-}
-
-int fchmod(int fd, mode_t mode) noexcept {
-    return Call<int>("fchmod", PathOf(fd), fd, mode);
-}
-
-int linkat(int fromFd, const char *from, int toFd, const char *to, int flags) noexcept {
-    return Call<int>("linkat", to, fromFd, from, toFd, to, flags);
-}
-
-int mkdirat(int directory, const char *name, mode_t mode) noexcept {
-    return Call<int>("mkdirat", PathOf(directory) + "/" + name, directory, name, mode);
-}
-
-int fstatat(int directory, const char *name, struct stat *buffer, int flags) noexcept {
-    return Call<int>("fstatat", PathOf(directory) + "/" + name, directory, name, buffer, flags);
 }
 
 int ftruncate(int fd, off_t length) noexcept {
@@ -213,10 +227,6 @@ int fdatasync(int fd) {
     return Flush("fdatasync", fd);
 }
 
-int socket(int domain, int type, int protocol) noexcept {
-    return Call<int>("socket", "", domain, type, protocol);
-}
-
 int connect(int fd, const struct sockaddr *address, socklen_t length) {
     if (const auto fault = Script::Current().Take("connect", std::to_string(length))) {
         errno = fault->error;
@@ -224,14 +234,6 @@ int connect(int fd, const struct sockaddr *address, socklen_t length) {
     }
     const NotCancelled connecting;
     return fileindex_test::FakeDaemon::Connect(fd, address);
-}
-
-int setsockopt(int fd, int level, int option, const void *value, socklen_t length) noexcept {
-    return Call<int>("setsockopt", std::to_string(option), fd, level, option, value, length);
-}
-
-int usleep(useconds_t microseconds) {
-    return Call<int>("usleep", std::to_string(microseconds), microseconds);
 }
 
 int rand(void) noexcept {
@@ -244,6 +246,12 @@ time_t time(time_t *out) noexcept {
         *out = now;
     }
     return now;
+}
+
+int clock_gettime(clockid_t clock, struct timespec *now) noexcept {
+    const long result = ::syscall(SYS_clock_gettime, clock, now);
+    now->tv_sec += Script::Current().secondsPassed;
+    return static_cast<int>(result);
 }
 
 }  // extern "C"

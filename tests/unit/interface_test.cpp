@@ -1,11 +1,8 @@
-// What programs that are linked with the library were compiled with: sizes, places of members, slots of virtual
-// functions. A change of these needs a new SONAME.
-#include <fileindex/fileindex.h>
-
-#include <gtest/gtest.h>
+// What programs that are linked with the library rely on. The layout, sizes and places of members and slots of
+// virtual functions, was compiled into them: a change of it needs a new SONAME.
+#include "fixture.h"
 
 #include <cstddef>
-#include <cstdint>
 #include <cstring>
 #include <map>
 #include <string>
@@ -13,34 +10,33 @@
 namespace fileindex_test {
 namespace {
 
-using namespace VORK::FILEINDEX;  // NOLINT(google-build-using-namespace): the subject of every test
+const _tag_fileindex_err_ kErrorAtStart = ErrorHandler::GetError();
+const int kLogLevelAtStart = LOG_LEVEL;
+
+class Interface : public FileIndexTest {};
 
 /// A pointer to a virtual member function holds the place of its slot in the table, plus one.
 template <typename Member>
 std::ptrdiff_t SlotOf(Member member) {
     std::ptrdiff_t place = 0;
-    static_assert(sizeof(member) >= sizeof(place));
     std::memcpy(&place, &member, sizeof(place));
     return (place - 1) / static_cast<std::ptrdiff_t>(sizeof(void *));
 }
 
-size_t PlaceIn(const Folder &folder, const void *member) {
-    return reinterpret_cast<std::uintptr_t>(member) - reinterpret_cast<std::uintptr_t>(&folder);
-}
-
-TEST(Layout, OfTheFolderRecord) {
+TEST_F(Interface, KeepsTheLayoutOfTheFolderRecord) {
     constexpr size_t kString = sizeof(std::string);
     const Folder folder;
     EXPECT_EQ(3 * kString + 8, sizeof(Folder));
+    const auto *const begin = reinterpret_cast<const char *>(&folder);
     const void *const members[] = {&folder.path,  &folder.name,  &folder.document,
                                    &folder.audio, &folder.video, &folder.photo};
     const size_t places[] = {kString, 2 * kString, 3 * kString, 3 * kString + 1, 3 * kString + 2, 3 * kString + 3};
     for (size_t i = 0; i < std::size(members); ++i) {
-        EXPECT_EQ(places[i], PlaceIn(folder, members[i])) << i;
+        EXPECT_EQ(begin + places[i], members[i]) << i;
     }
 }
 
-TEST(Layout, OfTheConfigurationClasses) {
+TEST_F(Interface, KeepsTheLayoutOfTheConfigurationClasses) {
     EXPECT_EQ(sizeof(void *) + sizeof(Json::Value) + 8, sizeof(Config));
     EXPECT_EQ(sizeof(Config), sizeof(Status));
     EXPECT_EQ(sizeof(Config) + sizeof(std::map<std::string, Folder>), sizeof(Folders));
@@ -51,7 +47,7 @@ TEST(Layout, OfTheConfigurationClasses) {
     EXPECT_EQ(5, SlotOf(&Config::GetPath));
 }
 
-TEST(Layout, OfErrorCodesAndTheLogLevel) {
+TEST_F(Interface, KeepsTheErrorCodes) {
     EXPECT_EQ(4U, sizeof(ErrorHandler::g_error_code));
     EXPECT_EQ(4U, sizeof(LOG_LEVEL));
     const int codes[] = {FILEINDEX_ERR_NONE,      FILEINDEX_ERR_BAD_PARAM,      FILEINDEX_ERR_PATH,
@@ -61,6 +57,23 @@ TEST(Layout, OfErrorCodesAndTheLogLevel) {
     for (int value = 0; value < static_cast<int>(std::size(codes)); ++value) {
         EXPECT_EQ(value, codes[value]);
     }
+    EXPECT_EQ(FILEINDEX_ERR_NONE, kErrorAtStart);
+    EXPECT_EQ(3, kLogLevelAtStart);
+}
+
+TEST_F(Interface, KeepsAnErrorCodeThroughASuccessAndWhateverTheLogLevel) {
+    std::string full;
+    for (const int level : {0, 3, 7}) {
+        LOG_LEVEL = level;
+        ASSERT_FALSE(GetFullPath(full, "/none/x") || GetFullPath(full, ""));
+        ASSERT_TRUE(GetFullPath(full, "/photo/x"));
+        EXPECT_EQ(FILEINDEX_ERR_PATH, ErrorHandler::g_error_code);
+        EXPECT_EQ("PATH; utils.cpp:389 GetShareNameByPath failed, path=", Left());
+    }
+    EXPECT_EQ(0,
+              FILEIDXIsPathIndexed(nullptr) + FILEIDXIsFullPathIndexed(nullptr) + FILEIDXIsShareIndexed(nullptr));
+    EXPECT_FALSE(CanShareBeIndexed(nullptr));
+    EXPECT_EQ("", Left());
 }
 
 }  // namespace
