@@ -141,7 +141,8 @@ COUNTED(int, fstatat, (int at, const char *name, struct stat *out, int flags) no
         out, flags)
 COUNTED(int, socket, (int domain, int type, int protocol) noexcept, "", domain, type, protocol)
 COUNTED(int, setsockopt, (int fd, int level, int option, const void *value, socklen_t size) noexcept,
-        std::to_string(option), fd, level, option, value, size)
+        std::to_string(option) + " " + std::to_string(*static_cast<const long *>(value)), fd, level, option, value,
+        size)
 COUNTED(int, usleep, (useconds_t time), std::to_string(time), time)
 #undef COUNTED
 

@@ -45,7 +45,7 @@ TEST_F(DaemonSocket, CarriesOneFrameForEachCommandInChunksOf1024Bytes) {
 }
 
 TEST_F(DaemonSocket, FailsWhenAStepDoes) {
-    const std::string timeout = std::to_string(SO_SNDTIMEO);
+    const std::string timeout = std::to_string(SO_SNDTIMEO) + " 1";  // in seconds
     const std::string frame = FrameOf(TextWith(3000));
     const std::string head = frame.substr(0, 4);
     const std::string nul(1, '\0');
