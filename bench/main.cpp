@@ -1,4 +1,4 @@
-// Measures every row of the table in one run and prints the ratios.
+// Measures the rows of the table one after the other and prints the ratios.
 //
 //   fileindex_bench [--check] [--smoke] [--json FILE] [--only TEXT]
 //
@@ -6,13 +6,13 @@
 // paths for itself: run it in a private namespace.
 
 #include "data.h"
+#include "measure.h"
 #include "queue/pending.h"
 #include "rows.h"
 #include "rows/support.h"
 
 #include <fileindex/index_mgr.h>
 
-#include <benchmark/benchmark.h>
 #include <json/value.h>
 #include <json/writer.h>
 
@@ -20,11 +20,10 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <cstdio>
 #include <cstring>
+#include <exception>
 #include <fstream>
-#include <map>
 #include <string>
 #include <vector>
 
@@ -36,57 +35,6 @@ struct Options {
     std::string json;
     std::string only;
 };
-
-/// Nanoseconds of one run by the name of the benchmark: the median of its repetitions.
-class Medians : public benchmark::BenchmarkReporter {
-public:
-    bool ReportContext(const Context &) override { return true; }
-    void ReportRuns(const std::vector<Run> &runs) override {
-        for (const Run &run : runs) {
-            if (run.error_occurred) {
-                std::fprintf(stderr, "%s: %s\n", run.run_name.str().c_str(), run.error_message.c_str());
-                failed_ = true;
-            } else if (run.run_type == Run::RT_Iteration) {
-                times_[run.run_name.function_name].push_back(run.GetAdjustedRealTime());
-            }
-        }
-    }
-    double Of(const std::string &name) {
-        std::vector<double> &times = times_[name];
-        if (times.empty()) {
-            return 0;
-        }
-        std::sort(times.begin(), times.end());
-        return times[times.size() / 2];
-    }
-    bool Failed() const { return failed_; }
-
-private:
-    std::map<std::string, std::vector<double>> times_;
-    bool failed_ = false;
-};
-
-void Register(const std::string &name, const bench::Variant &variant, const Options &options, int repetitions) {
-    if (!variant) {
-        return;
-    }
-    auto *registered = benchmark::RegisterBenchmark(name.c_str(), [variant](benchmark::State &state) {
-        try {
-            const std::function<void()> operation = variant();
-            for (auto _ : state) {
-                operation();
-            }
-        } catch (const std::exception &failure) {
-            state.SkipWithError(failure.what());
-        }
-    });
-    registered->Unit(benchmark::kNanosecond)->UseRealTime();
-    if (options.smoke) {
-        registered->Iterations(1);
-    } else {
-        registered->Repetitions(repetitions)->MinTime(0.1);
-    }
-}
 
 /// The peak memory of a child that runs the operation, in KiB.
 template <typename Operation>
@@ -106,24 +54,23 @@ struct Verdict {
     Json::Value rows{Json::arrayValue};
     bool missed = false;
 
-    void Add(const bench::Row &row, Medians &medians) {
-        const double library = medians.Of(row.name + "|library");
-        const double baseline = medians.Of(row.name + "|baseline");
-        const double floor = medians.Of(row.name + "|floor");
-        const double ofFloor = floor > 0 ? library / floor : 0;
-        const double ofBaseline = baseline > 0 ? library / baseline : 0;
+    void Add(const bench::Row &row, const bench::Times &times) {
+        const double ofFloor = times.floor > 0 ? times.library / times.floor : 0;
+        const double baseline = times.baseline * static_cast<double>(row.baselineParts);
+        const double ofBaseline = baseline > 0 ? times.library / baseline : 0;
         const bool slow = (row.mostOfFloor > 0 && ofFloor > row.mostOfFloor) ||
                           (row.mostOfBaseline > 0 && ofBaseline > row.mostOfBaseline);
         missed = missed || slow;
-        std::printf("%-62s %12.1f us", row.name.c_str(), library / 1e3);
+        std::printf("%-62s %12.1f us", row.name.c_str(), times.library * 1e6);
         Print(ofFloor, row.mostOfFloor, "of floor");
         Print(ofBaseline, row.mostOfBaseline, "of baseline");
         std::printf("%s\n", slow ? "  MISSED" : "");
+        std::fflush(stdout);
         Json::Value entry(Json::objectValue);
         entry["row"] = row.name;
-        entry["library_ns"] = library;
-        entry["baseline_ns"] = baseline;
-        entry["floor_ns"] = floor;
+        entry["library_ns"] = times.library * 1e9;
+        entry["baseline_ns"] = baseline * 1e9;
+        entry["floor_ns"] = times.floor * 1e9;
         entry["of_floor"] = ofFloor;
         entry["of_baseline"] = ofBaseline;
         entry["missed"] = slow;
@@ -205,23 +152,15 @@ int main(int argc, char **argv) {
     std::vector<bench::Row> rows = bench::Rows(scale);
     std::erase_if(rows, [&](const bench::Row &row) { return row.name.find(options.only) == std::string::npos; });
 
-    for (const bench::Row &row : rows) {
-        Register(row.name + "|library", row.library, options, 5);
-        Register(row.name + "|floor", row.floor, options, 5);
-        Register(row.name + "|baseline", row.baseline, options, 3);  // the slow one, and so the steady one
-    }
-    Medians medians;
-    // A machine that is busy for a while is to slow down all variants alike.
-    std::string program = "fileindex_bench";
-    std::string interleave = "--benchmark_enable_random_interleaving=true";
-    char *arguments[] = {program.data(), interleave.data(), nullptr};
-    int count = 2;
-    benchmark::Initialize(&count, arguments);
-    benchmark::RunSpecifiedBenchmarks(&medians);
-
     Verdict verdict;
+    bool failed = false;
     for (const bench::Row &row : rows) {
-        verdict.Add(row, medians);
+        try {
+            verdict.Add(row, bench::Measure(row, options.smoke));
+        } catch (const std::exception &failure) {
+            std::fprintf(stderr, "%s: %s\n", row.name.c_str(), failure.what());
+            failed = true;
+        }
     }
     if (options.only.empty()) {
         MeasureMemory(verdict, scale);
@@ -229,8 +168,5 @@ int main(int argc, char **argv) {
     if (!options.json.empty()) {
         std::ofstream(options.json) << verdict.rows << '\n';
     }
-    if (medians.Failed()) {
-        return 1;
-    }
-    return options.check && verdict.missed ? 1 : 0;
+    return failed || (options.check && verdict.missed) ? 1 : 0;
 }

@@ -15,10 +15,11 @@ using Variant = std::function<std::function<void()>()>;
 struct Row {
     std::string name;
     Variant library;
-    Variant baseline;           ///< may be empty
-    Variant floor;              ///< may be empty
-    double mostOfFloor = 0;     ///< library / floor at most; 0: not checked
-    double mostOfBaseline = 0;  ///< library / baseline at most; 0: not checked
+    Variant baseline;               ///< may be empty
+    std::size_t baselineParts = 1;  ///< the baseline does one of so many equal parts of the work
+    Variant floor;                  ///< may be empty
+    double mostOfFloor = 0;         ///< library / floor at most; 0: not checked
+    double mostOfBaseline = 0;      ///< library / baseline at most; 0: not checked
 };
 
 /// `scale` divides the queue lengths: 1 measures, 100 only shows that everything runs.

@@ -46,7 +46,7 @@ Row IsPathIndexed(std::size_t folders) {
             Require(reader->parse(text.data(), text.data() + text.size(), &document, nullptr), "parse");
         };
     };
-    row.mostOfFloor = folders >= 100 ? 0.35 : 0;
+    row.mostOfFloor = folders >= 1000 ? 0.2 : folders >= 100 ? 0.35 : 0;
     return row;
 }
 

@@ -4,6 +4,7 @@
 
 #include "base/path_cover.h"
 #include "folders/folder_access.h"
+#include "folders/places.h"
 
 #include <fileindex/folder.h>
 
@@ -21,6 +22,16 @@ inline bool Covers(const Folder &folder, std::string_view fullPath) {
     }
     const std::string place = folder.GetFullPath();
     return !place.empty() && IsAtOrUnder(fullPath, place);
+}
+
+inline bool Covers(const FolderPlace &place, std::string_view fullPath) {
+    if (place.volume != nullptr) {
+        return fullPath.starts_with(*place.volume) &&
+               IsAtOrUnder(fullPath.substr(place.volume->size()), place.path);
+    }
+    Folder unresolved;
+    unresolved.path = place.path;
+    return Covers(unresolved, fullPath);
 }
 
 /// Finds the folder that governs a full path. The last one considered wins, even over a nearer one before it:

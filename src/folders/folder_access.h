@@ -5,6 +5,7 @@
 #include <fileindex/folders.h>
 #include <fileindex/paths.h>
 
+#include <functional>
 #include <map>
 #include <string>
 #include <string_view>
@@ -22,6 +23,9 @@ struct FolderAccess {
 
     /// As Folders::Save, likewise.
     static bool Save(const Folders &store);
+
+    /// Reads the store's file. What `takeUsual` does not take goes the exact way, through the document.
+    static bool LoadWith(Folders &store, const std::function<bool(std::string &text)> &takeUsual);
 
     /// Fills the list from the text of a folder.conf in its usual form, without making the document. False, with
     /// nothing taken, when it is not quite that.

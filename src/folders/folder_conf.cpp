@@ -3,8 +3,10 @@
 #include "config/load_save.h"
 #include "folders/folder_access.h"
 #include "folders/media_kinds.h"
+#include "folders/places.h"
 #include "names.h"
 #include "records.h"
+#include "share/volume.h"
 
 #include <fileindex/error.h>
 #include <fileindex/folders.h>
@@ -110,12 +112,16 @@ bool Folders::Save() {
 namespace internal {
 
 bool FolderAccess::Load(Folders &store) {
-    bool done = false;
+    return LoadWith(store, [&](std::string &text) { return TakeText(store, text); });
+}
+
+bool FolderAccess::LoadWith(Folders &store, const std::function<bool(std::string &text)> &takeUsual) {
+    bool usual = false;
     const bool loaded = LoadConfig(store.GetPath(), [&](std::string &text) {
-        done = TakeText(store, text);
-        return done || JsonReader().Parse(text, store.document_);
+        usual = takeUsual(text);
+        return usual || JsonReader().Parse(text, store.document_);
     });
-    return loaded && (done || TakeDocument(store));
+    return loaded && (usual || TakeDocument(store));
 }
 
 bool FolderAccess::TakeText(Folders &store, std::string_view text) {
@@ -134,6 +140,41 @@ bool FolderAccess::TakeText(Folders &store, std::string_view text) {
         Resolve(folder);  // a folder whose share is away stays in the list
         std::string key = folder.path;
         store.folders_.emplace_hint(store.folders_.end(), std::move(key), std::move(folder));
+    }
+    return true;
+}
+
+bool FolderPlaces::Load() {
+    const bool loaded = FolderAccess::LoadWith(store_, [&](std::string &text) {
+        text_.swap(text);
+        const bool taken = TakeText();
+        if (!taken) {
+            text_.swap(text);
+        }
+        return taken;
+    });
+    for (const auto &[path, folder] : FolderAccess::All(store_)) {
+        const std::string &fullPath = FolderAccess::StoredFullPath(folder);
+        const std::string *volume =
+            fullPath.empty() ? nullptr : &volumes_.emplace_back(fullPath, 0, fullPath.size() - path.size());
+        places_.push_back({path, volume});
+    }
+    return loaded;
+}
+
+bool FolderPlaces::TakeText() {
+    std::vector<StoredFolder> records;
+    if (!ReadRecords(text_, decoded_, records)) {
+        return false;
+    }
+    places_.reserve(records.size());
+    std::string volume;
+    for (const StoredFolder &record : records) {
+        const bool found = GetVolume(volume, record.path);
+        if (found && (volumes_.empty() || volumes_.back() != volume)) {
+            volumes_.push_back(volume);
+        }
+        places_.push_back({record.path, found ? &volumes_.back() : nullptr});
     }
     return true;
 }

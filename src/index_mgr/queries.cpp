@@ -2,6 +2,7 @@
 #include "config/unlocker.h"
 #include "folders/coverage.h"
 #include "folders/folder_access.h"
+#include "folders/places.h"
 #include "no_throw.h"
 #include "records.h"
 
@@ -20,18 +21,13 @@ using namespace internal;
 
 namespace {
 
-/// Asks the stored folders in list order, without a lock and without copying them. A folder.conf that cannot be
-/// read makes every answer false.
+/// Asks the stored folders in list order, without a lock. A folder.conf that cannot be read makes every answer
+/// false.
 template <typename Question>
 bool AnyStored(Question question) {
     return NoThrow([&] {
-        Folders store;
-        if (!FolderAccess::Load(store)) {
-            return false;
-        }
-        const auto &folders = FolderAccess::All(store);
-        return std::any_of(folders.begin(), folders.end(),
-                           [&](const auto &entry) { return question(entry.second); });
+        FolderPlaces places;
+        return places.Load() && std::any_of(places.All().begin(), places.All().end(), question);
     });
 }
 
@@ -55,23 +51,24 @@ bool IndexMgr::IsFullPathIndexed(const std::string &path, const std::vector<Fold
 }
 
 bool IndexMgr::IsPathIndexed(const std::string &path) {
-    return AnyStored([&](const Folder &folder) { return IsAtOrUnder(path, folder.path); });
+    return AnyStored([&](const FolderPlace &folder) { return IsAtOrUnder(path, folder.path); });
 }
 
 bool IndexMgr::IsPathContainIndexed(const std::string &path) {
-    return AnyStored([&](const Folder &folder) { return IsAtOrUnder(folder.path, path); });
+    return AnyStored([&](const FolderPlace &folder) { return IsAtOrUnder(folder.path, path); });
 }
 
 bool IndexMgr::IsFullPathIndexed(const std::string &path) {
-    return AnyStored([&](const Folder &folder) { return Covers(folder, path); });
+    return AnyStored([&](const FolderPlace &folder) { return Covers(folder, path); });
 }
 
 bool IndexMgr::IsShareIndexed(const std::string &share) {
-    return AnyStored([&](const Folder &folder) {
+    return AnyStored([&](const FolderPlace &folder) {
         std::string owner;
-        if (!GetShareNameByPath(owner, folder.path)) {
+        const std::string path(folder.path);
+        if (!GetShareNameByPath(owner, path)) {
             syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", kIndexMgrModule, __LINE__,
-                   folder.path.c_str());
+                   path.c_str());
             return false;
         }
         return owner == share;

@@ -2,6 +2,7 @@
 
 #include "base/metadata_entry.h"
 #include "base/queue/event.h"
+#include "queue/path_search.h"
 #include "records.h"
 
 #include <fileindex/paths.h>
@@ -9,7 +10,6 @@
 #include <fcntl.h>
 #include <syslog.h>
 
-#include <cstring>
 #include <utility>
 
 namespace VORK::FILEINDEX::internal {
@@ -28,10 +28,6 @@ UniqueFd OpenQueue(const std::string &queueFile, struct stat &status) {
 
 bool IsReindex(const QueueEvent *event) {
     return event != nullptr && event->type == kReindexEvent;
-}
-
-bool Contains(std::string_view text, std::string_view part) {
-    return memmem(text.data(), text.size(), part.data(), part.size()) != nullptr;
 }
 
 /// Does the line of a reindex of exactly this path begin at the offset?
@@ -63,11 +59,8 @@ bool IsReindexQueued(const std::string &fullPath, const std::string &queueFile) 
         return false;
     }
     QueueLines lines(std::move(file));
-    // A string without escapes stands in the text as it is: a line that holds neither a backslash nor the path
-    // cannot name it, and need not be read.
-    lines.SkipUnless([&](std::string_view text) {
-        return std::memchr(text.data(), '\\', text.size()) != nullptr || Contains(text, fullPath);
-    });
+    const PathSearch search(fullPath);
+    lines.SkipUnless([&](std::string_view text) { return search.MayBeNamedIn(text); });
     QueueEventReader reader;
     for (QueueLine line; lines.Next(line);) {
         const QueueEvent *event = reader.Read(line);

@@ -2,6 +2,7 @@
 #include "records.h"
 #include "share/location.h"
 #include "share/lookup.h"
+#include "share/volume.h"
 
 #include <fileindex/error.h>
 #include <fileindex/paths.h>
@@ -17,24 +18,39 @@ namespace FILEINDEX {
 
 namespace records = internal::records;
 
-bool GetFullPath(std::string &out, const std::string &sharePath) {
-    std::string shareName;
-    if (!GetShareNameByPath(shareName, sharePath)) {
+namespace {
+
+std::string_view ShareOf(std::string_view sharePath) {
+    return sharePath.substr(1, sharePath.find('/', 1) - 1);
+}
+
+}  // namespace
+
+bool internal::GetVolume(std::string &volume, std::string_view sharePath) {
+    if (sharePath.empty()) {
         syslog(LOG_ERR, "%s:%d GetShareNameByPath failed, path=%s", records::kEmptyPath.module,
-               records::kEmptyPath.line, sharePath.c_str());
+               records::kEmptyPath.line, "");
         return false;
     }
     // The platform would see the path up to a NUL only, and so another one.
-    const internal::Share share = HasNul(sharePath) ? internal::Share() : internal::FindShare(shareName);
+    const bool hasNul = sharePath.find('\0') != std::string_view::npos;
+    const internal::Share share =
+        hasNul ? internal::Share() : internal::FindShare(std::string(ShareOf(sharePath)));
     if (!share) {
         ErrorHandler::SetError(FILEINDEX_ERR_PATH);
         return false;
     }
     const std::string_view directory = share->szPath;
-    const std::string_view volume = directory.substr(0, directory.rfind('/'));  // all of it when there is no "/"
+    volume = directory.substr(0, directory.rfind('/'));  // all of it when there is no "/"
+    return true;
+}
+
+bool GetFullPath(std::string &out, const std::string &sharePath) {
     std::string fullPath;
-    fullPath.reserve(volume.size() + sharePath.size());
-    fullPath.append(volume).append(sharePath);
+    if (!internal::GetVolume(fullPath, sharePath)) {
+        return false;
+    }
+    fullPath += sharePath;
     out = std::move(fullPath);
     return true;
 }
@@ -43,8 +59,7 @@ bool GetShareNameByPath(std::string &outShareName, const std::string &sharePath)
     if (sharePath.empty()) {
         return false;
     }
-    const std::size_t end = sharePath.find('/', 1);
-    outShareName = sharePath.substr(1, end == std::string::npos ? end : end - 1);
+    outShareName = std::string(ShareOf(sharePath));  // may be the argument itself
     return true;
 }
 
