@@ -12,7 +12,7 @@ namespace bench {
 namespace {
 
 constexpr double kBatch = 0.01;  // seconds of a batch, unless one run takes longer
-constexpr double kEnough = 6;    // seconds of a variant
+constexpr double kEnough = 3;    // seconds of a variant
 constexpr double kImprovement = 0.99;
 constexpr int kQuietBatches = 25;  // of each variant, while none gets faster
 

@@ -12,13 +12,8 @@ namespace VORK {
 
 namespace {
 
-constexpr int kMaxDepth = 16;           // far below the exact reader's limit
 constexpr std::size_t kMaxNumber = 64;  // with an exponent of two digits: far from the ends of the range
 constexpr std::size_t kMaxExponent = 2;
-
-bool IsBlank(char c) {
-    return c == ' ' || c == '\t' || c == '\n' || c == '\r';
-}
 
 bool IsSurrogate(unsigned unit, unsigned half) {
     return (unit & 0xFC00) == half;
@@ -39,16 +34,8 @@ void AppendUtf8(std::string &out, unsigned codePoint) {
 
 }  // namespace
 
-// A NUL ends the text for the exact reader, which therefore refuses it.
-JsonScanner::JsonScanner(std::string_view text, std::string &decoded)
-    : rest_(HasNul(text) ? std::string_view() : text), decoded_(decoded) {
-    decoded_.clear();
-}
-
-bool JsonScanner::TakeString(std::string_view &content) {
-    if (!TakeMark('"')) {
-        return false;
-    }
+/// Any string, after its opening quote.
+bool JsonScanner::TakeLong(std::string_view &content) {
     const std::size_t end = rest_.find('"');
     if (end == std::string_view::npos) {
         return false;
@@ -58,7 +45,7 @@ bool JsonScanner::TakeString(std::string_view &content) {
     }
     content = rest_.substr(0, end);
     rest_.remove_prefix(end + 1);
-    return true;
+    return !HasNul(content);  // which ends the text for the exact reader
 }
 
 /// A string with escapes, after its opening quote.
@@ -68,7 +55,7 @@ bool JsonScanner::TakeEscaped(std::string_view &content) {
     const std::size_t begin = decoded_.size();
     for (;;) {
         const auto special =
-            std::find_if(rest_.begin(), rest_.end(), [](char c) { return c == '"' || c == '\\'; });
+            std::find_if(rest_.begin(), rest_.end(), [](char c) { return c == '"' || c == '\\' || c == '\0'; });
         decoded_.append(rest_.begin(), special);
         rest_.remove_prefix(static_cast<std::size_t>(special - rest_.begin()));
         if (Take("\"")) {
@@ -197,34 +184,6 @@ bool JsonScanner::SkipNumber() {
 bool JsonScanner::AtEnd() {
     SkipBlanks();
     return rest_.empty();
-}
-
-void JsonScanner::SkipBlanks() {
-    while (!rest_.empty() && IsBlank(rest_.front())) {
-        rest_.remove_prefix(1);
-    }
-}
-
-bool JsonScanner::Take(std::string_view literal) {
-    const bool there = rest_.starts_with(literal);
-    rest_.remove_prefix(there ? literal.size() : 0);
-    return there;
-}
-
-bool JsonScanner::TakeMark(char mark) {
-    SkipBlanks();
-    const bool there = rest_.starts_with(mark);
-    rest_.remove_prefix(there ? 1 : 0);
-    return there;
-}
-
-bool JsonScanner::Open(char mark) {
-    return TakeMark(mark) && ++depth_ <= kMaxDepth;
-}
-
-bool JsonScanner::Close() {
-    --depth_;
-    return true;
 }
 
 }  // namespace VORK

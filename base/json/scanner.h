@@ -14,7 +14,7 @@ namespace VORK {
 class JsonScanner {
 public:
     /// `decoded` becomes the home of strings that have escapes. Strings without any are views into the text.
-    JsonScanner(std::string_view text, std::string &decoded);
+    JsonScanner(std::string_view text, std::string &decoded) : rest_(text), decoded_(decoded) { decoded_.clear(); }
 
     /// Calls `takeValue(name)` for each member; it takes the member's value and answers whether it could.
     template <typename TakeValue>
@@ -34,7 +34,21 @@ public:
         return TakeMark('}') && Close();
     }
 
-    bool TakeString(std::string_view &content);
+    bool TakeString(std::string_view &content) {
+        constexpr std::size_t kShort = 12;  // most names of members
+        if (!TakeMark('"')) {
+            return false;
+        }
+        const std::size_t searched = rest_.size() < kShort ? rest_.size() : kShort;
+        for (std::size_t i = 0; i < searched && rest_[i] != '\\' && rest_[i] != '\0'; ++i) {
+            if (rest_[i] == '"') {
+                content = rest_.substr(0, i);
+                rest_.remove_prefix(i + 1);
+                return true;
+            }
+        }
+        return TakeLong(content);
+    }
     bool TakeBool(bool &value);
     bool TakeUnsigned(unsigned &value);
 
@@ -45,17 +59,39 @@ public:
     bool AtEnd();
 
 private:
-    void SkipBlanks();
-    bool Take(std::string_view literal);
-    bool TakeMark(char mark);
-    bool Open(char mark);
-    bool Close();
+    // In the header, because a short line consists of little else.
+    void SkipBlanks() {
+        while (!rest_.empty() && rest_.front() <= ' ' && IsBlank(rest_.front())) {
+            rest_.remove_prefix(1);
+        }
+    }
+    bool TakeMark(char mark) {
+        SkipBlanks();
+        const bool there = !rest_.empty() && rest_.front() == mark;
+        rest_.remove_prefix(there ? 1 : 0);
+        return there;
+    }
+    static bool IsBlank(char c) { return c == ' ' || c == '\t' || c == '\n' || c == '\r'; }
+
+    bool Take(std::string_view literal) {
+        const bool there = rest_.starts_with(literal);
+        rest_.remove_prefix(there ? literal.size() : 0);
+        return there;
+    }
+    bool Open(char mark) { return TakeMark(mark) && ++depth_ <= kMaxDepth; }
+    bool Close() {
+        --depth_;
+        return true;
+    }
     bool SkipArray();
     bool SkipNumber();
+    bool TakeLong(std::string_view &content);
     bool TakeEscaped(std::string_view &content);
     bool TakeEscape();
     bool TakeCodePoint();
     bool TakeHex(unsigned &value);
+
+    static constexpr int kMaxDepth = 16;  // far below the exact reader's limit
 
     std::string_view rest_;
     std::string &decoded_;
