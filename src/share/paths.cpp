@@ -33,9 +33,8 @@ bool internal::GetVolume(std::string &volume, std::string_view sharePath) {
         return false;
     }
     // The platform would see the path up to a NUL only, and so another one.
-    const bool hasNul = sharePath.find('\0') != std::string_view::npos;
     const internal::Share share =
-        hasNul ? internal::Share() : internal::FindShare(std::string(ShareOf(sharePath)));
+        HasNul(sharePath) ? internal::Share() : internal::FindShare(std::string(ShareOf(sharePath)));
     if (!share) {
         ErrorHandler::SetError(FILEINDEX_ERR_PATH);
         return false;
