@@ -5,11 +5,13 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <csignal>
 #include <filesystem>
 #include <functional>
 #include <string>
+#include <vector>
 
 namespace fs = std::filesystem;
 
