@@ -16,6 +16,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <iterator>
 
 namespace VORK::FILEINDEXCTL {
 
@@ -40,12 +41,6 @@ void RequireAbsolute(const std::string &path) {
 std::string SharePathOf(const std::string &fullPath) {
     const auto share = ShareHolding(fullPath);
     return share ? "/" + share->first + fullPath.substr(share->second.size()) : "";
-}
-
-const Folder *Find(const std::string &path, const Folders &folders) {
-    const auto found =
-        std::find_if(folders.begin(), folders.end(), [&](const Folder &folder) { return folder.path == path; });
-    return found == folders.end() ? nullptr : &*found;
 }
 
 bool IsShareKnown(const std::string &share, const Folders &folders) {
@@ -86,6 +81,20 @@ std::set<std::string> SharesOf(const Folders &folders) {
         shares.insert(ShareOf(folder.path));
     }
     return shares;
+}
+
+std::set<std::string> SharesOf(const Paths &sharePaths) {
+    std::set<std::string> shares;
+    std::transform(sharePaths.begin(), sharePaths.end(), std::inserter(shares, shares.end()), ShareOf);
+    return shares;
+}
+
+Paths PathsOf(const Json::Value &records) {
+    Paths paths;
+    for (const auto &record : records) {
+        paths.push_back(record["path"].asString());
+    }
+    return paths;
 }
 
 std::string RequireShare(const std::string &share) {
@@ -143,12 +152,18 @@ void RequireSharePath(const Place &place) {
     }
 }
 
+const Folder *FindFolder(const std::string &path, const Folders &folders) {
+    const auto found =
+        std::find_if(folders.begin(), folders.end(), [&](const Folder &folder) { return folder.path == path; });
+    return found == folders.end() ? nullptr : &*found;
+}
+
 const Folder &RequireFolder(const std::string &given, const Folders &folders) {
-    if (const Folder *exact = Find(given, folders)) {
+    if (const Folder *exact = FindFolder(given, folders)) {
         return *exact;
     }
     const Place place = Locate(given, folders);
-    if (const Folder *stripped = Find(place.path, folders)) {
+    if (const Folder *stripped = FindFolder(place.path, folders)) {
         return *stripped;
     }
     RequireSharePath(place);

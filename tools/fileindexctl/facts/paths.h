@@ -11,6 +11,7 @@
 namespace VORK::FILEINDEXCTL {
 
 using Folders = std::vector<VORK::FILEINDEX::Folder>;
+using Paths = std::vector<std::string>;
 
 /// All folders, in the order of folder.conf. Throws Failure.
 Folders ReadFolders();
@@ -33,6 +34,9 @@ Place Locate(const std::string &given, const Folders &folders);
 /// what the user may have meant, when there is none.
 const VORK::FILEINDEX::Folder &RequireFolder(const std::string &given, const Folders &folders);
 
+/// The folder stored under exactly this path; null when there is none.
+const VORK::FILEINDEX::Folder *FindFolder(const std::string &path, const Folders &folders);
+
 /// Throws Failure, which names the share path, for a full path.
 void RequireSharePath(const Place &place);
 
@@ -54,6 +58,12 @@ std::string ShareOfFullPath(const std::string &fullPath);
 
 /// The names of the shares that the folders lie on.
 std::set<std::string> SharesOf(const Folders &folders);
+
+/// The names of the shares of share paths.
+std::set<std::string> SharesOf(const Paths &sharePaths);
+
+/// The share paths of an array of folder records.
+Paths PathsOf(const Json::Value &records);
 
 bool IsSharePresent(const std::string &share);
 

@@ -119,7 +119,7 @@ void AddShare(const std::string &share, const Folders &folders, StatusReport &re
     report.data["share"].append(entry);
 }
 
-void AddTable(const StatusReport::Rows &rows, unsigned width, std::vector<std::string> &lines) {
+void AddTable(const Rows &rows, unsigned width, std::vector<std::string> &lines) {
     if (rows.size() > 1) {
         const auto table = Align(rows, width);
         lines.emplace_back();

@@ -4,6 +4,7 @@
 
 #include "facts/queue.h"
 #include "report/gaps.h"
+#include "report/text.h"
 
 #include <json/value.h>
 
@@ -15,8 +16,6 @@
 namespace VORK::FILEINDEXCTL {
 
 struct StatusReport {
-    using Rows = std::vector<std::vector<std::string>>;
-
     std::string state{};  ///< in one word
     Rows facts{};         ///< what it is, and how it stands
     Rows shares{};        ///< tables with a head; empty when there is nothing to tell

@@ -2,7 +2,6 @@
 
 #include "base/json/document.h"
 #include "report/screen.h"
-#include "report/text.h"
 
 #include <unistd.h>
 
@@ -29,14 +28,6 @@ void Complain(std::string_view kind, const std::string &text) {
 
 }  // namespace
 
-Json::Value ToArray(const std::vector<std::string> &items) {
-    Json::Value array(Json::arrayValue);
-    for (const auto &item : items) {
-        array.append(item);
-    }
-    return array;
-}
-
 Output::Output(bool json)
     : json_(json),
       colour_(MayColour()),
@@ -52,6 +43,18 @@ void Output::Line(const std::string &text, Colour colour) {
 void Output::Raw(std::string_view text) {
     if (!json_) {
         Print(stdout, text);
+    }
+}
+
+void Output::Table(const Rows &rows) {
+    for (const auto &line : Align(rows, width_)) {
+        Line(line);
+    }
+}
+
+void Output::Facts(const Rows &rows) {
+    for (const auto &line : Align(rows, 0)) {
+        Line(line);
     }
 }
 
@@ -93,6 +96,13 @@ void Output::Error(ExitStatus status, const std::string &text) {
     data_["error"]["status"] = static_cast<int>(status);
     data_["error"]["message"] = text;
     Complain("", text);
+}
+
+ExitStatus Output::Conclude(ExitStatus status, const std::string &trouble) {
+    if (status != ExitStatus::kDone) {
+        Error(status, trouble);
+    }
+    return status;
 }
 
 ExitStatus Output::Finish(ExitStatus status) {

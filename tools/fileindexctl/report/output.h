@@ -10,8 +10,8 @@
 #pragma once
 
 #include "report/exit_status.h"
-
-#include <json/value.h>
+#include "report/json.h"
+#include "report/text.h"
 
 #include <string>
 #include <string_view>
@@ -33,6 +33,12 @@ public:
     /// One line of data for people, coloured when stdout is a terminal that can do it and the user did not forbid
     /// it; left out of JSON.
     void Line(const std::string &text, Colour colour = Colour::kPlain);
+
+    /// A table with a head, not wider than the terminal.
+    void Table(const Rows &rows);
+
+    /// Names and what stands for them, left whole.
+    void Facts(const Rows &rows);
 
     /// Has the lines so far shown, before a question. False when they cannot be written.
     bool Flush();
@@ -56,6 +62,9 @@ public:
     /// Why the command failed.
     void Error(ExitStatus status, const std::string &text);
 
+    /// The status to end with: unless it is kDone, says why.
+    ExitStatus Conclude(ExitStatus status, const std::string &trouble);
+
     /// Writes the document and makes sure that everything has left; the status to end with.
     ExitStatus Finish(ExitStatus status);
 
@@ -69,8 +78,5 @@ private:
     Json::Value data_;
     std::vector<std::string> warnings_;
 };
-
-/// A JSON array of texts.
-Json::Value ToArray(const std::vector<std::string> &items);
 
 }  // namespace VORK::FILEINDEXCTL

@@ -37,8 +37,7 @@ StepReport PauseUntil(long long resumeTime, const std::string &saved, Patience &
     Json::Value data(Json::objectValue);
     data["resume_time"] = static_cast<Json::Int64>(resumeTime);
     const bool told = VORK::FILEINDEX::SendCammandToDaemon("pause", data);
-    report.Add("daemon told", told ? StepResult::kDone : StepResult::kFailed,
-               told ? "" : "fileindexd cannot be reached");
+    report.Add("daemon told", told, "fileindexd cannot be reached");
     return report;
 }
 

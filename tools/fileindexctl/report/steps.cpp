@@ -170,6 +170,10 @@ void StepReport::Add(const std::string &name, StepResult result, const std::stri
     steps_.push_back({name, result, detail, record});
 }
 
+void StepReport::Add(const std::string &name, bool done, const std::string &trouble) {
+    Add(name, done ? StepResult::kDone : StepResult::kFailed, done ? "" : trouble);
+}
+
 void StepReport::Correct(const std::string &name, StepResult result, const std::string &detail) {
     for (auto &step : steps_) {
         if (step.name == name && step.result == StepResult::kDone) {

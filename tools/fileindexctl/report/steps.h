@@ -71,6 +71,9 @@ public:
     void Add(const std::string &name, StepResult result, const std::string &detail = std::string(),
              const std::string &record = std::string());
 
+    /// A step that the tool takes itself.
+    void Add(const std::string &name, bool done, const std::string &trouble);
+
     /// Changes the result of a step that Trace saw done; another stays.
     void Correct(const std::string &name, StepResult result, const std::string &detail = std::string());
 

@@ -49,7 +49,7 @@ std::string Escape(unsigned char byte) {
     return hex.data();
 }
 
-std::vector<unsigned> ColumnWidths(const std::vector<std::vector<std::string>> &rows) {
+std::vector<unsigned> ColumnWidths(const Rows &rows) {
     std::vector<unsigned> widths;
     for (const auto &row : rows) {
         widths.resize(std::max(widths.size(), row.size()));
@@ -140,7 +140,7 @@ std::string Enumerate(const std::vector<std::string> &items) {
     return result;
 }
 
-std::vector<std::string> Align(std::vector<std::vector<std::string>> rows, unsigned width) {
+std::vector<std::string> Align(Rows rows, unsigned width) {
     for (auto &row : rows) {
         std::transform(row.begin(), row.end(), row.begin(), Printable);
     }

@@ -20,8 +20,10 @@ std::string ShellWord(const std::string &text);
 /// "a, b and c".
 std::string Enumerate(const std::vector<std::string> &items);
 
+using Rows = std::vector<std::vector<std::string>>;
+
 /// Rows with their columns aligned. Cells are made printable. With a `width`, no row exceeds it: the widest
 /// columns are shortened, paths at the front and other texts at the end; 0 leaves everything whole.
-std::vector<std::string> Align(std::vector<std::vector<std::string>> rows, unsigned width);
+std::vector<std::string> Align(Rows rows, unsigned width);
 
 }  // namespace VORK::FILEINDEXCTL

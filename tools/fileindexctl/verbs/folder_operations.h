@@ -2,15 +2,12 @@
 /// The library's changes of the list of folders, step by step.
 #pragma once
 
-#include "facts/paths.h"
-#include "report/failure.h"
+#include "facts/patience.h"
 #include "report/steps.h"
+#include "verbs/verb.h"
 
-#include <json/value.h>
-
+#include <functional>
 #include <optional>
-#include <string>
-#include <vector>
 
 namespace VORK::FILEINDEXCTL {
 
@@ -22,32 +19,40 @@ std::optional<Failure> WhyNoFolder(const std::string &fullPath);
 void WarnOfObstacle(const std::string &path, const std::string &fullPath, Output &output);
 
 /// What a change does to the file-sharing service, which is restarted when search is switched on (by any folder
-/// that is saved while it is off) or off (by the removal of the last one): "the file-sharing service is restarted:
-/// ...". Empty when it does not.
+/// that is saved while it is off) or off (by the removal of the last one): "the file-sharing service will be
+/// restarted, because ...". Empty when it does not.
 std::string RestartWith(bool savesFolders, bool leavesNone);
 
 /// Says so on stderr, before it is done.
 void AnnounceRestart(const std::string &restart, Output &output);
 
+/// "1 folder is indexed": all that there are now, also as "total".
+void StateTotal(std::size_t total, Output &output);
+
 /// Adds or changes the folders of an array of records, all or none. Throws Failure when nothing was done.
 StepReport PerformUpsert(const Json::Value &records, Patience &patience);
 
-/// Folders to be removed.
-struct Removal {
-    std::vector<std::string> present{};  ///< on shares that are there
-    std::vector<std::string> away{};     ///< on shares that are not: their queues and monitors cannot be reached
+/// Puts the folders on shares that are away last, and gives the first of them: their queues and monitors cannot be
+/// reached.
+Paths::iterator FirstAway(Paths &paths);
 
-    bool Contains(const std::string &path) const;
-    void Add(const std::string &path);
-    std::vector<std::string> All() const;
-};
+/// The paths of the folders that are left.
+Paths Without(const Folders &folders, const Paths &removed);
 
-/// What the removal means, for a question; `folders` are those before it.
-std::string ConsequenceOf(const Removal &removal, const Folders &folders);
+/// The first steps of a removal that leaves no folder: it stops the service, and then nobody is told anything.
+std::vector<PlannedStep> StopPlan(const std::string &saved, const Mark &stop, const Mark &search,
+                                  const Mark &restart);
+
+/// Takes the steps of a change. Throws Failure when nothing was done.
+StepReport PerformPlan(const std::vector<PlannedStep> &plan, bool switchesSearchOn, Patience &patience,
+                       const std::function<bool()> &call);
+
+/// What the removal of these paths means, for a question; `folders` are those before it.
+std::string ConsequenceOf(const Paths &removed, const Folders &folders);
 
 /// Removes the folders; the names of steps that save begin with `saved`. Those on shares that are away come last,
-/// and only when everything before succeeded: `removed` says what was tried. Throws Failure when nothing was done.
-StepReport PerformRemoval(const std::string &saved, const Removal &removal, std::vector<std::string> &removed,
-                          Patience &patience);
+/// and only when everything before succeeded: `paths` becomes what was tried. Throws Failure when nothing was
+/// done.
+StepReport PerformRemoval(const std::string &saved, Paths &paths, Patience &patience);
 
 }  // namespace VORK::FILEINDEXCTL

@@ -1,15 +1,12 @@
-#include "command_line/handlers.h"
+// "metrics": the state as Prometheus reads it.
 #include "facts/configuration.h"
 #include "facts/daemon.h"
-#include "facts/paths.h"
 #include "facts/queue.h"
 #include "report/gaps.h"
-#include "report/text.h"
+#include "verbs/verb.h"
 
-#include <algorithm>
 #include <map>
 #include <utility>
-#include <vector>
 
 namespace VORK::FILEINDEXCTL {
 
@@ -18,61 +15,57 @@ namespace {
 using Labels = std::vector<std::pair<const char *, std::string>>;
 
 struct Metric {
-    const char *name;
+    std::string name;
     const char *help;
     std::vector<std::pair<Labels, long long>> samples{};
-
-    void Add(const Labels &labels, long long value) { samples.emplace_back(labels, value); }
 };
 
-// Points in time rather than ages, which would be wrong as soon as they are stored.
-struct Metrics {
-    Metric folders = {"fileindex_folders", "Indexed folders."};
-    Metric present = {"fileindex_share_present", "Whether the share is there (1) or away (0)."};
-    Metric noSpace = {"fileindex_share_no_space", "Whether the share is marked as out of space."};
-    Metric needReindex = {"fileindex_share_need_reindex", "Whether the share waits to be reindexed whole."};
-    Metric events = {"fileindex_queue_events", "Events that wait for fileindexd."};
-    Metric malformed = {"fileindex_queue_malformed_lines", "Lines of the queue that are no events."};
-    Metric taken = {"fileindex_queue_taken", "Whether an earlier queue, taken away, lies beside the queue."};
-    Metric oldest = {"fileindex_queue_oldest_timestamp_seconds",
-                     "When the oldest event was queued; time() minus this is its age."};
-    Metric paused = {"fileindex_paused", "Whether indexing is paused."};
-    Metric pauseEnd = {"fileindex_pause_end_timestamp_seconds", "When the pause ends, if it has an end."};
-    Metric daemon = {"fileindex_daemon_up", "Whether fileindexd accepts connections."};
-
-    std::vector<const Metric *> All() const {
-        return {&folders, &present, &noSpace, &needReindex, &events, &malformed,
-                &taken,   &oldest,  &paused,  &pauseEnd,    &daemon};
+class Metrics {
+public:
+    template <typename Value>
+    void Add(std::string_view name, const Labels &labels, Value value) {
+        const auto found =
+            std::find_if(list_.begin(), list_.end(), [&](const Metric &metric) { return metric.name == name; });
+        found->samples.emplace_back(labels, static_cast<long long>(value));
     }
+
+    const std::vector<Metric> &All() const { return list_; }
+
+private:
+    // Points in time rather than ages, which would be wrong as soon as they are stored.
+    std::vector<Metric> list_ = {
+        {"fileindex_folders", "Indexed folders."},
+        {"fileindex_share_present", "Whether the share is there (1) or away (0)."},
+        {"fileindex_share_no_space", "Whether the share is marked as out of space."},
+        {"fileindex_share_need_reindex", "Whether the share waits to be reindexed whole."},
+        {"fileindex_queue_events", "Events that wait for fileindexd."},
+        {"fileindex_queue_malformed_lines", "Lines of the queue that are no events."},
+        {"fileindex_queue_taken", "Whether an earlier queue, taken away, lies beside the queue."},
+        {"fileindex_queue_oldest_timestamp_seconds",
+         "When the oldest event was queued; time() minus this is its age."},
+        {"fileindex_paused", "Whether indexing is paused."},
+        {"fileindex_pause_end_timestamp_seconds", "When the pause ends, if it has an end."},
+        {"fileindex_daemon_up", "Whether fileindexd accepts connections."},
+    };
 };
-
-// Few values, whatever stands in a queue: each would be a time series of its own.
-const char *KindOf(unsigned type) {
-    switch (type) {
-        case kReindexEvent:
-            return "reindex";
-        case kSettingEvent:
-            return "settings";
-        case kRenameEvent:
-            return "rename";
-        default:
-            return "other";
-    }
-}
 
 void MeasureQueue(const std::string &share, const Backlog &backlog, Metrics &metrics) {
-    const Labels label = {{"share", share}};
-    std::map<std::string, long long> kinds = {{"reindex", 0}, {"settings", 0}, {"rename", 0}, {"other", 0}};
-    for (const auto &[type, count] : backlog.events) {
-        kinds[KindOf(type)] += static_cast<long long>(count);
+    // Few values, whatever stands in a queue: each would be a time series of its own.
+    std::map<std::string, unsigned long> kinds = {{"other", backlog.Total()}};
+    for (const unsigned type : {kReindexEvent, kSettingEvent, kRenameEvent}) {
+        const auto found = backlog.events.find(type);
+        const unsigned long count = found == backlog.events.end() ? 0 : found->second;
+        kinds[EventName(type)] = count;
+        kinds["other"] -= count;
     }
     for (const auto &[kind, count] : kinds) {
-        metrics.events.Add({{"share", share}, {"event", kind}}, count);
+        metrics.Add("fileindex_queue_events", {{"share", share}, {"event", kind}}, count);
     }
-    metrics.malformed.Add(label, static_cast<long long>(backlog.malformed));
-    metrics.taken.Add(label, backlog.hasTemporary ? 1 : 0);
+    const Labels label = {{"share", share}};
+    metrics.Add("fileindex_queue_malformed_lines", label, backlog.malformed);
+    metrics.Add("fileindex_queue_taken", label, backlog.hasTemporary);
     if (backlog.oldest) {
-        metrics.oldest.Add(label, *backlog.oldest);
+        metrics.Add("fileindex_queue_oldest_timestamp_seconds", label, *backlog.oldest);
     }
 }
 
@@ -87,7 +80,7 @@ void MeasureShare(const std::string &share, Metrics &metrics, Gaps &gaps) {
     } catch (const Failure &failure) {
         gaps.AddQueue(share, failure);
     }
-    metrics.present.Add({{"share", share}}, isPresent ? 1 : 0);
+    metrics.Add("fileindex_share_present", {{"share", share}}, isPresent);
 }
 
 Metrics Measure(Gaps &gaps) {
@@ -98,7 +91,7 @@ Metrics Measure(Gaps &gaps) {
         ++shares[ShareOf(folder.path)];
     }
     for (const auto &[share, count] : shares) {
-        metrics.folders.Add({{"share", share}}, count);
+        metrics.Add("fileindex_folders", {{"share", share}}, count);
         MeasureShare(share, metrics, gaps);
     }
     for (const auto *flagged : {&status.noSpace, &status.needReindex}) {
@@ -107,15 +100,15 @@ Metrics Measure(Gaps &gaps) {
         }
     }
     for (const auto &[share, count] : shares) {
-        metrics.noSpace.Add({{"share", share}}, static_cast<long long>(status.noSpace.count(share)));
-        metrics.needReindex.Add({{"share", share}}, static_cast<long long>(status.needReindex.count(share)));
+        metrics.Add("fileindex_share_no_space", {{"share", share}}, status.noSpace.count(share));
+        metrics.Add("fileindex_share_need_reindex", {{"share", share}}, status.needReindex.count(share));
     }
-    metrics.paused.Add({}, status.resumeTime >= 0 ? 1 : 0);
+    metrics.Add("fileindex_paused", {}, status.resumeTime >= 0);
     if (status.resumeTime > 0) {
-        metrics.pauseEnd.Add({}, status.resumeTime);
+        metrics.Add("fileindex_pause_end_timestamp_seconds", {}, status.resumeTime);
     }
     if (const auto listens = ProbeDaemon().listens) {
-        metrics.daemon.Add({}, *listens ? 1 : 0);
+        metrics.Add("fileindex_daemon_up", {}, *listens);
     }
     return metrics;
 }
@@ -135,33 +128,22 @@ std::string LabelText(const std::string &value) {
     return text;
 }
 
-std::string SampleText(const Metric &metric, const Labels &labels, long long value) {
-    std::string text;
-    for (const auto &[name, label] : labels) {
-        text += (text.empty() ? "{" : ",") + std::string(name) + "=\"" + LabelText(label) + "\"";
-    }
-    return metric.name + text + (text.empty() ? " " : "} ") + std::to_string(value);
-}
-
 void Show(const Metric &metric, Output &output) {
-    const std::string name = metric.name;
-    output.Line("# HELP " + name + " " + metric.help);
-    output.Line("# TYPE " + name + " gauge");
-    Json::Value entry(Json::objectValue);
-    entry["name"] = name;
-    entry["type"] = "gauge";
-    entry["help"] = metric.help;
+    output.Line("# HELP " + metric.name + " " + metric.help);
+    output.Line("# TYPE " + metric.name + " gauge");
+    Json::Value samples(Json::arrayValue);
     for (const auto &[labels, value] : metric.samples) {
-        output.Line(SampleText(metric, labels, value));
-        Json::Value sample(Json::objectValue);
-        sample["labels"] = Json::Value(Json::objectValue);
-        for (const auto &[label, text] : labels) {
-            sample["labels"][label] = text;
+        std::string text;
+        Json::Value object(Json::objectValue);
+        for (const auto &[name, label] : labels) {
+            text += (text.empty() ? "{" : ",") + std::string(name) + "=\"" + LabelText(label) + "\"";
+            object[name] = label;
         }
-        sample["value"] = static_cast<Json::Int64>(value);
-        entry["sample"].append(sample);
+        output.Line(metric.name + text + (text.empty() ? " " : "} ") + std::to_string(value));
+        samples.append(ToObject({{"labels", object}, {"value", ToNumber(value)}}));
     }
-    output.Data()["metric"].append(entry);
+    output.Data()["metric"].append(
+        ToObject({{"name", metric.name}, {"type", "gauge"}, {"help", metric.help}, {"sample", samples}}));
 }
 
 }  // namespace
@@ -169,9 +151,9 @@ void Show(const Metric &metric, Output &output) {
 ExitStatus ShowMetrics(const Arguments & /*arguments*/, Output &output) {
     Gaps gaps;
     const Metrics metrics = Measure(gaps);
-    for (const Metric *metric : metrics.All()) {
-        if (!metric->samples.empty()) {
-            Show(*metric, output);
+    for (const auto &metric : metrics.All()) {
+        if (!metric.samples.empty()) {
+            Show(metric, output);
         }
     }
     return gaps.Report(output);

@@ -1,23 +1,15 @@
-#include "command_line/handlers.h"
+// "migrate": everybody is told of everything again.
 #include "facts/daemon.h"
-#include "facts/paths.h"
 #include "facts/queue.h"
 #include "facts/queue_files.h"
 #include "facts/registrations.h"
 #include "report/confirm.h"
-#include "report/failure.h"
 #include "report/steps.h"
-#include "report/text.h"
+#include "verbs/verb.h"
 
-#include <fileindex/folders.h>
-#include <fileindex/index_mgr.h>
 #include <fileindex/updater.h>
 
 #include <vork/search.h>
-
-#include <set>
-#include <string>
-#include <vector>
 
 namespace VORK::FILEINDEXCTL {
 
@@ -42,10 +34,6 @@ std::vector<PlannedStep> Plan(const Folders &folders) {
     };
 }
 
-std::string Listed(const std::vector<std::string> &items) {
-    return items.empty() ? "none" : Enumerate(items);
-}
-
 // What holds afterwards, whatever the steps came to.
 void StateEffect(const Folders &folders, Output &output) {
     std::set<std::string> waiting;
@@ -56,7 +44,7 @@ void StateEffect(const Folders &folders, Output &output) {
             }
         });
     }
-    std::vector<std::string> queued;
+    Paths queued;
     for (const auto &folder : folders) {
         if (waiting.count(folder.GetFullPath()) > 0) {
             queued.push_back(folder.path);
@@ -67,20 +55,9 @@ void StateEffect(const Folders &folders, Output &output) {
     output.Data()["daemon"] = daemon.ForPrograms();
     output.Data()["search"] = search;
     output.Data()["queued"] = ToArray(queued);
-    for (const auto &line : Align({{"daemon", daemon.text},
-                                   {"search", search ? "on" : "off"},
-                                   {"queued to be reindexed", Listed(queued)}},
-                                  0)) {
-        output.Line(line);
-    }
-}
-
-void Resume(const std::set<std::string> &paused, StepReport &report) {
-    for (const auto &share : paused) {
-        const bool done = !report.Has(StepResult::kFailed) && VORK::FILEINDEX::IndexMgr::ShareResume(share);
-        report.Add("worker of " + share, done ? StepResult::kDone : StepResult::kFailed,
-                   done ? "" : "the share could not be resumed");
-    }
+    output.Facts({{"daemon", daemon.text},
+                  {"search", search ? "on" : "off"},
+                  {"queued to be reindexed", queued.empty() ? "none" : Enumerate(queued)}});
 }
 
 void StatePlan(const Folders &folders, const std::set<std::string> &paused, Output &output) {
@@ -99,40 +76,43 @@ void StatePlan(const Folders &folders, const std::set<std::string> &paused, Outp
     }
 }
 
+void AskForResumption(const Arguments &arguments, const std::set<std::string> &paused) {
+    if (paused.empty()) {
+        return;
+    }
+    const bool several = paused.size() > 1;
+    const std::string names = several ? "s " + Enumerate({paused.begin(), paused.end()}) + " are"
+                                      : " " + Quoted(*paused.begin()) + " is";
+    RequireConsent(arguments, "the share" + names + " paused (indexed, but not watched); this has " +
+                                  (several ? "them" : "it") + " watched again");
+}
+
 }  // namespace
 
 ExitStatus Migrate(const Arguments &arguments, Output &output) {
     const Folders folders = ReadFolders();
     output.Data()["dry_run"] = arguments.Has("--dry-run");
-    output.Data()["folders"] = Json::Value(Json::arrayValue);
-    for (const auto &folder : folders) {
-        output.Data()["folders"].append(folder.path);
-    }
+    output.Data()["folders"] = ToArray(folders, &Folder::path);
     const auto paused = PausedShares(SharesOf(folders));
-    output.Data()["paused_shares"] = ToArray({paused.begin(), paused.end()});
+    output.Data()["paused_shares"] = ToArray(paused);
     if (arguments.Has("--dry-run")) {
         StatePlan(folders, paused, output);
         output.Note("nothing was done");
         return ExitStatus::kDone;
     }
-    if (!paused.empty()) {
-        const bool several = paused.size() > 1;
-        const std::string names = several ? "s " + Enumerate({paused.begin(), paused.end()}) + " are"
-                                          : " " + Quoted(*paused.begin()) + " is";
-        RequireConsent(arguments, "the share" + names + " paused (indexed, but not watched); this has " +
-                                      (several ? "them" : "it") + " watched again");
-    }
+    AskForResumption(arguments, paused);
     RequireMayChange();
-    StepReport report = StepReport::Perform(Plan(folders), VORK::FILEINDEX::Folders(),
-                                            [] { return VORK::FILEINDEX::Updater_zol60_beta2(); });
+    StepReport report =
+        StepReport::Perform(Plan(folders), FILEINDEX::Folders(), [] { return FILEINDEX::Updater_zol60_beta2(); });
     MarkDroppedEvents(report);
-    Resume(paused, report);
+    for (const auto &share : paused) {
+        const bool done = !report.Has(StepResult::kFailed) && IndexMgr::ShareResume(share);
+        report.Add("worker of " + share, done, "the share could not be resumed");
+    }
     report.Show(output);
     StateEffect(folders, output);
-    if (report.Status() != ExitStatus::kDone) {
-        output.Error(report.Status(), "this is not done whole; once the cause is mended, repeat the command");
-    }
-    return report.Status();
+    return output.Conclude(report.Status(),
+                           "this is not done whole; once the cause is mended, repeat the command");
 }
 
 }  // namespace VORK::FILEINDEXCTL

@@ -1,26 +1,18 @@
-#include "command_line/handlers.h"
+// "monitor": what the notification daemon watches, and what it should.
 #include "facts/config_lock.h"
-#include "facts/paths.h"
 #include "facts/queue_files.h"
 #include "facts/records.h"
 #include "facts/registrations.h"
-#include "report/failure.h"
 #include "report/steps.h"
-#include "report/text.h"
-
-#include <fileindex/folders.h>
-#include <fileindex/index_mgr.h>
+#include "verbs/verb.h"
 
 #include <vorknotifyd/monitor_queue.h>
 
-#include <algorithm>
 #include <filesystem>
 
 namespace VORK::FILEINDEXCTL {
 
 namespace {
-
-using VORK::FILEINDEX::IndexMgr;
 
 // What is registered under one queue and what should be.
 struct Queue {
@@ -46,16 +38,14 @@ std::string ShareOfQueue(const std::string &path) {
 Queues ReadQueues(const std::string &only) {
     Queues queues;
     const Folders folders = ReadFolders();
-    const auto shares = SharesOf(folders);
-    const auto paused = PausedShares(shares);
-    for (const auto &share : shares) {
-        const std::string path = QueuePathOf(share);
-        queues[path.empty() ? share : path] = {share, {}, {}, path.empty(), paused.count(share) > 0};
-    }
+    const auto paused = PausedShares(SharesOf(folders));
     for (const auto &folder : folders) {
-        const std::string path = QueuePathOf(ShareOf(folder.path));
-        if (!path.empty()) {
-            queues[path].expected.insert(ExpectedWatch(folder.GetFullPath()));
+        const std::string share = ShareOf(folder.path);
+        const std::string path = QueuePathOf(share);
+        const Queue empty{share, {}, {}, path.empty(), paused.count(share) > 0};
+        Queue &queue = queues.try_emplace(path.empty() ? share : path, empty).first->second;
+        if (!queue.isAway) {
+            queue.expected.insert(ExpectedWatch(folder.GetFullPath()));
         }
     }
     for (const auto &[path, watches] : ReadRegistrations()) {
@@ -71,49 +61,35 @@ Queues ReadQueues(const std::string &only) {
     return queues;
 }
 
-struct Row {
-    std::string path;
-    const char *state;
-};
-
-std::vector<Row> Compare(const Queue &queue) {
-    std::vector<Row> rows;
-    for (const auto &[path, how] : queue.expected) {
-        const auto found = queue.registered.find(path);
-        rows.push_back({path, queue.isPaused                    ? "paused"
-                              : found == queue.registered.end() ? "missing"
-                              : found->second == how            ? "watched"
-                                                                : "different"});
-    }
-    for (const auto &[path, how] : queue.registered) {
-        if (queue.expected.find(path) == queue.expected.end()) {
-            rows.push_back({path, queue.isAway ? "share away" : "not indexed"});
-        }
-    }
-    return rows;
-}
-
-void Add(const Queue &queue, const std::string &path, std::vector<std::vector<std::string>> &rows,
-         Output &output) {
-    Json::Value entry(Json::objectValue);
-    entry["share"] = queue.share;
-    entry["queue"] = queue.isAway ? Json::Value() : Json::Value(path);
-    entry["in_step"] = queue.IsInStep() && !queue.isAway;
-    entry["watch"] = Json::Value(Json::arrayValue);
-    for (const auto &row : Compare(queue)) {
-        rows.push_back({row.path, queue.share, row.state});
-        Json::Value watch(Json::objectValue);
-        watch["path"] = row.path;
-        watch["state"] = row.state;
-        entry["watch"].append(watch);
-    }
-    output.Data()["monitor"].append(entry);
-}
-
-void RequireKnown(const Arguments &arguments, const Queues &queues) {
+// Those of the share that was asked for, or all.
+Queues RequireQueues(const Arguments &arguments) {
+    Queues queues = ReadQueues(arguments.One("SHARE"));
     if (arguments.Has("SHARE") && queues.empty()) {
         RequireShare(arguments.One("SHARE"));
     }
+    return queues;
+}
+
+// For programs; a row of the table for each watch.
+Json::Value WatchesOf(const Queue &queue, Rows &rows) {
+    Json::Value watches(Json::arrayValue);
+    const auto add = [&](const std::string &path, const char *state) {
+        rows.push_back({path, queue.share, state});
+        watches.append(ToObject({{"path", path}, {"state", state}}));
+    };
+    for (const auto &[path, how] : queue.expected) {
+        const auto found = queue.registered.find(path);
+        add(path, queue.isPaused                    ? "paused"
+                  : found == queue.registered.end() ? "missing"
+                  : found->second == how            ? "watched"
+                                                    : "different");
+    }
+    for (const auto &[path, how] : queue.registered) {
+        if (queue.expected.count(path) == 0) {
+            add(path, queue.isAway ? "share away" : "not indexed");
+        }
+    }
+    return watches;
 }
 
 // Without folders nothing is to be watched, and the registration is withdrawn; of a share that is gone, too.
@@ -127,8 +103,27 @@ bool Refresh(const std::string &path, const Queue &queue) {
     return VORKNOTIFYD::MonitorQueue::Delete(path, kRegistration, VORKNOTIFYD::MONITOR_QUEUE_TYPE_FILE);
 }
 
-void State(const Queues &queues, std::vector<std::vector<std::string>> rows, Output &output) {
-    output.Data()["monitor"] = Json::Value(Json::arrayValue);
+void RefreshOne(const std::string &path, const Queue &queue, bool isAskedFor, StepReport &report) {
+    const std::string name = "monitor of " + queue.share;
+    if (queue.isAway) {
+        report.Add(name, StepResult::kSkipped, "the share is away");
+        return;
+    }
+    if (queue.isPaused && !isAskedFor) {
+        report.Add(name, StepResult::kSkipped, "the share is paused");
+        return;
+    }
+    ForgetErrors();
+    const bool done = Refresh(path, queue);
+    report.Add(name, done, Records().Last());
+    if (queue.IsInStep()) {
+        report.Correct(name, StepResult::kAlready);
+    }
+}
+
+void State(const Queues &queues, Output &output) {
+    Rows rows = {{"FULL PATH", "SHARE", "STATE"}};
+    auto &list = output.Data()["monitor"] = Json::Value(Json::arrayValue);
     for (const auto &[path, queue] : queues) {
         if (queue.isAway) {
             output.Warn("the share \"" + queue.share + "\" is away, so its folders cannot be watched");
@@ -136,23 +131,23 @@ void State(const Queues &queues, std::vector<std::vector<std::string>> rows, Out
         if (queue.isPaused) {
             output.Note(PausedText(queue.share));
         }
-        Add(queue, path, rows, output);
+        list.append(ToObject({{"share", queue.share},
+                              {"queue", queue.isAway ? Json::Value() : Json::Value(path)},
+                              {"in_step", queue.IsInStep() && !queue.isAway},
+                              {"watch", WatchesOf(queue, rows)}}));
     }
     if (rows.size() == 1) {
         output.Note("nothing is watched, and nothing should be");
         return;
     }
-    for (const auto &line : Align(rows, output.Width())) {
-        output.Line(line);
-    }
+    output.Table(rows);
 }
 
 }  // namespace
 
 ExitStatus ShowMonitor(const Arguments &arguments, Output &output) {
-    const Queues queues = ReadQueues(arguments.One("SHARE"));
-    RequireKnown(arguments, queues);
-    State(queues, {{"FULL PATH", "SHARE", "STATE"}}, output);
+    const Queues queues = RequireQueues(arguments);
+    State(queues, output);
     const auto isInStep = [](const auto &entry) { return entry.second.IsInStep(); };
     const auto isAsWanted = [](const auto &entry) { return entry.second.IsInStep() || entry.second.isPaused; };
     output.Data()["in_step"] = std::all_of(queues.begin(), queues.end(), isInStep);
@@ -164,40 +159,20 @@ ExitStatus ShowMonitor(const Arguments &arguments, Output &output) {
 
 ExitStatus RefreshMonitors(const Arguments &arguments, Output &output) {
     Patience patience(arguments);
-    VORK::FILEINDEX::Folders store;
+    FILEINDEX::Folders store;
     ForgetErrors();
     const ConfigLock lock(store, patience);  // so that no newer registration is replaced by an older one
     if (!lock.IsHeld()) {
         throw FailureOf(store);
     }
-    const Queues queues = ReadQueues(arguments.One("SHARE"));
-    RequireKnown(arguments, queues);
     StepReport report;
-    for (const auto &[path, queue] : queues) {
-        const std::string name = "monitor of " + queue.share;
-        if (queue.isAway) {
-            report.Add(name, StepResult::kSkipped, "the share is away");
-            continue;
-        }
-        if (queue.isPaused && !arguments.Has("SHARE")) {
-            report.Add(name, StepResult::kSkipped, "the share is paused");
-            continue;
-        }
-        ForgetErrors();
-        const bool done = Refresh(path, queue);
-        report.Add(name,
-                   !done              ? StepResult::kFailed
-                   : queue.IsInStep() ? StepResult::kAlready
-                                      : StepResult::kDone,
-                   done ? "" : Records().Last());
+    for (const auto &[path, queue] : RequireQueues(arguments)) {
+        RefreshOne(path, queue, arguments.Has("SHARE"), report);
     }
     report.Show(output);
-    State(ReadQueues(arguments.One("SHARE")), {{"FULL PATH", "SHARE", "STATE"}}, output);
-    if (report.Status() != ExitStatus::kDone) {
-        output.Error(report.Status(),
-                     "not everything is registered; once the cause is mended, repeat the command");
-    }
-    return report.Status();
+    State(ReadQueues(arguments.One("SHARE")), output);
+    return output.Conclude(report.Status(),
+                           "not everything is registered; once the cause is mended, repeat the command");
 }
 
 }  // namespace VORK::FILEINDEXCTL

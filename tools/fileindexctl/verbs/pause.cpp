@@ -1,13 +1,8 @@
-#include "command_line/handlers.h"
-#include "report/failure.h"
+// "pause" and "resume".
 #include "report/schedule.h"
-#include "report/text.h"
+#include "verbs/verb.h"
 
-#include <fileindex/status_mgr.h>
-
-#include <algorithm>
 #include <ctime>
-#include <string>
 
 namespace VORK::FILEINDEXCTL {
 
@@ -73,15 +68,12 @@ long long ParseUntil(const std::string &text) {
 ExitStatus Report(const StepReport &report, Output &output) {
     report.Show(output);
     long long resumeTime = kNotPaused;
-    if (VORK::FILEINDEX::StatusMgr::GetPauseInfo(resumeTime)) {
-        output.Data()["resume_time"] = static_cast<Json::Int64>(resumeTime);
+    if (StatusMgr::GetPauseInfo(resumeTime)) {
+        output.Data()["resume_time"] = ToNumber(resumeTime);
         output.Line(PauseText(resumeTime));
     }
-    if (report.Status() != ExitStatus::kDone) {
-        output.Error(report.Status(),
-                     "this is saved, but fileindexd does not know; once it runs, repeat the command");
-    }
-    return report.Status();
+    return output.Conclude(report.Status(),
+                           "this is saved, but fileindexd does not know; once it runs, repeat the command");
 }
 
 }  // namespace

@@ -1,28 +1,19 @@
 // "pause --run": indexing stands still while a command runs.
-#include "command_line/handlers.h"
-#include "report/failure.h"
 #include "report/schedule.h"
-#include "report/text.h"
-
-#include <fileindex/status_mgr.h>
+#include "verbs/verb.h"
 
 #include <spawn.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <cerrno>
 #include <chrono>
 #include <csignal>
 #include <cstring>
-#include <optional>
-#include <vector>
 
 namespace VORK::FILEINDEXCTL {
 
 namespace {
-
-using VORK::FILEINDEX::StatusMgr;
 
 // Other programs hold a lock for moments, and a pause that is left behind is worse than a wait.
 constexpr std::chrono::seconds kLeastPatience(10);
@@ -69,12 +60,9 @@ private:
 
 // An exit status as a shell gives it.
 int Run(const std::vector<std::string> &command, const HeldSignals &signals, Output &output) {
-    std::vector<char *> arguments;
-    arguments.reserve(command.size() + 1);
-    for (const auto &word : command) {
-        arguments.push_back(const_cast<char *>(word.c_str()));
-    }
-    arguments.push_back(nullptr);
+    std::vector<char *> arguments(command.size() + 1);  // the last one stays null
+    std::transform(command.begin(), command.end(), arguments.begin(),
+                   [](const std::string &word) { return const_cast<char *>(word.c_str()); });
     posix_spawnattr_t attributes;
     posix_spawn_file_actions_t actions;
     posix_spawnattr_init(&attributes);
@@ -89,42 +77,28 @@ int Run(const std::vector<std::string> &command, const HeldSignals &signals, Out
     posix_spawn_file_actions_destroy(&actions);
     posix_spawnattr_destroy(&attributes);
     if (error != 0) {
-        output.Error(static_cast<ExitStatus>(error == ENOENT ? kNotFound : kCannotRun),
-                     command.front() + " cannot be run: " + std::strerror(error));
-        return error == ENOENT ? kNotFound : kCannotRun;
+        const int result = error == ENOENT ? kNotFound : kCannotRun;
+        output.Error(static_cast<ExitStatus>(result), command.front() + " cannot be run: " + std::strerror(error));
+        return result;
     }
     const int status = signals.Await(process);
     return WIFEXITED(status) ? WEXITSTATUS(status) : kSignalled + WTERMSIG(status);
 }
 
-// What is to hold afterwards; nothing when somebody has changed the pause meanwhile, or it was without an end
-// before.
-std::optional<long long> WhatToRestore(long long before) {
+// Nothing is to be done when somebody has changed the pause meanwhile, or it was without an end before.
+ExitStatus Restore(long long before, Patience patience, Output &output) try {
     long long now = kNotPaused;
     if (!StatusMgr::GetPauseInfo(now) || now != kWithoutEnd || before == kWithoutEnd) {
-        return std::nullopt;
-    }
-    return IsPaused(before) ? before : kNotPaused;
-}
-
-ExitStatus Restore(long long before, Patience patience, Output &output) {
-    try {
-        if (const auto resumeTime = WhatToRestore(before)) {
-            const StepReport report = SetPause(*resumeTime, "end saved", patience);
-            report.Note(output);
-            if (report.Status() != ExitStatus::kDone) {
-                output.Error(report.Status(),
-                             "the end of the pause is saved, but fileindexd does not know; once "
-                             "it runs: \"fileindexctl resume\"");
-            }
-            return report.Status();
-        }
         return ExitStatus::kDone;
-    } catch (const Failure &failure) {
-        output.Error(failure.Status(),
-                     std::string(failure.what()) + "; indexing is still paused, \"fileindexctl resume\" goes on");
-        return failure.Status();
     }
+    const StepReport report = SetPause(IsPaused(before) ? before : kNotPaused, "end saved", patience);
+    report.Note(output);
+    return output.Conclude(report.Status(),
+                           "the end of the pause is saved, but fileindexd does not know; once it runs: "
+                           "\"fileindexctl resume\"");
+} catch (const Failure &failure) {
+    return output.Conclude(failure.Status(), std::string(failure.what()) +
+                                                 "; indexing is still paused, \"fileindexctl resume\" goes on");
 }
 
 }  // namespace
@@ -143,7 +117,7 @@ ExitStatus PauseWhile(const std::vector<std::string> &command, Patience patience
                      "the command ended with exit status " + std::to_string(result));
     }
     if (StatusMgr::GetPauseInfo(resumeTime)) {
-        output.Data()["resume_time"] = static_cast<Json::Int64>(resumeTime);
+        output.Data()["resume_time"] = ToNumber(resumeTime);
         output.Note(PauseText(resumeTime));
     }
     return result != 0 ? static_cast<ExitStatus>(result) : restored;

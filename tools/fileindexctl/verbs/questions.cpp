@@ -1,13 +1,9 @@
-#include "command_line/handlers.h"
+// "check", "contains" and "governs".
 #include "facts/kinds.h"
-#include "facts/paths.h"
 #include "facts/rules.h"
-#include "report/failure.h"
 #include "report/folder_text.h"
-#include "report/text.h"
+#include "verbs/verb.h"
 
-#include <fileindex/folders.h>
-#include <fileindex/index_mgr.h>
 #include <fileindex/paths.h>
 
 #include <cerrno>
@@ -15,12 +11,6 @@
 namespace VORK::FILEINDEXCTL {
 
 namespace {
-
-using VORK::FILEINDEX::IndexMgr;
-
-ExitStatus Answer(bool yes) {
-    return yes ? ExitStatus::kDone : ExitStatus::kNo;
-}
 
 // Every answer says which kind of path the question was taken to be about.
 Place Asked(const Arguments &arguments, const Folders &folders, Output &output) {
@@ -33,8 +23,9 @@ Place Asked(const Arguments &arguments, const Folders &folders, Output &output) 
     return place;
 }
 
-void Say(const Place &place, const std::string &answer, Output &output) {
-    output.Line(Printable((place.path.empty() ? "/" : place.path) + ": " + answer + " (" + place.TakenAs() + ")"));
+ExitStatus Answer(bool yes, const std::string &answer, const Place &place, Output &output) {
+    output.Line((place.path.empty() ? "/" : place.path) + ": " + answer + " (" + place.TakenAs() + ")");
+    return yes ? ExitStatus::kDone : ExitStatus::kNo;
 }
 
 // Why the path is not in the index; empty when it is.
@@ -44,7 +35,7 @@ std::string Obstacle(const Place &place, const Json::Value &record, std::string 
     }
     const std::string folder = record["path"].asString();
     std::string fullPath;
-    VORK::FILEINDEX::GetFullPath(fullPath, folder);
+    FILEINDEX::GetFullPath(fullPath, folder);
     if (const auto found = FirstUnreachable(place.fullPath); found && found->error == EACCES) {
         throw Denied(found->part);
     }
@@ -62,19 +53,19 @@ std::string Obstacle(const Place &place, const Json::Value &record, std::string 
 ExitStatus CheckPath(const Arguments &arguments, Output &output) {
     const Folders folders = ReadFolders();
     const Place place = Asked(arguments, folders, output);
-    const Json::Value record = VORK::FILEINDEX::GetMostSuitableCfg(folders, place.fullPath);
+    const Json::Value record = FILEINDEX::GetMostSuitableCfg(folders, place.fullPath);
     std::string kind;
     const std::string obstacle = Obstacle(place, record, kind);
+    const bool indexed = obstacle.empty();
     auto &data = output.Data();
-    data["indexed"] = obstacle.empty();
-    data["reason"] = obstacle.empty() ? Json::Value() : Json::Value(obstacle);
-    data["kind"] = kind.empty() ? Json::Value() : Json::Value(kind);
+    data["indexed"] = indexed;
+    data["reason"] = OrNull(obstacle);
+    data["kind"] = OrNull(kind);
     data["covered_by"] = ToArray(Covering(AsFullPath(place), folders));
     const std::string how = kind.empty() ? "" : kind == kOtherKind ? " by its name" : " as " + kind;
-    Say(place,
-        obstacle.empty() ? "indexed" + how + " with " + record["path"].asString() : "not indexed: " + obstacle,
-        output);
-    return Answer(obstacle.empty());
+    return Answer(indexed,
+                  indexed ? "indexed" + how + " with " + record["path"].asString() : "not indexed: " + obstacle,
+                  place, output);
 }
 
 ExitStatus ContainsFolder(const Arguments &arguments, Output &output) {
@@ -84,8 +75,7 @@ ExitStatus ContainsFolder(const Arguments &arguments, Output &output) {
     const bool any = place.isFull ? !contained.empty() : IndexMgr::IsPathContainIndexed(place.path, folders);
     output.Data()["contains"] = any;
     output.Data()["folders"] = ToArray(contained);
-    Say(place, any ? "contains " + Enumerate(contained) : "contains no indexed folder", output);
-    return Answer(any);
+    return Answer(any, any ? "contains " + Enumerate(contained) : "contains no indexed folder", place, output);
 }
 
 ExitStatus GoverningFolder(const Arguments &arguments, Output &output) {
@@ -97,24 +87,25 @@ ExitStatus GoverningFolder(const Arguments &arguments, Output &output) {
         RequireShare(ShareOf(place.path));
     }
     const auto covering = Covering(place, folders);
-    const Json::Value record = VORK::FILEINDEX::GetMostSuitableCfg(folders, place.fullPath);
+    const Json::Value record = FILEINDEX::GetMostSuitableCfg(folders, place.fullPath);
     const bool governed = !record.empty();
-    output.Data()["covered"] = covered;
-    output.Data()["covered_by"] = ToArray(covering);
-    output.Data()["governed"] = governed;
-    output.Data()["folder"] = governed ? record : Json::Value();
+    auto &data = output.Data();
+    data["covered"] = covered;
+    data["covered_by"] = ToArray(covering);
+    data["governed"] = governed;
+    data["folder"] = governed ? record : Json::Value();
     const auto alsoCovering = Covering(AsFullPath(place), folders);
     if (!covered && !alsoCovering.empty()) {
         output.Warn("as a full path, \"" + place.fullPath + "\" lies in " + Enumerate(alsoCovering) +
                     ": one share is inside another");
     }
-    const std::string cover = covered ? "covered by " + Enumerate(covering) : "covered by no indexed folder";
-    Say(place,
-        governed  ? cover + ", governed by " + record["path"].asString() + ": " + MediaText(record)
-        : covered ? cover + ", whose share is away"
-                  : cover,
-        output);
-    return Answer(governed || covered);
+    std::string answer = "covered by " + (covered ? Enumerate(covering) : "no indexed folder");
+    if (governed) {
+        answer += ", governed by " + record["path"].asString() + ": " + MediaText(record);
+    } else if (covered) {
+        answer += ", whose share is away";
+    }
+    return Answer(governed || covered, answer, place, output);
 }
 
 }  // namespace VORK::FILEINDEXCTL

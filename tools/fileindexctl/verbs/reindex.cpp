@@ -1,34 +1,40 @@
-#include "command_line/handlers.h"
-#include "facts/paths.h"
+// "reindex" and "revive": what has the daemon start again.
+#include "facts/patience.h"
 #include "facts/queue.h"
 #include "facts/rules.h"
 #include "facts/status_file.h"
-#include "report/failure.h"
 #include "report/steps.h"
-#include "report/text.h"
+#include "verbs/verb.h"
 
 #include <fileindex/fileidx.h>
-#include <fileindex/folders.h>
-#include <fileindex/index_mgr.h>
 #include <fileindex/indexability.h>
-#include <fileindex/status.h>
-#include <fileindex/status_mgr.h>
 
-#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <iterator>
-#include <set>
 
 namespace VORK::FILEINDEXCTL {
 
 namespace {
 
-using VORK::FILEINDEX::IndexMgr;
-using VORK::FILEINDEX::StatusMgr;
+using Places = std::vector<Place>;
 
-std::vector<Place> Requested(const Arguments &arguments, const Folders &folders, Output &output) {
-    std::vector<Place> places;
+const Mark kQueueLocked = {records::kEventDropped};
+
+void WarnOfPlace(const Place &place, const Folders &folders, Output &output) {
+    if (const auto found = FirstUnreachable(place.fullPath);
+        found && (found->error == ENOENT || found->error == ENOTDIR)) {
+        output.Warn(Quoted(found->part) + " does not exist");
+    }
+    if (Covering(AsFullPath(place), folders).empty()) {
+        const auto inside = Contained(AsFullPath(place), folders);
+        output.Warn(Quoted(place.path) + " lies in no indexed folder" +
+                    (inside.empty() ? "" : ", but holds " + Enumerate(inside)));
+    }
+}
+
+Places Requested(const Arguments &arguments, const Folders &folders, Output &output) {
+    Places places;
     for (const auto &given : arguments.All("PATH")) {
         const Place place = RequirePlain(given, folders);
         const std::string share = ShareOf(place.path);
@@ -40,96 +46,81 @@ std::vector<Place> Requested(const Arguments &arguments, const Folders &folders,
             output.Warn("\"" + place.path + "\" is given twice");
             continue;
         }
-        if (const auto found = FirstUnreachable(place.fullPath);
-            found && (found->error == ENOENT || found->error == ENOTDIR)) {
-            output.Warn(Quoted(found->part) + " does not exist");
-        }
-        if (Covering(AsFullPath(place), folders).empty()) {
-            const auto inside = Contained(AsFullPath(place), folders);
-            output.Warn(Quoted(place.path) + " lies in no indexed folder" +
-                        (inside.empty() ? "" : ", but holds " + Enumerate(inside)));
-        }
+        WarnOfPlace(place, folders, output);
         places.push_back(place);
     }
     return places;
 }
 
-std::vector<PlannedStep> Plan(const std::vector<Place> &places) {
+std::vector<PlannedStep> Plan(const Places &places) {
     std::set<std::string> full;
     std::set<std::string> shares;
     for (const auto &place : places) {
-        shares.insert(ShareOf(place.path));
-        if (StatusMgr::ShareIsNoSpace(ShareOf(place.path))) {
-            full.insert(ShareOf(place.path));
+        const std::string share = ShareOf(place.path);
+        shares.insert(share);
+        if (StatusMgr::ShareIsNoSpace(share)) {
+            full.insert(share);
         }
     }
     std::vector<PlannedStep> plan;
-    plan.reserve(full.size() + 1);
     for (const auto &share : full) {
         plan.push_back({share + " revived",
                         "the share stays marked as out of space, or fileindexd cannot be reached",
                         {},
                         {{records::kReindexRevive, "share=" + share}}});
     }
-    plan.push_back({"events queued",
-                    "an event could not be queued",
-                    {{records::kReindexPath}, {records::kReindexEvent}},
-                    {},
-                    Evidence::kNone,
-                    shares});
+    const std::vector<Mark> fatal = {{records::kReindexPath}, {records::kReindexEvent}};
+    plan.push_back({"events queued", "an event could not be queued", fatal, {}, Evidence::kNone, shares});
     return plan;
+}
+
+bool IsQueued(const Place &place) {
+    return IsReindexQueued(ShareOf(place.path), place.fullPath);
 }
 
 // Success of the library also covers an event that was dropped, so the queues are read again. What is neither
 // there nor dropped was there and is not any more; who took it, and what became of it, nobody tells.
-bool StateQueued(const std::vector<Place> &places, const StepReport &report, Output &output) {
-    bool any = false;
-    const bool lost = report.Has(StepResult::kFailed);
+bool StateQueued(const Places &places, bool lost, Output &output) {
+    bool any = !lost;
     for (const auto &place : places) {
-        const bool queued = IsReindexQueued(ShareOf(place.path), place.fullPath);
-        const bool gone = !queued && !lost;
-        any = any || queued || gone;
-        Json::Value entry(Json::objectValue);
-        entry["path"] = place.path;
-        entry["state"] = queued ? "queued" : gone ? "not_waiting" : "not_queued";
-        output.Data()["reindex"].append(entry);
-        output.Line(Printable(place.path) + (queued ? " waits in the queue to be reindexed"
-                                             : gone ? " was queued, and no longer waits in the queue"
-                                                    : " is not queued"));
+        const bool queued = IsQueued(place);
+        any = any || queued;
+        output.Data()["reindex"].append(ToObject({{"path", place.path},
+                                                  {"state", queued ? "queued"
+                                                            : lost ? "not_queued"
+                                                                   : "not_waiting"}}));
+        output.Line(place.path + (queued ? " waits in the queue to be reindexed"
+                                  : lost ? " is not queued"
+                                         : " was queued, and no longer waits in the queue"));
     }
     return any;
 }
 
-StepReport PerformReindex(const std::vector<Place> &places) {
-    Json::Value request(Json::arrayValue);
-    for (const auto &place : places) {
-        request.append(place.path);
-    }
+StepReport PerformReindex(const Places &places) {
     const std::vector<PlannedStep> plan = Plan(places);
     ForgetErrors();
-    StepReport report = StepReport::Trace(plan, IndexMgr::Reindex(request));
+    StepReport report = StepReport::Trace(plan, IndexMgr::Reindex(ToArray(places, &Place::path)));
     MarkDroppedEvents(report);
     return report;
 }
 
 // The places whose events were dropped because a queue stayed locked. None when it cannot be told, since the
 // daemon has taken others meanwhile.
-std::vector<Place> Dropped(const std::vector<Place> &places) {
-    const std::size_t count = Records().Count({records::kEventDropped});
+Places Dropped(const Places &places) {
+    const std::size_t count = Records().Count(kQueueLocked);
     if (count == 0) {
         return {};
     }
-    std::vector<Place> dropped;
-    std::copy_if(places.begin(), places.end(), std::back_inserter(dropped),
-                 [](const Place &place) { return !IsReindexQueued(ShareOf(place.path), place.fullPath); });
-    return dropped.size() == count ? dropped : std::vector<Place>();
+    Places dropped;
+    std::remove_copy_if(places.begin(), places.end(), std::back_inserter(dropped), IsQueued);
+    return dropped.size() == count ? dropped : Places();
 }
 
-Failure WhyNotQueued(const std::vector<Place> &places, bool anyQueued) {
+Failure WhyNotQueued(const Places &places, bool anyQueued) {
     if (anyQueued) {
         return {ExitStatus::kPartly, "not everything is queued; the system log says why"};
     }
-    if (Records().Find({records::kEventDropped}) != nullptr) {
+    if (Records().Find(kQueueLocked) != nullptr) {
         return {ExitStatus::kBusy, "the queue is locked by another program; try again"};
     }
     std::array<char, 4096> queue{};
@@ -137,11 +128,6 @@ Failure WhyNotQueued(const std::vector<Place> &places, bool anyQueued) {
     const std::string path = queue.data();
     return MayNotWrite(path) ? Denied(path) : Failure(ExitStatus::kCannotSave, path + " cannot be written");
 }
-
-struct Revival {
-    ExitStatus status;
-    std::string trouble;
-};
 
 // The library does not say what it found wrong with the marks.
 void RequireMarks() {
@@ -157,19 +143,22 @@ void RequireMarks() {
     }
 }
 
-Revival ReviveOne(const std::string &share, Patience &patience, StepReport &all) {
-    if (!VORK::FILEINDEX::IsShareSpaceEnough(share)) {
-        return {ExitStatus::kCannotSave, "the share \"" + share + "\" still has no room for index data (10 MiB)"};
+ExitStatus ReviveOne(const std::string &share, Patience &patience, StepReport &all, Output &output) try {
+    if (!FILEINDEX::IsShareSpaceEnough(share)) {
+        return output.Conclude(ExitStatus::kCannotSave,
+                               "the share \"" + share + "\" still has no room for index data (10 MiB)");
     }
     const std::vector<PlannedStep> plan = {
         SaveStep("saved for " + share),
         {"daemon told of " + share, "fileindexd cannot be reached", {{records::kReviveSend}}},
     };
-    const StepReport report = StepReport::Perform(plan, VORK::FILEINDEX::Status(), patience,
-                                                  [&] { return StatusMgr::ShareRevive(share); });
+    const StepReport report =
+        StepReport::Perform(plan, FILEINDEX::Status(), patience, [&] { return StatusMgr::ShareRevive(share); });
     all.Append(report);
-    return {report.Status(),
-            "fileindexd does not know of the share \"" + share + "\"; once it runs, repeat the command"};
+    return output.Conclude(report.Status(), "fileindexd does not know of the share \"" + share +
+                                                "\"; once it runs, repeat the command");
+} catch (const Failure &failure) {
+    return output.Conclude(failure.Status(), failure.what());
 }
 
 }  // namespace
@@ -177,50 +166,41 @@ Revival ReviveOne(const std::string &share, Patience &patience, StepReport &all)
 ExitStatus ReindexPaths(const Arguments &arguments, Output &output) {
     Patience patience(arguments);
     const Folders folders = ReadFolders();
-    const std::vector<Place> places = Requested(arguments, folders, output);
+    const Places places = Requested(arguments, folders, output);
     RequireMayChange();
     StepReport report = PerformReindex(places);
     for (auto left = Dropped(places); !left.empty() && patience.Again(); left = Dropped(left)) {
         report = PerformReindex(left);
     }
     report.Show(output);
-    const bool anyQueued = StateQueued(places, report, output);
-    if (!report.Has(StepResult::kFailed)) {
-        return ExitStatus::kDone;
+    const bool lost = report.Has(StepResult::kFailed);
+    const bool anyQueued = StateQueued(places, lost, output);
+    if (lost) {
+        throw WhyNotQueued(places, anyQueued);
     }
-    throw WhyNotQueued(places, anyQueued);
+    return ExitStatus::kDone;
 }
 
 ExitStatus ReviveShares(const Arguments &arguments, Output &output) {
     Patience patience(arguments);
-    StepReport report;
-    std::vector<ExitStatus> results;
-    for (const auto &share : arguments.All("SHARE")) {
+    const auto &shares = arguments.All("SHARE");
+    for (const auto &share : shares) {
         RequireShare(share);
     }
     RequireMarks();
-    for (const auto &share : arguments.All("SHARE")) {
-        Revival revival{ExitStatus::kDone, {}};
-        try {
-            revival = ReviveOne(share, patience, report);
-        } catch (const Failure &failure) {
-            revival = {failure.Status(), failure.what()};
-        }
-        results.push_back(revival.status);
-        if (revival.status != ExitStatus::kDone) {
-            output.Error(revival.status, revival.trouble);
-        }
+    StepReport report;
+    std::set<ExitStatus> results;
+    for (const auto &share : shares) {
+        results.insert(ReviveOne(share, patience, report, output));
     }
     report.Show(output);
-    for (const auto &share : arguments.All("SHARE")) {
+    for (const auto &share : shares) {
         const bool marked = StatusMgr::ShareIsNoSpace(share);
         output.Data()["no_space"][share] = marked;
-        output.Line(Printable(share) + (marked ? " is marked as out of space" : " is not marked as out of space"));
+        output.Line(share + (marked ? " is marked as out of space" : " is not marked as out of space"));
     }
     // One status for several shares: what they have in common, else "partly".
-    const bool same =
-        std::all_of(results.begin(), results.end(), [&](ExitStatus result) { return result == results.front(); });
-    return same ? results.front() : ExitStatus::kPartly;
+    return results.size() == 1 ? *results.begin() : ExitStatus::kPartly;
 }
 
 }  // namespace VORK::FILEINDEXCTL

@@ -1,34 +1,23 @@
-#include "command_line/handlers.h"
+// "share": the life of a share as a whole.
 #include "facts/config_lock.h"
 #include "facts/daemon.h"
-#include "facts/paths.h"
 #include "facts/queue_files.h"
 #include "facts/registrations.h"
 #include "report/confirm.h"
-#include "report/failure.h"
-#include "report/steps.h"
-#include "report/text.h"
 #include "verbs/folder_operations.h"
 
-#include <fileindex/folders.h>
-#include <fileindex/index_mgr.h>
 #include <fileindex/paths.h>
 
-#include <vork/search.h>
 #include <vorknotifyd/monitor_queue.h>
 
 #include <sys/stat.h>
-
-#include <algorithm>
 
 namespace VORK::FILEINDEXCTL {
 
 namespace {
 
-using VORK::FILEINDEX::IndexMgr;
-
-std::vector<std::string> PathsOf(const std::string &share, const Folders &folders) {
-    std::vector<std::string> paths;
+Paths PathsOf(const std::string &share, const Folders &folders) {
+    Paths paths;
     for (const auto &folder : folders) {
         if (ShareOf(folder.path) == share) {
             paths.push_back(folder.path);
@@ -37,7 +26,7 @@ std::vector<std::string> PathsOf(const std::string &share, const Folders &folder
     return paths;
 }
 
-std::vector<std::string> RequireIndexed(const std::string &share, const Folders &folders) {
+Paths RequireIndexed(const std::string &share, const Folders &folders) {
     auto paths = PathsOf(share, folders);
     if (paths.empty()) {
         throw Failure(ExitStatus::kNoSuchFolder, "no folder of the share \"" + share + "\" is indexed");
@@ -45,41 +34,27 @@ std::vector<std::string> RequireIndexed(const std::string &share, const Folders 
     return paths;
 }
 
-bool IsWatched(const std::string &share) {
-    try {
-        return ReadRegistrations().count(QueuePathOf(share)) > 0;
-    } catch (const Failure &) {
-        return false;  // nobody can read the file, the monitor neither
-    }
+bool IsWatched(const std::string &share) try {
+    return ReadRegistrations().count(QueuePathOf(share)) > 0;
+} catch (const Failure &) {
+    return false;  // nobody can read the file, the monitor neither
 }
 
 void StateShare(const std::string &share, Output &output) {
     const auto paths = PathsOf(share, ReadFolders());
-    output.Data()["folders"] = Json::Value(Json::arrayValue);
-    for (const auto &path : paths) {
-        output.Data()["folders"].append(path);
-    }
     const bool isWatched = IsWatched(share);
+    output.Data()["folders"] = ToArray(paths);
     output.Data()["watched"] = isWatched;
     output.Line("share " + share + ": " + (paths.empty() ? "no folder is indexed" : Enumerate(paths)) +
                 (isWatched ? ", watched for changes" : ", not watched for changes"));
 }
 
-ExitStatus Finish(ExitStatus status, const std::string &trouble, Output &output) {
-    if (status != ExitStatus::kDone) {
-        output.Error(status, trouble);
-    }
-    return status;
-}
-
 // Folders that both names have keep the settings of the old one only.
-void AskForOverwriting(const Arguments &arguments, const std::vector<std::string> &paths, const Folders &folders,
-                       Output &output) {
-    std::vector<std::string> overwritten;
+void AskForOverwriting(const Arguments &arguments, const Paths &paths, const Folders &folders, Output &output) {
+    Paths overwritten;
     for (const auto &path : paths) {
-        const std::string target = VORK::FILEINDEX::ReplaceShareName(path, arguments.One("NEW"));
-        if (std::any_of(folders.begin(), folders.end(),
-                        [&](const VORK::FILEINDEX::Folder &folder) { return folder.path == target; })) {
+        const std::string target = FILEINDEX::ReplaceShareName(path, arguments.One("NEW"));
+        if (FindFolder(target, folders) != nullptr) {
             overwritten.push_back(target);
         }
     }
@@ -101,42 +76,45 @@ std::string FormerQueue(const std::string &oldShare, const std::string &newShare
            QueuePathOf(newShare).substr(directory.size());
 }
 
-bool WasPaused(const std::string &formerQueue, const std::string &newShare) {
-    try {
-        return IsQueuePaused(formerQueue) && IsQueuePaused(QueuePathOf(newShare));
-    } catch (const Failure &) {
-        return false;  // the step that registers says what is wrong with the file
-    }
+bool WasPaused(const std::string &formerQueue, const std::string &newShare) try {
+    return IsQueuePaused(formerQueue) && IsQueuePaused(QueuePathOf(newShare));
+} catch (const Failure &) {
+    return false;  // the step that registers says what is wrong with the file
 }
 
 // The library leaves the monitor as it was.
 void RefreshMonitor(const std::string &oldShare, const std::string &newShare, Patience &patience,
                     StepReport &report) {
-    VORK::FILEINDEX::Folders store;
+    FILEINDEX::Folders store;
     ForgetErrors();
-    const ConfigLock lock(store,
-                          patience);  // so that no other writer's newer registration is replaced by an older one
+    const ConfigLock lock(store, patience);  // so that no newer registration is replaced by an older one
+    const std::string step = "monitor of " + newShare;
     if (!lock.IsHeld()) {
-        report.Add("monitor of " + newShare, StepResult::kFailed, "folder.conf is locked by another program");
+        report.Add(step, StepResult::kFailed, "folder.conf is locked by another program");
         return;
     }
     const std::string former = FormerQueue(oldShare, newShare);
     if (WasPaused(former, newShare)) {
-        report.Add("monitor of " + newShare, StepResult::kSkipped, "the share is paused");
+        report.Add(step, StepResult::kSkipped, "the share is paused");
         return;
     }
-    const bool registered = IndexMgr::UpsertVorkNotifydCfg(newShare);
-    report.Add("monitor of " + newShare, registered ? StepResult::kDone : StepResult::kFailed,
-               registered ? "" : "it could not be registered");
-    const bool withdrawn =
-        VORKNOTIFYD::MonitorQueue::Delete(former, kRegistration, VORKNOTIFYD::MONITOR_QUEUE_TYPE_FILE);
-    report.Add("monitor of " + oldShare, withdrawn ? StepResult::kDone : StepResult::kFailed,
-               withdrawn ? "" : "it could not be withdrawn");
+    report.Add(step, IndexMgr::UpsertVorkNotifydCfg(newShare), "it could not be registered");
+    report.Add("monitor of " + oldShare,
+               VORKNOTIFYD::MonitorQueue::Delete(former, kRegistration, VORKNOTIFYD::MONITOR_QUEUE_TYPE_FILE),
+               "it could not be withdrawn");
 }
 
-// Nothing was reached: for lack of permission?
-ExitStatus StatusOf(const StepReport &report, bool isDenied) {
-    return report.Status() == ExitStatus::kUnreachable && isDenied ? ExitStatus::kPermission : report.Status();
+// Both ask the daemon and the monitor, whose registrations are the platform's.
+ExitStatus SetAtWork(const std::string &share, const std::vector<PlannedStep> &plan, const char *wanted,
+                     bool (*call)(const std::string &), bool (*isDenied)(), Output &output) {
+    RequireShare(share);
+    const StepReport report = StepReport::Perform(plan, FILEINDEX::Folders(), [&] { return call(share); });
+    report.Show(output);
+    StateShare(share, output);
+    const bool forLackOfPermission = isDenied() && report.Status() == ExitStatus::kUnreachable;
+    return output.Conclude(
+        forLackOfPermission ? ExitStatus::kPermission : report.Status(),
+        "the share \"" + share + "\" is not wholly " + wanted + "; once the cause is mended, repeat the command");
 }
 
 void RequireNoLink(const std::string &directory) {
@@ -165,15 +143,14 @@ ExitStatus RenameShare(const Arguments &arguments, Output &output) {
         throw Failure(ExitStatus::kUsage, "both names are \"" + newShare + "\"");
     }
     AskForOverwriting(arguments, paths, folders, output);
-    StepReport report = StepReport::Perform({SaveStep()}, VORK::FILEINDEX::Folders(), patience,
+    StepReport report = StepReport::Perform({SaveStep()}, FILEINDEX::Folders(), patience,
                                             [&] { return IndexMgr::ShareRename(oldShare, newShare); });
     RefreshMonitor(oldShare, newShare, patience, report);
     report.Show(output);
     StateShare(newShare, output);
-    return Finish(report.Status(),
-                  "the folders are moved, but the monitor is not in step; \"fileindexctl share resume " +
-                      ShellWord(newShare) + "\" registers it",
-                  output);
+    return output.Conclude(report.Status(),
+                           "the folders are moved, but the monitor is not in step; \"fileindexctl share resume " +
+                               ShellWord(newShare) + "\" registers it");
 }
 
 ExitStatus RemoveShare(const Arguments &arguments, Output &output) {
@@ -181,24 +158,17 @@ ExitStatus RemoveShare(const Arguments &arguments, Output &output) {
     const std::string share = arguments.One("SHARE");
     const Folders folders = ReadFolders();
     const auto paths = RequireIndexed(share, folders);
-    const std::string restart = RestartWith(false, paths.size() == folders.size());
+    const bool leavesNone = paths.size() == folders.size();
+    const std::string restart = RestartWith(false, leavesNone);
     RequireConsent(arguments, "this removes " + Enumerate(paths) + " from the index" +
                                   (restart.empty() ? "" : "; ") + restart);
     AnnounceRestart(restart, output);
     std::vector<PlannedStep> plan = {SaveStep()};
-    if (paths.size() == folders.size()) {
-        plan.push_back({"service", "fileindexd could not be stopped", {}, {{records::kShareRemoveStop}}});
-        plan.push_back({"search setting",
-                        "the search setting did not take effect",
-                        {},
-                        {{records::kShareRemoveSearch}, {records::kShareRemoveRestart}}});
+    if (leavesNone) {
+        plan = StopPlan("saved", {records::kShareRemoveStop}, {records::kShareRemoveSearch},
+                        {records::kShareRemoveRestart});
     }
-    const bool searchWasOn = VORKSMBIsEnableSpotlight() != 0;
-    StepReport report = StepReport::Perform(plan, VORK::FILEINDEX::Folders(), patience,
-                                            [&] { return IndexMgr::ShareRemove(share); });
-    if (!searchWasOn) {
-        report.Correct("search setting", StepResult::kAlready);
-    }
+    const StepReport report = PerformPlan(plan, false, patience, [&] { return IndexMgr::ShareRemove(share); });
     report.Show(output);
     StateShare(share, output);
     if (IsSharePresent(share)) {
@@ -210,36 +180,20 @@ ExitStatus RemoveShare(const Arguments &arguments, Output &output) {
 }
 
 ExitStatus PauseShare(const Arguments &arguments, Output &output) {
-    const std::string share = arguments.One("SHARE");
-    RequireShare(share);
-    const std::vector<PlannedStep> plan = {
-        {"worker stopped", "fileindexd cannot be reached", {}, {}, Evidence::kNone},
-        {"monitor", "it could not be withdrawn", {{records::kSharePauseWithdraw}}},
-    };
-    const StepReport report =
-        StepReport::Perform(plan, VORK::FILEINDEX::Folders(), [&] { return IndexMgr::SharePause(share); });
-    report.Show(output);
-    StateShare(share, output);
-    const bool isDenied = ProbeDaemon().condition == DaemonCondition::kDenied;
-    return Finish(
-        StatusOf(report, isDenied),
-        "the share \"" + share + "\" is not wholly at rest; once the cause is mended, repeat the command", output);
+    return SetAtWork(
+        arguments.One("SHARE"),
+        {{"worker stopped", "fileindexd cannot be reached", {}, {}, Evidence::kNone},
+         {"monitor", "it could not be withdrawn", {{records::kSharePauseWithdraw}}}},
+        "at rest", IndexMgr::SharePause, [] { return ProbeDaemon().condition == DaemonCondition::kDenied; },
+        output);
 }
 
 ExitStatus ResumeShare(const Arguments &arguments, Output &output) {
-    const std::string share = arguments.One("SHARE");
-    RequireShare(share);
-    const std::vector<PlannedStep> plan = {
-        {"monitor", "it could not be registered", {{records::kShareResumeMonitor}}},
-        {"worker started", "fileindexd cannot be reached", {}, {}, Evidence::kNone},
-    };
-    const StepReport report =
-        StepReport::Perform(plan, VORK::FILEINDEX::Folders(), [&] { return IndexMgr::ShareResume(share); });
-    report.Show(output);
-    StateShare(share, output);
-    return Finish(
-        StatusOf(report, MayNotWrite(kRegistrationsFile)),
-        "the share \"" + share + "\" is not wholly at work; once the cause is mended, repeat the command", output);
+    return SetAtWork(
+        arguments.One("SHARE"),
+        {{"monitor", "it could not be registered", {{records::kShareResumeMonitor}}},
+         {"worker started", "fileindexd cannot be reached", {}, {}, Evidence::kNone}},
+        "at work", IndexMgr::ShareResume, [] { return MayNotWrite(kRegistrationsFile); }, output);
 }
 
 ExitStatus CleanShare(const Arguments &arguments, Output &output) {
@@ -275,9 +229,8 @@ ExitStatus CleanShare(const Arguments &arguments, Output &output) {
         return ExitStatus::kDone;
     }
     const ExitStatus none = MayNotWrite(queue) ? ExitStatus::kPermission : ExitStatus::kCannotSave;
-    const ExitStatus status = report.Has(StepResult::kDone) ? ExitStatus::kPartly : none;
-    output.Error(status, "not everything could be deleted");
-    return status;
+    return output.Conclude(report.Has(StepResult::kDone) ? ExitStatus::kPartly : none,
+                           "not everything could be deleted");
 }
 
 }  // namespace VORK::FILEINDEXCTL

@@ -1,19 +1,12 @@
 // "status": how far indexing is, once or for as long as somebody watches.
-#include "command_line/handlers.h"
 #include "facts/progress.h"
 #include "facts/status_report.h"
-#include "report/failure.h"
 #include "report/schedule.h"
 #include "report/screen.h"
-#include "report/text.h"
+#include "verbs/verb.h"
 
 #include <chrono>
 #include <ctime>
-#include <functional>
-#include <map>
-#include <optional>
-#include <string>
-#include <vector>
 
 namespace VORK::FILEINDEXCTL {
 
@@ -21,8 +14,6 @@ namespace {
 
 constexpr unsigned long kInterval = 2;
 constexpr unsigned long kLongestInterval = 86400;
-
-using Reporter = std::function<StatusReport()>;
 
 double Now() {
     return std::chrono::duration<double>(std::chrono::steady_clock::now().time_since_epoch()).count();
@@ -35,19 +26,22 @@ std::string ProgressText(const StatusReport &report, const Progress &progress) {
 }
 
 void AddProgress(const Progress &progress, StatusReport &report) {
-    auto &data = report.data["progress"];
-    data["left"] = static_cast<Json::UInt64>(progress.Left());
-    data["done"] = static_cast<Json::UInt64>(progress.Done());
-    data["per_second"] = progress.Rate() ? Json::Value(*progress.Rate()) : Json::Value();
-    data["seconds_left"] = progress.SecondsLeft() ? Json::Value(*progress.SecondsLeft()) : Json::Value();
-    data["seconds_without_progress"] = progress.SecondsWithoutProgress();
-    report.data["time"] = static_cast<Json::Int64>(std::time(nullptr));
+    report.data["progress"] = ToObject({{"left", ToNumber(progress.Left())},
+                                        {"done", ToNumber(progress.Done())},
+                                        {"per_second", OrNull(progress.Rate())},
+                                        {"seconds_left", OrNull(progress.SecondsLeft())},
+                                        {"seconds_without_progress", progress.SecondsWithoutProgress()}});
+    report.data["time"] = ToNumber(std::time(nullptr));
     report.facts.push_back({"taken away", report.Taken()});
     report.facts.push_back({"progress", ProgressText(report, progress)});
 }
 
-StatusReport Sample(const Reporter &reporter, Progress &progress) {
-    StatusReport report = reporter();
+StatusReport ReportOf(const Arguments &arguments) {
+    return arguments.Has("PATH") ? ReportFolder(arguments.One("PATH")) : ReportService(arguments.One("--share"));
+}
+
+StatusReport Sample(const Arguments &arguments, Progress &progress) {
+    StatusReport report = ReportOf(arguments);
     std::map<std::string, unsigned long> files;
     for (const auto &[name, backlog] : report.backlogs) {
         files.insert(backlog.files.begin(), backlog.files.end());
@@ -60,10 +54,10 @@ StatusReport Sample(const Reporter &reporter, Progress &progress) {
 // One line, for logs and for programs that read lines.
 std::string Brief(const StatusReport &report, const Progress &progress) {
     std::vector<std::string> shares;
+    std::vector<std::string> paused;
     for (const auto &[name, backlog] : report.backlogs) {
         shares.push_back(name + " " + std::to_string(backlog.Total()));
     }
-    std::vector<std::string> paused;
     for (const auto &share : report.data["paused_shares"]) {
         paused.push_back(share.asString());
     }
@@ -109,7 +103,7 @@ int AwaitEnd(const Signals &signals, unsigned long interval, std::optional<Scree
 }
 
 // Until the user or the system ends it.
-void Watch(const Reporter &reporter, unsigned long interval, Output &output) {
+void Watch(const Arguments &arguments, unsigned long interval, Output &output) {
     const Signals signals;
     std::optional<Screen> screen;
     if (Screen::IsUsable() && !output.IsJson()) {
@@ -118,7 +112,7 @@ void Watch(const Reporter &reporter, unsigned long interval, Output &output) {
     Progress progress;
     int signal = 0;
     while (signal == 0) {
-        const StatusReport report = Sample(reporter, progress);
+        const StatusReport report = Sample(arguments, progress);
         if (screen) {
             Draw(report, interval, *screen);
         } else if (!Write(report, progress, output)) {
@@ -126,9 +120,8 @@ void Watch(const Reporter &reporter, unsigned long interval, Output &output) {
         }
         signal = AwaitEnd(signals, interval, screen);
     }
-    const bool echoed = screen.has_value();
-    screen.reset();
-    if (echoed) {
+    if (screen) {
+        screen.reset();
         output.Line("");  // after the "^C" of the terminal
     }
     if (signal != SIGINT) {
@@ -154,20 +147,16 @@ ExitStatus ShowStatus(const Arguments &arguments, Output &output) {
         throw Failure(ExitStatus::kUsage, "give a path or --share, not both");
     }
     const unsigned long interval = Interval(arguments);
-    const Reporter reporter = [&] {
-        return arguments.Has("PATH") ? ReportFolder(arguments.One("PATH"))
-                                     : ReportService(arguments.One("--share"));
-    };
-    if (!arguments.Has("--watch")) {
-        const StatusReport report = reporter();
-        output.Data() = report.data;
-        for (const auto &line : report.Lines(output.Width())) {
-            output.Line(line);
-        }
-        return report.gaps.Report(output);
+    if (arguments.Has("--watch")) {
+        Watch(arguments, interval, output);
+        return ExitStatus::kDone;
     }
-    Watch(reporter, interval, output);
-    return ExitStatus::kDone;
+    const StatusReport report = ReportOf(arguments);
+    output.Data() = report.data;
+    for (const auto &line : report.Lines(output.Width())) {
+        output.Line(line);
+    }
+    return report.gaps.Report(output);
 }
 
 }  // namespace VORK::FILEINDEXCTL
