@@ -21,8 +21,6 @@ using namespace internal;
 
 namespace {
 
-constexpr Record kFolderWithoutShare = {kIndexMgrModule, 73};
-
 /// Asks the stored folders in list order, without a lock. A folder.conf that cannot be read makes every answer
 /// false.
 template <typename Question>
@@ -69,8 +67,8 @@ bool IndexMgr::IsShareIndexed(const std::string &share) {
         std::string owner;
         const std::string path(folder.path);
         if (!GetShareNameByPath(owner, path)) {
-            syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", kFolderWithoutShare.module,
-                   kFolderWithoutShare.line, path.c_str());
+            syslog(LOG_ERR, "%s:%d Failed to get share name from path: %s", kIndexMgrModule, __LINE__,
+                   path.c_str());
             return false;
         }
         return owner == share;

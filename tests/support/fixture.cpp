@@ -113,7 +113,11 @@ std::string Left() {
         EXPECT_EQ(LOG_ERR, record.priority) << record.message;
         EXPECT_TRUE(numbered.contains(record.file) || unnumbered.contains(record.file)) << record.message;
         EXPECT_GT(record.line, 0) << record.message;
-        const std::string line = numbered.contains(record.file) ? ":" + std::to_string(record.line) : "";
+        // One record of these modules has the line of its statement: IsShareIndexed's.
+        const bool fixed =
+            numbered.contains(record.file) && (record.file != "index_mgr.cpp" || record.line == 384 ||
+                                               record.message != "Failed to get share name from path: ");
+        const std::string line = fixed ? ":" + std::to_string(record.line) : "";
         records.push_back(record.file + line + " " + record.message);
     }
     for (auto record = records.begin(); record != records.end();) {
