@@ -149,6 +149,7 @@ TEST(ConcurrencyTest, RemovesNothingOfAStrangerWhileDirectoriesAreExchanged) {
 TEST_F(ThreadsTest, LeaveTheirChildrenAbleToAsk) {
     std::locale::global(std::locale("C.UTF-8"));  // with which the C++ library has a mutex to take
     std::vector<std::jthread> threads;
+    threads.reserve(3);
     for (int i = 0; i < 3; ++i) {
         threads.emplace_back([i](const std::stop_token &end) {
             while (!end.stop_requested()) {

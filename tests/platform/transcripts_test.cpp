@@ -144,6 +144,7 @@ std::string Run(Text program, int discardOutput, int ignored) {
     std::istringstream words(program);
     const std::vector<std::string> arguments{std::istream_iterator<std::string>(words), {}};
     std::vector<const char *> argv;
+    argv.reserve(arguments.size() + 1);
     for (const std::string &argument : arguments) {
         argv.push_back(argument.c_str());
     }

@@ -76,6 +76,7 @@ void CheckList(Board &board, int size) {
 
 void RunAndKill(Board &board, int size, unsigned microseconds) {
     std::vector<pid_t> processes;
+    processes.reserve(kWriters + 2);
     for (int writer = 0; writer < kWriters; ++writer) {
         processes.push_back(Start([&board, writer, size] { RenameForEver(board, writer, size); }));
     }

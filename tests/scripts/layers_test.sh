@@ -21,6 +21,11 @@ grep -rHE '^#include ("|<(fileindex|vork|vorknotifyd)/)' base include src platfo
     !Room(own) || !includes || includes > Room(own) { print $1 " must not include " $3; failed = 1 }
     END { exit failed || count < 300 }' docs/architecture.md -
 
-for header in $(find base src platform/linux tools -name '*.h'); do
-    [[ $(head -n 1 "$header") == '/// \file' ]] && grep -qx '#pragma once' "$header" || { echo "$header: its head"; exit 1; }
-done
+headers=$(find base src platform/linux tools -name '*.h')
+[[ $(wc -l <<<"$headers") -gt 50 ]]
+while read -r header; do
+    if [[ $(head -n 1 "$header") != '/// \file' ]] || ! grep -qx '#pragma once' "$header"; then
+        echo "$header: its head"
+        exit 1
+    fi
+done <<<"$headers"

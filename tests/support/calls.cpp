@@ -54,9 +54,9 @@ Function Agree(Questions... questions) {
     return [=](Text argument) {
         std::set<std::string> answers;
         for (const Function &question : {Function(questions)...}) {
-            const std::string answer = question(argument);
+            std::string answer = question(argument);
             const std::string left = Left();
-            answers.insert(answer + (left.empty() ? "" : "; ") + left);
+            answers.insert(answer.append(left.empty() ? "" : "; ").append(left));
         }
         return answers.size() == 1 ? *answers.begin() : "the ways to ask disagree";
     };

@@ -161,7 +161,9 @@ void FileIndexTest::TearDown() {
 }
 
 void FileIndexTest::Given(const std::string &line) {
-    const auto [what, text] = Split(line);
+    const auto given = Split(line);
+    const std::string &what = given.first;
+    const std::string &text = given.second;
     if (what.ends_with(".conf")) {
         WriteFile(std::string(kConfigDir) + "/" + what, text);
         return;
@@ -170,11 +172,13 @@ void FileIndexTest::Given(const std::string &line) {
         GivenQueue(text.empty() ? "" : Decoded(text) + "\n", what.substr(5));
         return;
     }
-    const auto [first, second] = Split(text);
+    const auto words = Split(text);
+    const std::string &first = words.first;
+    const std::string &second = words.second;
     Platform &platform = Platform::Current();
     const auto share = [&platform, name = first]() -> FakeShare & { return platform.shares[Decoded(name)]; };
-    std::istringstream words(text);
-    const std::set<std::string> all{std::istream_iterator<std::string>(words), {}};
+    std::istringstream stream(text);
+    const std::set<std::string> all{std::istream_iterator<std::string>(stream), {}};
     const std::map<std::string, std::function<void()>> changes = {
         {"no", [&] { fs::remove_all(text.ends_with(".conf") ? kConfigDir + ("/" + text) : text); }},
         {"search", [&] { platform.searchOn = text == "on"; }},

@@ -48,7 +48,7 @@ TEST_F(Depth, OfARequestIsLimited) {
     EXPECT_EQ(
         bad + "folders.cpp Bad param: " + Text(255) + "; index_mgr.cpp:582 Upsert failed, folder=" + Text(255),
         Left());
-    for (const int levels : {257, 60000}) {
+    const auto expectRefused = [&](int levels) {
         const Json::Value &deep = Nested(levels);
         const std::string element = levels == 257 ? Text(256) : Text(256, "...");
         EXPECT_FALSE(IndexMgr::Upsert(deep));
@@ -60,7 +60,9 @@ TEST_F(Depth, OfARequestIsLimited) {
         Json::Value facts;
         EXPECT_FALSE(Folder().GetAdditional(facts, deep));
         EXPECT_EQ(bad + "folder.cpp Bad param: " + element, Left());
-    }
+    };
+    expectRefused(257);
+    expectRefused(60000);
 }
 
 TEST_F(Depth, OfAnEventAndOfACommandCountsTheLevelAroundTheData) {

@@ -63,6 +63,7 @@ std::vector<PlannedStep> Plan(const Places &places) {
         }
     }
     std::vector<PlannedStep> plan;
+    plan.reserve(full.size());
     for (const auto &share : full) {
         plan.push_back({share + " revived",
                         "the share stays marked as out of space, or fileindexd cannot be reached",
