@@ -23,6 +23,10 @@ unsigned char FoldAscii(char c) {
     return static_cast<unsigned char>(c >= 'A' && c <= 'Z' ? c - 'A' + 'a' : c);
 }
 
+bool AreSameLetter(char a, char b) {
+    return IsAscii(a) && IsAscii(b) && FoldAscii(a) == FoldAscii(b);
+}
+
 // The length of the UTF-8 at the start of the text.
 size_t TextLength(std::string_view text) {
     const auto *start = reinterpret_cast<const uint8_t *>(text.data());
@@ -62,33 +66,23 @@ std::string KeyOf(std::string_view name) {
     return key;
 }
 
-std::string_view ViewOf(const char *text) {
-    return text == nullptr ? std::string_view() : text;
-}
-
 }  // namespace
 
 int VLIBCUnicodeUTF8StrCaseCmp(const char *a, const char *b) {
-    const std::string_view left = ViewOf(a);
-    const std::string_view right = ViewOf(b);
-    // Keys are made of what stands behind the last ASCII character that both names share: whatever came before it
-    // has the same key in both, and where two ASCII characters differ they decide. So most pairs need no key.
-    const size_t common = std::min(left.size(), right.size());
-    size_t decided = 0;
-    for (size_t i = 0; i < common; ++i) {
-        if (IsAscii(left[i]) && IsAscii(right[i])) {
-            const int difference = FoldAscii(left[i]) - FoldAscii(right[i]);
-            if (difference != 0) {
-                return difference;
-            }
-            decided = i + 1;
-        } else if (left[i] != right[i]) {
-            break;
-        }
+    const char *left = a == nullptr ? "" : a;
+    const char *right = b == nullptr ? "" : b;
+    size_t i = 0;
+    while (left[i] == right[i] ? left[i] != '\0' : AreSameLetter(left[i], right[i])) {
+        ++i;
     }
-    if (decided == left.size() || decided == right.size()) {
-        return static_cast<int>(decided < left.size()) - static_cast<int>(decided < right.size());
+    const bool followsAscii = i == 0 || IsAscii(left[i - 1]);
+    if (left[i] == right[i] || (followsAscii && IsAscii(left[i]) && IsAscii(right[i]))) {
+        return FoldAscii(left[i]) - FoldAscii(right[i]);
     }
-    // std::string compares bytes as unsigned.
-    return KeyOf(left.substr(decided)).compare(KeyOf(right.substr(decided)));
+    // Keys are made of what stands after the last ASCII character that both names share, since whatever comes
+    // before it has the same key in both.
+    while (i > 0 && !IsAscii(left[i - 1])) {
+        --i;
+    }
+    return KeyOf(left + i).compare(KeyOf(right + i));  // of bytes, unsigned
 }
