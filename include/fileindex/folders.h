@@ -86,6 +86,7 @@ public:
     bool Delete(Json::Value &out, const std::string &path);
 
 private:
+    int unresolved_ = 0;  // how many of the folders have no full path
     std::map<std::string, Folder> folders_;
 };
 

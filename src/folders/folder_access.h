@@ -34,6 +34,9 @@ struct FolderAccess {
     /// Fills the list from the document. Not an object: one record, FILEINDEX_ERR_MALFORMED_CONFIG, false.
     static bool TakeDocument(Folders &store);
 
+    /// Stores one that is not stored yet; they come in the list's order.
+    static void Add(Folders &store, std::string path, Folder folder);
+
     /// Looks for the full path again. The old one is forgotten first: none is better than that of another path.
     static bool Resolve(Folder &folder) {
         folder.full_path_.clear();

@@ -139,7 +139,7 @@ bool FolderAccess::TakeText(Folders &store, std::string_view text) {
         }
         Resolve(folder);  // a folder whose share is away stays in the list
         std::string key = folder.path;
-        store.folders_.emplace_hint(store.folders_.end(), std::move(key), std::move(folder));
+        Add(store, std::move(key), std::move(folder));
     }
     return true;
 }
@@ -197,9 +197,17 @@ bool FolderAccess::TakeDocument(Folders &store) {
         const std::string path = it.name();
         Folder folder;
         folder.Load(path, *it);  // a folder whose share is away stays in the list
-        store.folders_.emplace(path, std::move(folder));
+        Add(store, path, std::move(folder));
     }
     return true;
+}
+
+void FolderAccess::Add(Folders &store, std::string path, Folder folder) {
+    const std::size_t before = store.folders_.size();
+    const auto added = store.folders_.emplace_hint(store.folders_.end(), std::move(path), std::move(folder));
+    if (store.folders_.size() > before && StoredFullPath(added->second).empty()) {
+        ++store.unresolved_;
+    }
 }
 
 }  // namespace internal

@@ -12,6 +12,7 @@
 
 #include <syslog.h>
 
+#include <algorithm>
 #include <utility>
 
 namespace VORK {
@@ -23,9 +24,17 @@ namespace {
 
 using FolderMap = std::map<std::string, Folder>;
 
-/// The folder that governs the full path, null when there is none; `leftOut` counts as not stored. Folders without
-/// a full path are all tried again, and each leaves its record.
-const Folder *GoverningIn(const FolderMap &folders, const std::string &fullPath, const Folder *leftOut = nullptr) {
+/// The folder that governs the full path, null when there is none; `leftOut` counts as not stored. Looked for from
+/// the end, as the last one that covers governs; but where some folder has no full path all are asked, in the
+/// list's order, because each of those is tried again and leaves its record.
+const Folder *GoverningIn(const FolderMap &folders, const std::string &fullPath, bool allResolved,
+                          const Folder *leftOut = nullptr) {
+    if (allResolved) {
+        const auto found = std::find_if(folders.rbegin(), folders.rend(), [&](const auto &entry) {
+            return &entry.second != leftOut && internal::Covers(entry.second, fullPath);
+        });
+        return found == folders.rend() ? nullptr : &found->second;
+    }
     internal::Governing governing(fullPath);
     for (const auto &[path, folder] : folders) {
         if (&folder != leftOut) {
@@ -33,6 +42,10 @@ const Folder *GoverningIn(const FolderMap &folders, const std::string &fullPath,
         }
     }
     return governing.Get();
+}
+
+int Unresolved(const Folder &folder) {
+    return internal::FolderAccess::StoredFullPath(folder).empty() ? 1 : 0;
 }
 
 /// True for each media kind that is indexed differently after the change. A side that no folder governs always
@@ -104,9 +117,11 @@ bool Folders::Upsert(Json::Value &out, const Json::Value &folder) {
         const bool known = found != folders_.end();
         Folder updated = known ? found->second : Folder();
         updated.Load(path, folder);
+        const bool allResolved = unresolved_ == 0;
         const Folder *added = nullptr;
         if (!known) {
             added = &folders_.emplace(path, updated).first->second;
+            unresolved_ += Unresolved(updated);
             if (folders_.size() > internal::kMaxFolders) {
                 syslog(LOG_ERR, "%s:%d Exceed max folder size", kFoldersModule, __LINE__);
                 ErrorHandler::SetError(FILEINDEX_ERR_EXCEED_MAX_FOLDER);
@@ -114,8 +129,9 @@ bool Folders::Upsert(Json::Value &out, const Json::Value &folder) {
             }
         }
         // After the change the record itself counts, even where a folder later in the list governs the path.
-        out = ChangeReport(GoverningIn(folders_, fullPath, added), &updated);
+        out = ChangeReport(GoverningIn(folders_, fullPath, allResolved, added), &updated);
         if (known) {
+            unresolved_ += Unresolved(updated) - Unresolved(found->second);
             found->second = std::move(updated);
         }
         return true;
@@ -128,12 +144,15 @@ bool Folders::Delete(Json::Value &out, const std::string &path) {
         const bool known = found != folders_.end();
         std::string fullPath;
         if (GetFullPath(fullPath, path)) {  // a folder of a share that is gone can be removed all the same
-            const Folder *before = GoverningIn(folders_, fullPath);
-            const Folder *after = GoverningIn(folders_, fullPath, known ? &found->second : nullptr);
+            const Folder *own = known ? &found->second : nullptr;
+            const bool othersResolved = unresolved_ == (known ? Unresolved(*own) : 0);
+            const Folder *before = GoverningIn(folders_, fullPath, unresolved_ == 0);
+            const Folder *after = GoverningIn(folders_, fullPath, othersResolved, own);
             out = Json::Value(Json::objectValue);
             out[path] = ChangeReport(before, after);
         }
         if (known) {
+            unresolved_ -= Unresolved(found->second);
             folders_.erase(found);
         }
         return true;
