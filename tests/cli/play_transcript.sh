@@ -5,7 +5,7 @@
 #
 #   $ COMMAND     is run by the shell. Below it stands what it writes to stdout, then what it writes to stderr: "! " for
 #                 the tool's own "fileindexctl: ", "!! " before any other line. An exit status other than 0 ends the last
-#                 line: " [66]". A single line stands behind the command where both fit into 160 columns: "$ COMMAND  #> LINE".
+#                 line: " [66]". A single line stands after the command where both fit into 160 columns: "$ COMMAND  #> LINE".
 #                 Lines of a report that end in the same way, one below the other, share a line: "saved  done | monitor  done"
 #   # TEXT        a remark, after an empty line
 #   ? COMMAND  #> REASON    where the command fails, the transcript cannot be played, for that reason

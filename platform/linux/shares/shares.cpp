@@ -21,7 +21,7 @@ using VORK::PLATFORM::ShareSource;
 
 namespace {
 
-// What VORKShareGet hands out: the public record in front, the texts it points to behind it.
+// What VORKShareGet hands out: the public record in front, the texts it points to after it.
 struct OwningRecord : VORKSHARE {
     explicit OwningRecord(const Share &share) : VORKSHARE{}, name(share.name), path(share.path) {
         szName = name.c_str();
